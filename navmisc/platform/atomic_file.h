@@ -1,0 +1,51 @@
+// Writing a file so that readers see either the old content or the whole new one: the bytes go
+// to a temporary file in the same folder, which is flushed and renamed over the target on
+// Commit. Destroying an uncommitted AtomicFile removes the temporary file and leaves the target
+// as it was.
+#pragma once
+
+#include <cstddef>
+#include <string>
+#include <string_view>
+
+#include "navmisc/platform/cstring.h"
+
+namespace navmisc {
+
+class AtomicFile {
+ public:
+  AtomicFile() = default;
+  ~AtomicFile();
+  AtomicFile(const AtomicFile&) = delete;
+  AtomicFile& operator=(const AtomicFile&) = delete;
+
+  // Creates the temporary file beside `path`. False when that is impossible.
+  bool Open(const wchar_t* path);
+  bool IsOpen() const { return fd_ >= 0; }
+  // Buffers and writes bytes; false once any write has failed (later writes are ignored).
+  bool Write(std::string_view bytes);
+  bool Write(const void* data, size_t size) {
+    return Write(std::string_view(static_cast<const char*>(data), size));
+  }
+  // Flushes, syncs and renames over the target. False (target untouched) on any failure.
+  bool Commit();
+  // Removes the temporary file; the target stays as it was.
+  void Abandon();
+
+ private:
+  bool Flush();
+  int fd_ = -1;
+  bool failed_ = false;
+  std::string target_;
+  std::string temp_;
+  std::string buffer_;
+};
+
+namespace testing {
+// Fault injection for tests: after `bytes` more bytes have been written through AtomicFile in
+// this process, every further write fails as a full disk would. A negative value switches the
+// fault off.
+void FailAtomicWritesAfter(long long bytes);
+}  // namespace testing
+
+}  // namespace navmisc

@@ -1,0 +1,265 @@
+#include "navmisc/platform/format.h"
+
+#include <charconv>
+#include <cstdio>
+#include <cstring>
+#include <cwchar>
+#include <limits>
+#include <system_error>
+
+#include "navmisc/platform/textconv.h"
+
+namespace navmisc {
+namespace {
+
+locale_t CLocale() {
+  static const locale_t loc = newlocale(LC_ALL_MASK, "C", static_cast<locale_t>(nullptr));
+  return loc;
+}
+
+// One conversion of a format, split into its parts.
+struct Spec {
+  std::string flags;
+  int width = -1;
+  int precision = -1;
+  std::string length;  // "", "h", "hh", "l", "ll", "L", "z", "j", "t", "I64"
+  char conv = 0;
+};
+
+template <class Out>
+void AppendAscii(Out& out, std::string_view text) {
+  out.append(text.begin(), text.end());
+}
+
+template <class Out>
+void Pad(Out& out, size_t len, const Spec& s, auto emit) {
+  const bool left = s.flags.find('-') != std::string::npos;
+  const size_t w = s.width > 0 ? static_cast<size_t>(s.width) : 0;
+  if (!left && w > len) out.append(w - len, ' ');
+  emit();
+  if (left && w > len) out.append(w - len, ' ');
+}
+
+std::string BuildSpec(const Spec& s, const char* length_override, char conv) {
+  std::string f = "%";
+  f += s.flags;
+  if (s.width >= 0) f += std::to_string(s.width);
+  if (s.precision >= 0) {
+    f += '.';
+    f += std::to_string(s.precision);
+  }
+  f += length_override;
+  f += conv;
+  return f;
+}
+
+template <class T>
+std::string Snprintf(const std::string& spec, T value) {
+  char buf[128];
+  int n = std::snprintf(buf, sizeof buf, spec.c_str(), value);
+  if (n < 0) return {};
+  if (static_cast<size_t>(n) < sizeof buf) return std::string(buf, static_cast<size_t>(n));
+  std::string big(static_cast<size_t>(n) + 1, '\0');
+  std::snprintf(big.data(), big.size(), spec.c_str(), value);
+  big.resize(static_cast<size_t>(n));
+  return big;
+}
+
+// Formats one numeric or pointer conversion, consuming its argument.
+std::string FormatNumber(const Spec& s, va_list& args) {
+  const char c = s.conv;
+  const std::string& l = s.length;
+  if (c == 'd' || c == 'i') {
+    long long v;
+    if (l == "ll" || l == "I64" || l == "j") v = va_arg(args, long long);
+    else if (l == "l" || l == "z" || l == "t") v = va_arg(args, long);
+    else v = va_arg(args, int);
+    if (l == "h") v = static_cast<short>(v);
+    if (l == "hh") v = static_cast<signed char>(v);
+    return Snprintf(BuildSpec(s, "ll", c), v);
+  }
+  if (c == 'u' || c == 'o' || c == 'x' || c == 'X') {
+    unsigned long long v;
+    if (l == "ll" || l == "I64" || l == "j") v = va_arg(args, unsigned long long);
+    else if (l == "l" || l == "z" || l == "t") v = va_arg(args, unsigned long);
+    else v = va_arg(args, unsigned int);
+    if (l == "h") v = static_cast<unsigned short>(v);
+    if (l == "hh") v = static_cast<unsigned char>(v);
+    return Snprintf(BuildSpec(s, "ll", c), v);
+  }
+  if (c == 'f' || c == 'F' || c == 'e' || c == 'E' || c == 'g' || c == 'G' || c == 'a' ||
+      c == 'A') {
+    if (l == "L") return Snprintf(BuildSpec(s, "L", c), va_arg(args, long double));
+    return Snprintf(BuildSpec(s, "", c), va_arg(args, double));
+  }
+  if (c == 'p') return Snprintf(BuildSpec(s, "", 'p'), va_arg(args, void*));
+  return {};
+}
+
+template <class Char>
+size_t StrLen(const Char* p, int precision) {
+  size_t n = 0;
+  while ((precision < 0 || n < static_cast<size_t>(precision)) && p[n]) ++n;
+  return n;
+}
+
+// The shared engine. `wide_out` tells which string kind "%s" means (the output's own).
+template <class Char>
+std::basic_string<Char> VFormat(const Char* fmt, va_list in_args) {
+  constexpr bool kWide = sizeof(Char) == sizeof(wchar_t);
+  std::basic_string<Char> out;
+  if (!fmt) return out;
+  CLocaleScope c_locale;
+  va_list args;
+  va_copy(args, in_args);
+  for (const Char* p = fmt; *p;) {
+    if (*p != '%') {
+      out.push_back(*p++);
+      continue;
+    }
+    ++p;
+    if (*p == '%') {
+      out.push_back('%');
+      ++p;
+      continue;
+    }
+    Spec s;
+    while (*p == '-' || *p == '+' || *p == ' ' || *p == '#' || *p == '0') s.flags += static_cast<char>(*p++);
+    if (*p == '*') {
+      s.width = va_arg(args, int);
+      if (s.width < 0) {
+        s.flags += '-';
+        s.width = -s.width;
+      }
+      ++p;
+    } else {
+      while (*p >= '0' && *p <= '9') s.width = (s.width < 0 ? 0 : s.width * 10) + (*p++ - '0');
+    }
+    if (*p == '.') {
+      ++p;
+      s.precision = 0;
+      if (*p == '*') {
+        s.precision = va_arg(args, int);
+        if (s.precision < 0) s.precision = -1;
+        ++p;
+      } else {
+        while (*p >= '0' && *p <= '9') s.precision = s.precision * 10 + (*p++ - '0');
+      }
+    }
+    if (p[0] == 'I' && p[1] == '6' && p[2] == '4') {
+      s.length = "I64";
+      p += 3;
+    } else {
+      while (*p == 'h' || *p == 'l' || *p == 'L' || *p == 'z' || *p == 'j' || *p == 't') s.length += static_cast<char>(*p++);
+    }
+    if (!*p) break;
+    s.conv = static_cast<char>(*p++);
+    switch (s.conv) {
+      case 's':
+      case 'S': {
+        // Which kind of string the argument is.
+        bool arg_wide = (s.conv == 's') == kWide;
+        if (s.length == "l" || s.length == "w") arg_wide = true;
+        if (s.length == "h") arg_wide = false;
+        std::basic_string<Char> piece;
+        if (arg_wide) {
+          const wchar_t* w = va_arg(args, const wchar_t*);
+          if (!w) w = L"(null)";
+          std::wstring_view v(w, StrLen(w, s.precision));
+          if constexpr (kWide) piece.assign(v.begin(), v.end());
+          else piece = ToUtf8Lossy(v);
+        } else {
+          const char* a = va_arg(args, const char*);
+          if (!a) a = "(null)";
+          std::string_view v(a, StrLen(a, s.precision));
+          if constexpr (kWide) piece = FromUtf8Lossy(v);
+          else piece.assign(v.begin(), v.end());
+        }
+        Pad(out, piece.size(), s, [&] { out += piece; });
+        break;
+      }
+      case 'c':
+      case 'C': {
+        bool arg_wide = (s.conv == 'c') == kWide;
+        if (s.length == "l" || s.length == "w") arg_wide = true;
+        if (s.length == "h") arg_wide = false;
+        std::basic_string<Char> piece;
+        if (arg_wide) {
+          wchar_t ch = static_cast<wchar_t>(va_arg(args, wint_t));
+          if constexpr (kWide) piece.push_back(ch);
+          else piece = ToUtf8Lossy(std::wstring_view(&ch, 1));
+        } else {
+          char ch = static_cast<char>(va_arg(args, int));
+          piece.push_back(static_cast<Char>(static_cast<unsigned char>(ch)));
+        }
+        Pad(out, piece.size(), s, [&] { out += piece; });
+        break;
+      }
+      case 'n':
+        (void)va_arg(args, void*);
+        break;
+      default: {
+        std::string num = FormatNumber(s, args);
+        AppendAscii(out, num);
+        break;
+      }
+    }
+  }
+  va_end(args);
+  return out;
+}
+
+template <class Out>
+void AppendFixedImpl(Out& out, double value, int decimals) {
+  char buf[400];
+  auto r = std::to_chars(buf, buf + sizeof buf, value, std::chars_format::fixed, decimals);
+  if (r.ec != std::errc()) {
+    AppendAscii(out, Snprintf("%." + std::to_string(decimals) + "f", value));
+    return;
+  }
+  AppendAscii(out, std::string_view(buf, static_cast<size_t>(r.ptr - buf)));
+}
+
+template <class Out>
+void AppendIntImpl(Out& out, long long value) {
+  char buf[32];
+  auto r = std::to_chars(buf, buf + sizeof buf, value);
+  AppendAscii(out, std::string_view(buf, static_cast<size_t>(r.ptr - buf)));
+}
+
+}  // namespace
+
+CLocaleScope::CLocaleScope() : previous_(uselocale(CLocale())) {}
+CLocaleScope::~CLocaleScope() { uselocale(previous_); }
+
+std::wstring VFormatW(const wchar_t* fmt, va_list args) { return VFormat<wchar_t>(fmt, args); }
+std::string VFormatA(const char* fmt, va_list args) { return VFormat<char>(fmt, args); }
+
+std::wstring FormatW(const wchar_t* fmt, ...) {
+  va_list args;
+  va_start(args, fmt);
+  std::wstring s = VFormatW(fmt, args);
+  va_end(args);
+  return s;
+}
+
+std::string FormatA(const char* fmt, ...) {
+  va_list args;
+  va_start(args, fmt);
+  std::string s = VFormatA(fmt, args);
+  va_end(args);
+  return s;
+}
+
+void AppendFixed(std::string& out, double value, int decimals) { AppendFixedImpl(out, value, decimals); }
+void AppendFixed(std::wstring& out, double value, int decimals) { AppendFixedImpl(out, value, decimals); }
+void AppendInt(std::string& out, long long value) { AppendIntImpl(out, value); }
+void AppendInt(std::wstring& out, long long value) { AppendIntImpl(out, value); }
+
+std::string ShortestDouble(double value) {
+  char buf[64];
+  auto r = std::to_chars(buf, buf + sizeof buf, value);
+  return std::string(buf, static_cast<size_t>(r.ptr - buf));
+}
+
+}  // namespace navmisc

@@ -1,0 +1,34 @@
+#!/usr/bin/env bash
+# Installs the Debian 12 packages that building, testing and validating NavMiscLib need.
+# Only what is missing is installed. Needs root (or sudo).
+set -euo pipefail
+
+packages=(
+  build-essential cmake ninja-build pkg-config git
+  clang libclang-rt-14-dev             # fuzz targets (libFuzzer)
+  zlib1g-dev libzip-dev                # KMZ archives
+  libsodium-dev                        # protection of the stored password
+  libexiv2-dev                         # the tagging tool
+  libgtest-dev libgmock-dev libbenchmark-dev
+  libxml2-utils gpsbabel gdal-bin zip unzip   # readers that check the exported documents
+  tzdata
+)
+
+missing=()
+for p in "${packages[@]}"; do
+  if ! dpkg-query -W -f='${Status}' "$p" 2>/dev/null | grep -q "install ok installed"; then
+    missing+=("$p")
+  fi
+done
+
+if [ ${#missing[@]} -eq 0 ]; then
+  echo "setup: all packages present"
+  exit 0
+fi
+
+SUDO=""
+if [ "$(id -u)" -ne 0 ]; then SUDO="sudo"; fi
+echo "setup: installing ${missing[*]}"
+export DEBIAN_FRONTEND=noninteractive
+$SUDO apt-get update
+$SUDO apt-get install -y --no-install-recommends "${missing[@]}"

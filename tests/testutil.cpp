@@ -1,0 +1,43 @@
+#include "testutil.h"
+
+#include <stdlib.h>
+
+#include <fstream>
+#include <sstream>
+#include <stdexcept>
+
+#include "navmisc/platform/files.h"
+#include "navmisc/platform/shared_globals.h"
+
+namespace navmisc::testutil {
+
+TempDir::TempDir() {
+  const char* tmp = getenv("TMPDIR");
+  std::string templ = std::string(tmp && *tmp ? tmp : "/tmp") + "/navmisc-test-XXXXXX";
+  if (!mkdtemp(templ.data())) throw std::runtime_error("mkdtemp failed");
+  path_ = CString::FromUtf8(templ);
+}
+
+TempDir::~TempDir() { RemoveDir(path_, L"*.*"); }
+
+CString TempDir::operator/(const wchar_t* name) const { return PathJoin(path_, name); }
+
+std::string ReadFileBytes(const wchar_t* path) {
+  std::ifstream in(NativePath(path), std::ios::binary);
+  std::ostringstream s;
+  s << in.rdbuf();
+  return s.str();
+}
+
+void WriteFileBytes(const wchar_t* path, const std::string& bytes) {
+  std::ofstream out(NativePath(path), std::ios::binary | std::ios::trunc);
+  out << bytes;
+}
+
+DataRootScope::DataRootScope(const wchar_t* root) : previous_(g_szAppDataPath) {
+  SetSharedText(g_szAppDataPath, root);
+}
+
+DataRootScope::~DataRootScope() { SetSharedText(g_szAppDataPath, previous_); }
+
+}  // namespace navmisc::testutil
