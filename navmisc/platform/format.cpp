@@ -1,6 +1,8 @@
 #include "navmisc/platform/format.h"
 
 #include <charconv>
+#include <cmath>
+#include <cstdint>
 #include <cstdio>
 #include <cstring>
 #include <cwchar>
@@ -209,9 +211,67 @@ std::basic_string<Char> VFormat(const Char* fmt, va_list in_args) {
   return out;
 }
 
+// "%.*f" for the common case, exactly as printf rounds it: the double is m * 2^e with an integer
+// m, so value * 10^d is m * 10^d / 2^-e, an exact 128-bit integer division whose remainder
+// decides the rounding (half to even, like printf on an exact tie). Returns false when the value
+// is outside the range this handles.
+bool FastFixed(char* buf, size_t& len, double value, int decimals) {
+  if (decimals < 0 || decimals > 9 || !std::isfinite(value) || std::fabs(value) >= 1e15) return false;
+  static constexpr uint64_t kPow10[] = {1, 10, 100, 1000, 10000, 100000, 1000000, 10000000,
+                                        100000000, 1000000000};
+  uint64_t bits;
+  std::memcpy(&bits, &value, sizeof bits);
+  const bool negative = bits >> 63;
+  const int exp_bits = static_cast<int>((bits >> 52) & 0x7FF);
+  uint64_t mant = bits & ((uint64_t{1} << 52) - 1);
+  int e;
+  if (exp_bits == 0) {
+    e = -1074;  // subnormal (or zero)
+  } else {
+    mant |= uint64_t{1} << 52;
+    e = exp_bits - 1075;
+  }
+  const uint64_t scale = kPow10[decimals];
+  unsigned __int128 q;
+  if (e >= 0) {
+    q = (static_cast<unsigned __int128>(mant) * scale) << e;  // |value| < 1e15 keeps this small
+  } else {
+    const int shift = -e;
+    const unsigned __int128 n = static_cast<unsigned __int128>(mant) * scale;
+    if (shift > 100) {
+      q = 0;  // far below half a unit of the last digit
+    } else {
+      q = n >> shift;
+      const unsigned __int128 rem = n - (q << shift);
+      const unsigned __int128 half = static_cast<unsigned __int128>(1) << (shift - 1);
+      if (rem > half || (rem == half && (q & 1))) ++q;
+    }
+  }
+  const uint64_t whole = static_cast<uint64_t>(q / scale);
+  uint64_t frac = static_cast<uint64_t>(q % scale);
+  char* p = buf;
+  if (negative) *p++ = '-';
+  p = std::to_chars(p, p + 24, whole).ptr;
+  if (decimals > 0) {
+    *p++ = '.';
+    for (int i = decimals - 1; i >= 0; --i) {
+      p[i] = static_cast<char>('0' + frac % 10);
+      frac /= 10;
+    }
+    p += decimals;
+  }
+  len = static_cast<size_t>(p - buf);
+  return true;
+}
+
 template <class Out>
 void AppendFixedImpl(Out& out, double value, int decimals) {
   char buf[400];
+  size_t len;
+  if (FastFixed(buf, len, value, decimals)) {
+    AppendAscii(out, std::string_view(buf, len));
+    return;
+  }
   auto r = std::to_chars(buf, buf + sizeof buf, value, std::chars_format::fixed, decimals);
   if (r.ec != std::errc()) {
     AppendAscii(out, Snprintf("%." + std::to_string(decimals) + "f", value));

@@ -1,0 +1,145 @@
+#include "navmisc/platform/secret.h"
+
+#include <fcntl.h>
+#include <sodium.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <array>
+#include <cstdlib>
+#include <mutex>
+#include <optional>
+#include <string>
+#include <vector>
+
+#include "navmisc/platform/files.h"
+
+namespace navmisc {
+namespace {
+
+constexpr char kPrefix[] = "v1:";
+using Key = std::array<unsigned char, crypto_secretbox_KEYBYTES>;
+
+class Fd {
+ public:
+  explicit Fd(int fd) : fd_(fd) {}
+  ~Fd() {
+    if (fd_ >= 0) ::close(fd_);
+  }
+  Fd(const Fd&) = delete;
+  Fd& operator=(const Fd&) = delete;
+  int get() const { return fd_; }
+
+ private:
+  int fd_;
+};
+
+bool ReadAll(int fd, unsigned char* p, size_t n) {
+  while (n > 0) {
+    ssize_t r = ::read(fd, p, n);
+    if (r < 0 && errno == EINTR) continue;
+    if (r <= 0) return false;
+    p += r;
+    n -= static_cast<size_t>(r);
+  }
+  return true;
+}
+
+bool WriteAll(int fd, const unsigned char* p, size_t n) {
+  while (n > 0) {
+    ssize_t r = ::write(fd, p, n);
+    if (r < 0 && errno == EINTR) continue;
+    if (r <= 0) return false;
+    p += r;
+    n -= static_cast<size_t>(r);
+  }
+  return true;
+}
+
+// Reads the key, creating it on first use. The key file is made with O_EXCL so that two
+// processes racing to create it end up with the same key.
+std::optional<Key> LoadKey(bool create) {
+  const std::string path = NativePath(SecretKeyPath());
+  Key key;
+  for (int attempt = 0; attempt < 2; ++attempt) {
+    Fd in(::open(path.c_str(), O_RDONLY | O_NOFOLLOW | O_CLOEXEC));
+    if (in.get() >= 0) {
+      if (ReadAll(in.get(), key.data(), key.size())) return key;
+      return std::nullopt;  // a damaged key file is never replaced: that would lose the secret
+    }
+    if (!create || errno != ENOENT) return std::nullopt;
+    const CString folder = PathFolder(SecretKeyPath());
+    MakeDir(folder);
+    ::chmod(NativePath(folder).c_str(), 0700);
+    const std::string tmp = path + ".new";
+    Fd out(::open(tmp.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_NOFOLLOW | O_CLOEXEC, 0600));
+    if (out.get() < 0) continue;
+    randombytes_buf(key.data(), key.size());
+    const bool ok = WriteAll(out.get(), key.data(), key.size()) && ::fsync(out.get()) == 0;
+    // link() fails when another process made the key first; then its key is read instead.
+    if (ok) ::link(tmp.c_str(), path.c_str());
+    ::unlink(tmp.c_str());
+  }
+  return std::nullopt;
+}
+
+bool SodiumReady() {
+  static const bool ready = sodium_init() >= 0;
+  return ready;
+}
+
+}  // namespace
+
+CString SecretKeyPath() {
+  if (const char* p = std::getenv("NAVMISC_KEY_FILE"); p && *p) return CString::FromUtf8(p);
+  std::string base;
+  if (const char* x = std::getenv("XDG_CONFIG_HOME"); x && *x) {
+    base = x;
+  } else {
+    const char* home = std::getenv("HOME");
+    base = std::string(home && *home ? home : "/tmp") + "/.config";
+  }
+  return CString::FromUtf8(base + "/navmisc/secret.key");
+}
+
+CString ProtectSecret(const CString& clear) {
+  if (clear.IsEmpty() || !SodiumReady()) return {};
+  const auto key = LoadKey(true);
+  if (!key) return {};
+  const std::string plain = clear.ToUtf8();
+  std::vector<unsigned char> sealed(crypto_secretbox_NONCEBYTES + crypto_secretbox_MACBYTES + plain.size());
+  unsigned char* nonce = sealed.data();
+  randombytes_buf(nonce, crypto_secretbox_NONCEBYTES);
+  crypto_secretbox_easy(nonce + crypto_secretbox_NONCEBYTES,
+                        reinterpret_cast<const unsigned char*>(plain.data()), plain.size(), nonce,
+                        key->data());
+  std::string b64(sodium_base64_encoded_len(sealed.size(), sodium_base64_VARIANT_ORIGINAL), '\0');
+  sodium_bin2base64(b64.data(), b64.size(), sealed.data(), sealed.size(), sodium_base64_VARIANT_ORIGINAL);
+  b64.resize(std::char_traits<char>::length(b64.c_str()));
+  return CString::FromUtf8(kPrefix + b64);
+}
+
+bool UnprotectSecret(const CString& stored, CString& clear) {
+  clear.Empty();
+  const std::string text = stored.ToUtf8();
+  if (text.rfind(kPrefix, 0) != 0 || !SodiumReady()) return false;
+  std::vector<unsigned char> sealed(text.size());
+  size_t len = 0;
+  if (sodium_base642bin(sealed.data(), sealed.size(), text.c_str() + 3, text.size() - 3, nullptr,
+                        &len, nullptr, sodium_base64_VARIANT_ORIGINAL) != 0 ||
+      len < crypto_secretbox_NONCEBYTES + crypto_secretbox_MACBYTES) {
+    return false;
+  }
+  const auto key = LoadKey(false);
+  if (!key) return false;
+  std::string plain(len - crypto_secretbox_NONCEBYTES - crypto_secretbox_MACBYTES, '\0');
+  if (crypto_secretbox_open_easy(reinterpret_cast<unsigned char*>(plain.data()),
+                                 sealed.data() + crypto_secretbox_NONCEBYTES,
+                                 len - crypto_secretbox_NONCEBYTES, sealed.data(), key->data()) != 0) {
+    return false;
+  }
+  clear = CString::FromUtf8(plain);
+  return true;
+}
+
+}  // namespace navmisc

@@ -1,0 +1,231 @@
+#include "navmisc/records/point_codec.h"
+
+#include <cctype>
+#include <charconv>
+#include <cstdlib>
+
+#include "navmisc/platform/format.h"
+#include "navmisc/records/point_file_format.h"
+
+namespace navmisc::point_file {
+namespace {
+
+void Int(std::string& out, long long v) { AppendInt(out, v); }
+void Fixed(std::string& out, double v) { AppendFixed(out, v, kDecimals); }
+void Comma(std::string& out) { out.push_back(','); }
+void End(std::string& out) { out.append(kLineEnd); }
+
+bool IsSpace(char c) { return c == ' ' || c == '\t' || c == '\n' || c == '\r' || c == '\v' || c == '\f'; }
+
+// "%d": blanks, an optional sign, at least one digit.
+bool ScanInt(std::string_view s, size_t& i, int32_t& out) {
+  size_t p = i;
+  while (p < s.size() && IsSpace(s[p])) ++p;
+  bool neg = false;
+  if (p < s.size() && (s[p] == '+' || s[p] == '-')) neg = s[p++] == '-';
+  const size_t digits = p;
+  unsigned long long v = 0;
+  while (p < s.size() && s[p] >= '0' && s[p] <= '9') {
+    if (v < (1ull << 40)) v = v * 10 + static_cast<unsigned>(s[p] - '0');
+    ++p;
+  }
+  if (p == digits) return false;
+  const long long signedV = neg ? -static_cast<long long>(v) : static_cast<long long>(v);
+  out = static_cast<int32_t>(signedV);
+  i = p;
+  return true;
+}
+
+// "%lf": blanks, then a floating-point number as strtod reads it.
+bool ScanDouble(std::string_view s, size_t& i, double& out) {
+  size_t p = i;
+  while (p < s.size() && IsSpace(s[p])) ++p;
+  const char* first = s.data() + p;
+  const char* last = s.data() + s.size();
+  bool plus = false;
+  if (first < last && *first == '+') {
+    plus = true;
+    ++first;
+  }
+  double v;
+  auto r = std::from_chars(first, last, v);
+  if (r.ec == std::errc() && !(plus && first < last && *first == '-')) {
+    // from_chars reads no hexadecimal; "0x.." must go through strtod.
+    const bool hex = (r.ptr - first == 1 && *first == '0' && r.ptr < last && (*r.ptr == 'x' || *r.ptr == 'X'));
+    if (!hex) {
+      out = v;
+      i = static_cast<size_t>(r.ptr - s.data());
+      return true;
+    }
+  }
+  // Rare forms (inf, nan, hexadecimal, out of range): the C library's reading.
+  std::string copy(s.substr(p, 64));
+  CLocaleScope c_locale;
+  char* end = nullptr;
+  v = std::strtod(copy.c_str(), &end);
+  if (end == copy.c_str()) return false;
+  out = v;
+  i = p + static_cast<size_t>(end - copy.c_str());
+  return true;
+}
+
+bool Expect(std::string_view s, size_t& i, char c) {
+  if (i < s.size() && s[i] == c) {
+    ++i;
+    return true;
+  }
+  return false;
+}
+
+// atoi/atof of one token.
+int32_t TokenInt(std::string_view t) {
+  size_t i = 0;
+  int32_t v = 0;
+  return ScanInt(t, i, v) ? v : 0;
+}
+double TokenDouble(std::string_view t) {
+  size_t i = 0;
+  double v = 0.0;
+  return ScanDouble(t, i, v) ? v : 0.0;
+}
+
+// Calls `f(index, token)` for each comma-separated token.
+template <class F>
+void ForEachToken(std::string_view line, F f) {
+  int index = 0;
+  size_t start = 0;
+  for (;;) {
+    const size_t comma = line.find(',', start);
+    f(index++, line.substr(start, comma == std::string_view::npos ? std::string_view::npos : comma - start));
+    if (comma == std::string_view::npos) return;
+    start = comma + 1;
+  }
+}
+
+}  // namespace
+
+void AppendPointLine(std::string& out, const WAYPOINT_ITEM_INFO& p) {
+  Int(out, p.time); Comma(out);
+  Fixed(out, p.latitude); Comma(out);
+  Fixed(out, p.longitude); Comma(out);
+  Fixed(out, p.altitude); Comma(out);
+  Int(out, p.speed); Comma(out);
+  Int(out, p.type); Comma(out);
+  Int(out, p.course); Comma(out);
+  Int(out, p.extraA); Comma(out);
+  Int(out, p.extraB);
+  End(out);
+}
+
+void AppendCellFixLine(std::string& out, const BASE_ITEM_INFO& c) {
+  Int(out, c.time); Comma(out);
+  out += c.name.ToUtf8(); Comma(out);
+  Fixed(out, c.latitude); Comma(out);
+  Fixed(out, c.longitude);
+  End(out);
+}
+
+void AppendHelpPointLine(std::string& out, const WAYPOINT_ITEM_INFO& p) {
+  Int(out, p.time); Comma(out);
+  out += p.name.ToUtf8(); Comma(out);
+  Fixed(out, p.latitude); Comma(out);
+  Fixed(out, p.longitude); Comma(out);
+  Fixed(out, p.altitude); Comma(out);
+  Int(out, p.speed); Comma(out);
+  Int(out, p.type); Comma(out);
+  Int(out, p.course); Comma(out);
+  Int(out, p.extraA);
+  End(out);
+}
+
+void AppendHeartRateLine(std::string& out, int32_t time, const uint8_t* values, int count) {
+  Int(out, time);
+  // The terminating 255 is written too, so a short record ends in ",255".
+  for (int i = 0; i < count; ++i) {
+    Comma(out);
+    Int(out, values[i]);
+    if (values[i] == 255) break;
+  }
+  End(out);
+}
+
+void AppendWheelSpeedLine(std::string& out, const WHEEL_SPEED_ITEM_INFO& w) {
+  Int(out, w.time);
+  for (double v : w.values) {
+    Comma(out);
+    Fixed(out, v);
+    if (v == -1.0) break;
+  }
+  End(out);
+}
+
+int ScanPointLine(std::string_view line, WAYPOINT_ITEM_INFO& p) {
+  size_t i = 0;
+  int32_t time = p.time, speed = p.speed, type = p.type, course = p.course, a = p.extraA, b = p.extraB;
+  double lat = p.latitude, lon = p.longitude, alt = p.altitude;
+  int n = 0;
+  // Each field is stored as soon as it is read, so a line that breaks off keeps what it had.
+  if (ScanInt(line, i, time)) { p.time = time; ++n; } else return n;
+  if (!Expect(line, i, ',') || !ScanDouble(line, i, lat)) return n;
+  p.latitude = lat; ++n;
+  if (!Expect(line, i, ',') || !ScanDouble(line, i, lon)) return n;
+  p.longitude = lon; ++n;
+  if (!Expect(line, i, ',') || !ScanDouble(line, i, alt)) return n;
+  p.altitude = alt; ++n;
+  if (!Expect(line, i, ',') || !ScanInt(line, i, speed)) return n;
+  p.speed = speed; ++n;
+  if (!Expect(line, i, ',') || !ScanInt(line, i, type)) return n;
+  p.type = type; ++n;
+  if (!Expect(line, i, ',') || !ScanInt(line, i, course)) return n;
+  p.course = course; ++n;
+  if (!Expect(line, i, ',') || !ScanInt(line, i, a)) return n;
+  p.extraA = a; ++n;
+  if (!Expect(line, i, ',') || !ScanInt(line, i, b)) return n;
+  p.extraB = b; ++n;
+  return n;
+}
+
+void ParseCellFixLine(std::string_view line, BASE_ITEM_INFO& c) {
+  ForEachToken(line, [&](int k, std::string_view t) {
+    switch (k) {
+      case 0: c.time = TokenInt(t); break;
+      case 1: c.name = CString::FromUtf8(t); break;
+      case 2: c.latitude = TokenDouble(t); break;
+      case 3: c.longitude = TokenDouble(t); break;
+      default: break;
+    }
+  });
+}
+
+void ParseHelpPointLine(std::string_view line, WAYPOINT_ITEM_INFO& p) {
+  ForEachToken(line, [&](int k, std::string_view t) {
+    switch (k) {
+      case 0: p.time = TokenInt(t); break;
+      case 1: p.name = CString::FromUtf8(t); break;
+      case 2: p.latitude = TokenDouble(t); break;
+      case 3: p.longitude = TokenDouble(t); break;
+      case 4: p.altitude = TokenDouble(t); break;
+      case 5: p.speed = TokenInt(t); break;
+      case 6: p.type = TokenInt(t); break;
+      case 7: p.course = TokenInt(t); break;
+      case 8: p.extraA = TokenInt(t); break;
+      default: break;
+    }
+  });
+}
+
+void ParseByteSampleLine(std::string_view line, int32_t& time, uint8_t* values, int capacity) {
+  ForEachToken(line, [&](int k, std::string_view t) {
+    if (k == 0) time = TokenInt(t);
+    else if (k <= capacity) values[k - 1] = static_cast<uint8_t>(TokenInt(t));
+  });
+}
+
+void ParseWheelSpeedLine(std::string_view line, WHEEL_SPEED_ITEM_INFO& w) {
+  ForEachToken(line, [&](int k, std::string_view t) {
+    if (k == 0) w.time = TokenInt(t);
+    else if (k <= WHEEL_SPEED_ITEM_INFO::kValues) w.values[k - 1] = TokenDouble(t);
+  });
+}
+
+}  // namespace navmisc::point_file

@@ -1,0 +1,155 @@
+#include "navmisc/records/trip_tree.h"
+
+#include "navmisc/platform/files.h"
+#include "navmisc/platform/settings.h"
+#include "navmisc/platform/shared_globals.h"
+
+using navmisc::DeleteAll;
+using navmisc::Items;
+
+namespace {
+
+constexpr const wchar_t* kRootSection = L"SECTION";
+
+CString ResourceFolder() { return GetAppDataFolder(GPS_APP_TRIP); }
+CString TreeFile() { return PathJoin(ResourceFolder(), L"RESOURCE_INFO.INI"); }
+CString OldTreeFile() { return PathJoin(ResourceFolder(), L"AMBRO_V20.INI"); }
+
+// A tree file of the earlier format replaces the current one and is then removed.
+void MigrateOldTreeFile() {
+  const CString old = OldTreeFile();
+  if (!FileExists(old)) return;
+  if (!CopyFile(old, TreeFile(), false)) return;  // never delete the only copy
+  for (int attempt = 0; attempt < 3; ++attempt) {
+    const int status = PathStatus(old);
+    if (status == 2 || status == 3) return;
+    SetFileNormal(old);
+    if (DeleteFile(old)) return;
+    SleepMs(50);
+  }
+}
+
+}  // namespace
+
+BLOG_TREE_NODE::BLOG_TREE_NODE(BLOG_TREE_NODE* from) {
+  if (!from) return;
+  name = from->name;
+  value2 = from->value2;
+  for (auto* t : Items<BLOG_ITEM_INFO>(from->trips)) trips.AddTail(new BLOG_ITEM_INFO(t, nullptr, 0));
+  for (auto* c : Items<BLOG_TREE_NODE>(from->children)) children.AddTail(new BLOG_TREE_NODE(c));
+}
+
+BLOG_TREE_NODE::~BLOG_TREE_NODE() {
+  DeleteAll<BLOG_ITEM_INFO>(trips);
+  DeleteAll<BLOG_TREE_NODE>(children);
+}
+
+void BLOG_TREE_NODE::WriteInfo(bool writeTrips, unsigned long handle, const wchar_t* section) {
+  const bool root = handle == 0;
+  if (root) {
+    MakeDir(ResourceFolder());
+    handle = WR_BEGIN(TreeFile());
+    section = kRootSection;
+  }
+  WR_STRING(handle, section, L"tree_node_name", name);
+  WR_INT(handle, section, L"trip_item_info_count", trips.GetCount());
+  int n = 0;
+  for (auto* t : Items<BLOG_ITEM_INFO>(trips)) {
+    WR_STRING(handle, section, FormatString(L"trip_item_info_(%d)_resource", n++), t->tripId);
+    if (writeTrips) t->WriteInfo(1, nullptr, nullptr);
+  }
+  WR_INT(handle, section, L"trip_tree_node_count", children.GetCount());
+  n = 0;
+  for (auto* c : Items<BLOG_TREE_NODE>(children)) {
+    c->WriteInfo(writeTrips, handle, FormatString(L"%s_%d", section, n++));
+  }
+  if (root) WR_END(handle);
+}
+
+int BLOG_TREE_NODE::ReadInfo(unsigned long handle, const wchar_t* section) {
+  const bool root = handle == 0;
+  if (root) {
+    readComplete = false;
+    MigrateOldTreeFile();
+    handle = RD_BEGIN(TreeFile());
+    if (!handle) return 0;
+    section = kRootSection;
+  }
+  name = RD_STRING(handle, section, L"tree_node_name", L"");
+  if (name.IsEmpty()) {
+    if (root) RD_END(handle);
+    return 0;
+  }
+  const int tripCount = RD_INT(handle, section, L"trip_item_info_count", 0);
+  for (int n = 0; n < tripCount; ++n) {
+    const CString id = RD_STRING(handle, section, FormatString(L"trip_item_info_(%d)_resource", n), L"");
+    // Only a plain folder name may come from the file; anything else drops out like a trip
+    // whose folder is gone.
+    if (!IsPlainPathComponent(id)) continue;
+    auto* trip = new BLOG_ITEM_INFO(GPS_APP_TRIP, id, 0);
+    if (trip->ReadInfo() == 1) trips.AddTail(trip);
+    else delete trip;
+  }
+  const int childCount = RD_INT(handle, section, L"trip_tree_node_count", 0);
+  for (int n = 0; n < childCount; ++n) {
+    auto* child = new BLOG_TREE_NODE(nullptr);
+    if (child->ReadInfo(handle, FormatString(L"%s_%d", section, n)) == 1) children.AddTail(child);
+    else delete child;
+  }
+  if (root) {
+    RD_END(handle);
+    readComplete = true;
+  }
+  return 1;
+}
+
+BLOG_TREE_NODE* BLOG_TREE_NODE::_FindNodeFmBlogItem(BLOG_ITEM_INFO* trip) {
+  if (trips.Find(trip)) return this;
+  for (auto* c : Items<BLOG_TREE_NODE>(children))
+    if (BLOG_TREE_NODE* found = c->_FindNodeFmBlogItem(trip)) return found;
+  return nullptr;
+}
+
+BLOG_ITEM_INFO* BLOG_TREE_NODE::FindBlogItemFmServerID(CString serverId) {
+  for (auto* t : Items<BLOG_ITEM_INFO>(trips))
+    if (t->serverId == serverId) return t;
+  for (auto* c : Items<BLOG_TREE_NODE>(children))
+    if (BLOG_ITEM_INFO* found = c->FindBlogItemFmServerID(serverId)) return found;
+  return nullptr;
+}
+
+bool BLOG_TREE_NODE::ReplaceBlogItem(BLOG_ITEM_INFO* old, BLOG_ITEM_INFO* replacement) {
+  if (POSITION pos = trips.Find(old)) {
+    trips.RemoveAt(pos);
+    trips.AddTail(replacement);  // at the end, not in old's place
+    return true;
+  }
+  for (auto* c : Items<BLOG_TREE_NODE>(children))
+    if (c->ReplaceBlogItem(old, replacement)) return true;
+  return false;
+}
+
+void BLOG_TREE_NODE::_FindAllUsedResource(CStringList& ids) {
+  for (auto* t : Items<BLOG_ITEM_INFO>(trips)) ids.AddTail(t->tripId);
+  for (auto* c : Items<BLOG_TREE_NODE>(children)) c->_FindAllUsedResource(ids);
+}
+
+void BLOG_TREE_NODE::RemoveAllUnusedResource() {
+  // Deleting folders on the word of a tree that was not read whole would delete live trips.
+  if (!readComplete) return;
+  CStringList used;
+  _FindAllUsedResource(used);
+  const CString folder = PathFolder(PathJoin(ResourceFolder(), L"dumy.file"));
+  CStringList entries;
+  if (GetContent(folder, L"*.*", entries) < 0) return;
+  for (const CString& entry : entries) {
+    if (used.Find(entry)) continue;
+    const CString path = PathJoin(folder, entry);
+    // Only folders are trip resources; the tree file and other files stay, and a symbolic link
+    // is never followed into somewhere else.
+    if (!IsDirectory(path)) continue;
+    RemoveDir(path, L"*.*");
+    SleepMs(100);
+    RemoveDir(path, L"*.*");
+  }
+}
