@@ -24,14 +24,20 @@ bool ScanInt(std::string_view s, size_t& i, int32_t& out) {
   bool neg = false;
   if (p < s.size() && (s[p] == '+' || s[p] == '-')) neg = s[p++] == '-';
   const size_t digits = p;
+  // Like the C reader: the number is taken as a long, clamped on overflow, then cut to 32 bits.
   unsigned long long v = 0;
+  bool overflow = false;
   while (p < s.size() && s[p] >= '0' && s[p] <= '9') {
-    if (v < (1ull << 40)) v = v * 10 + static_cast<unsigned>(s[p] - '0');
+    const unsigned d = static_cast<unsigned>(s[p] - '0');
+    if (v > (9223372036854775807ull - d) / 10) overflow = true;
+    else v = v * 10 + d;
     ++p;
   }
   if (p == digits) return false;
-  const long long signedV = neg ? -static_cast<long long>(v) : static_cast<long long>(v);
-  out = static_cast<int32_t>(signedV);
+  long long signedV;
+  if (overflow) signedV = neg ? (-9223372036854775807ll - 1) : 9223372036854775807ll;
+  else signedV = neg ? -static_cast<long long>(v) : static_cast<long long>(v);
+  out = static_cast<int32_t>(static_cast<uint32_t>(static_cast<unsigned long long>(signedV)));
   i = p;
   return true;
 }
@@ -47,16 +53,15 @@ bool ScanDouble(std::string_view s, size_t& i, double& out) {
     plus = true;
     ++first;
   }
+  // from_chars reads no hexadecimal: "0x.." (after a sign) goes through strtod below.
+  const char* digits = (first < last && *first == '-') ? first + 1 : first;
+  const bool hex = last - digits >= 2 && digits[0] == '0' && (digits[1] == 'x' || digits[1] == 'X');
   double v;
   auto r = std::from_chars(first, last, v);
-  if (r.ec == std::errc() && !(plus && first < last && *first == '-')) {
-    // from_chars reads no hexadecimal; "0x.." must go through strtod.
-    const bool hex = (r.ptr - first == 1 && *first == '0' && r.ptr < last && (*r.ptr == 'x' || *r.ptr == 'X'));
-    if (!hex) {
-      out = v;
-      i = static_cast<size_t>(r.ptr - s.data());
-      return true;
-    }
+  if (!hex && r.ec == std::errc() && !(plus && *first == '-')) {
+    out = v;
+    i = static_cast<size_t>(r.ptr - s.data());
+    return true;
   }
   // Rare forms (inf, nan, hexadecimal, out of range): the C library's reading.
   std::string copy(s.substr(p, 64));

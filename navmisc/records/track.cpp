@@ -189,7 +189,7 @@ void TRACK_ITEM_INFO::ReadAllWaypoint(int force) {
       auto* p = new WAYPOINT_ITEM_INFO(nullptr);
       pf::ScanPointLine(line, *p);
       // Times stored by the old release need the profile's shift; the writer never removes it.
-      p->time = static_cast<int32_t>(p->time + shift);
+      p->time = static_cast<int32_t>(static_cast<uint32_t>(p->time) + static_cast<uint32_t>(shift));
       points.AddTail(p);
     }
     reader.Close();
@@ -197,7 +197,7 @@ void TRACK_ITEM_INFO::ReadAllWaypoint(int force) {
   // Every loaded track has at least two points.
   if (points.GetCount() == 1) {
     auto* second = new WAYPOINT_ITEM_INFO(static_cast<WAYPOINT_ITEM_INFO*>(points.GetHead()));
-    second->time += 1;
+    second->time = static_cast<int32_t>(static_cast<uint32_t>(second->time) + 1u);  // wraps, never overflows
     points.AddTail(second);
   }
   if (trip && trip->appType == GPS_APP_TRACKER) {

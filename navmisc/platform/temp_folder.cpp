@@ -1,0 +1,12 @@
+#include "navmisc/platform/temp_folder.h"
+
+#include <stdlib.h>
+
+#include <string>
+
+CString CreateTempFolder(const wchar_t* prefix) {
+  const char* tmp = getenv("TMPDIR");
+  std::string templ = std::string(tmp && *tmp ? tmp : "/tmp") + "/" + CString(prefix).ToUtf8() + "-XXXXXX";
+  if (!mkdtemp(templ.data())) return {};
+  return CString::FromUtf8(templ);
+}

@@ -1,0 +1,263 @@
+#include "navmisc/records/track.h"
+
+#include <gtest/gtest.h>
+
+#include <clocale>
+#include <cstdio>
+#include <memory>
+#include <random>
+
+#include "navmisc/platform/atomic_file.h"
+#include "navmisc/platform/files.h"
+#include "navmisc/platform/format.h"
+#include "navmisc/records/trip.h"
+#include "navmisc/records/user_profile.h"
+#include "testutil.h"
+
+using navmisc::testutil::DataRootScope;
+using navmisc::testutil::ReadFileBytes;
+using navmisc::testutil::TempDir;
+using navmisc::testutil::WriteFileBytes;
+
+namespace {
+
+class TrackFiles : public ::testing::Test {
+ protected:
+  void SetUp() override {
+    for (auto* p : {&g_TripMapInfo, &g_SportMapInfo, &g_TrackerMapInfo, &g_WhereMapInfo}) p->Reset();
+  }
+  void TearDown() override {
+    for (auto* p : {&g_TripMapInfo, &g_SportMapInfo, &g_TrackerMapInfo, &g_WhereMapInfo}) p->Reset();
+    navmisc::testing::FailAtomicWritesAfter(-1);
+  }
+  std::unique_ptr<BLOG_ITEM_INFO> MakeTrip(GPS_APP_PROG_TYPE type) {
+    auto trip = std::make_unique<BLOG_ITEM_INFO>(type, L"TRIP1", 0);
+    MakeDir(trip->GetResourcePath());
+    return trip;
+  }
+  static WAYPOINT_ITEM_INFO* Point(int32_t time, double lat, double lon) {
+    auto* p = new WAYPOINT_ITEM_INFO(nullptr);
+    p->time = time;
+    p->latitude = lat;
+    p->longitude = lon;
+    return p;
+  }
+
+  TempDir root_;
+  DataRootScope scope_{root_.path()};
+};
+
+TEST_F(TrackFiles, WritesEachFileInItsExactLineFormat) {
+  auto trip = MakeTrip(GPS_APP_TRACKER);
+  TRACK_ITEM_INFO track(trip.get());
+  auto* p = Point(1000000000, 25.0339, 121.5645);
+  p->altitude = -3.25;
+  p->speed = 4500;
+  p->type = -2;
+  p->course = 359;
+  p->extraA = -8;
+  p->extraB = 7;
+  track.points.AddTail(p);
+  auto* cell = new BASE_ITEM_INFO(nullptr);
+  cell->time = 5;
+  cell->name = L"466-92-1234";
+  cell->latitude = -33.5;
+  cell->longitude = 151.25;
+  track.cellFixes.AddTail(cell);
+  auto* help = Point(6, 1.0, 2.0);
+  help->name = L"SOS";
+  help->extraB = 99;  // not part of the help-point line
+  track.helpPoints.AddTail(help);
+  auto* full = new HEARTRATE_ITEM_INFO(nullptr);
+  full->time = 10;
+  for (int i = 0; i < 24; ++i) full->values[i] = static_cast<uint8_t>(100 + i);
+  auto* shortHr = new HEARTRATE_ITEM_INFO(nullptr);
+  shortHr->time = 11;
+  shortHr->values[0] = 90;
+  shortHr->values[1] = 91;
+  track.heartRates.AddTail(full);
+  track.heartRates.AddTail(shortHr);
+  auto* cs = new CYCLING_CADENCE_RPM_ITEM_INFO(nullptr);
+  cs->time = 12;
+  track.cadences.AddTail(cs);
+  auto* ws = new WHEEL_SPEED_ITEM_INFO(nullptr);
+  ws->time = 13;
+  track.wheelSpeeds.AddTail(ws);
+
+  int counter = 0;
+  track.WriteAllWaypoint(1, &counter, nullptr);
+  EXPECT_EQ(counter, 7) << "one per line written";
+
+  EXPECT_EQ(ReadFileBytes(track.GetFilePathName()),
+            "1000000000,25.033900,121.564500,-3.250000,4500,-2,359,-8,7\r\n");
+  EXPECT_EQ(ReadFileBytes(track.GetCellIDFilePathName()), "5,466-92-1234,-33.500000,151.250000\r\n");
+  EXPECT_EQ(ReadFileBytes(track.GetSOSPointFilePathName()),
+            "6,SOS,1.000000,2.000000,0.000000,0,0,-1,0\r\n");
+  std::string hr = "10";
+  for (int i = 0; i < 24; ++i) hr += "," + std::to_string(100 + i);
+  EXPECT_EQ(ReadFileBytes(track.GetHeartRateFilePathName()), hr + "\r\n11,90,91,255\r\n");
+  EXPECT_EQ(ReadFileBytes(track.GetCyclingCadenceFilePathName()), "12,255\r\n");
+  EXPECT_EQ(ReadFileBytes(track.GetWheelSpeedFilePathName()), "13,-1.000000\r\n");
+
+  // Reading gives back what was written.
+  TRACK_ITEM_INFO again(trip.get());
+  again.id = track.id;
+  again.ReadAllWaypoint(1);
+  ASSERT_EQ(again.points.GetCount(), 2);  // a single point is doubled
+  auto* back = static_cast<WAYPOINT_ITEM_INFO*>(again.points.GetHead());
+  EXPECT_TRUE(*back == *p);
+  EXPECT_EQ(back->extraB, 7);
+  auto* second = static_cast<WAYPOINT_ITEM_INFO*>(again.points.GetTail());
+  EXPECT_EQ(second->time, p->time + 1);
+  ASSERT_EQ(again.cellFixes.GetCount(), 1);
+  EXPECT_EQ(static_cast<BASE_ITEM_INFO*>(again.cellFixes.GetHead())->name, L"466-92-1234");
+  ASSERT_EQ(again.heartRates.GetCount(), 2);
+  EXPECT_EQ(static_cast<HEARTRATE_ITEM_INFO*>(again.heartRates.GetHead())->UsedCount(), 24);
+  EXPECT_EQ(static_cast<HEARTRATE_ITEM_INFO*>(again.heartRates.GetTail())->UsedCount(), 2);
+  ASSERT_EQ(again.wheelSpeeds.GetCount(), 1);
+  EXPECT_EQ(static_cast<WHEEL_SPEED_ITEM_INFO*>(again.wheelSpeeds.GetHead())->UsedCount(), 0);
+}
+
+TEST_F(TrackFiles, CorruptLinesGiveDefaultFieldsAndLineEndsMayBeLf) {
+  auto trip = MakeTrip(GPS_APP_TRIP);
+  TRACK_ITEM_INFO track(trip.get());
+  const std::string longLine(300, '7');
+  WriteFileBytes(track.GetFilePathName(),
+                 "100,1.5,2.5,3.5,4,5,6,7,8\n"    // LF only
+                 "200,1.5,oops,9,9,9,9,9,9\r\n"  // breaks off after the latitude
+                 "\r\n"                          // empty: all defaults
+                 "garbage\n" +
+                     longLine + "\n"  // read in pieces of 255 characters
+                 "300,+1e2,-0x1p1,inf");
+  track.ReadAllWaypoint(1);
+  ASSERT_EQ(track.points.GetCount(), 7);
+  POSITION pos = track.points.GetHeadPosition();
+  auto next = [&] { return static_cast<WAYPOINT_ITEM_INFO*>(track.points.GetNext(pos)); };
+  auto* a = next();
+  EXPECT_EQ(a->time, 100);
+  EXPECT_EQ(a->extraB, 8);
+  auto* b = next();
+  EXPECT_EQ(b->time, 200);
+  EXPECT_EQ(b->latitude, 1.5);
+  EXPECT_EQ(b->longitude, 0.0);
+  EXPECT_EQ(b->speed, 0);
+  EXPECT_EQ(b->course, -1);
+  auto* c = next();
+  EXPECT_EQ(c->time, -1);
+  EXPECT_EQ(next()->time, -1);
+  EXPECT_EQ(next()->time, -1) << "a run of 255 digits overflows like the C reader";
+  next();
+  auto* last = next();
+  EXPECT_EQ(last->time, 300);
+  EXPECT_EQ(last->latitude, 100.0);
+  EXPECT_EQ(last->longitude, -2.0);
+  EXPECT_TRUE(std::isinf(last->altitude));
+
+  // Side files of a short line leave the missing values at their defaults.
+  WriteFileBytes(track.GetHeartRateFilePathName(), "7,80\n,\n");
+  track.ReadAllWaypoint(1);
+  ASSERT_EQ(track.heartRates.GetCount(), 2);
+  auto* hr = static_cast<HEARTRATE_ITEM_INFO*>(track.heartRates.GetHead());
+  EXPECT_EQ(hr->time, 7);
+  EXPECT_EQ(hr->values[0], 80);
+  EXPECT_EQ(hr->values[1], 255);
+}
+
+TEST_F(TrackFiles, LoadingRulesOfTheApplicationType) {
+  g_TrackerMapInfo.timeZoneShiftOn = true;
+  g_TrackerMapInfo.timeZoneShift = 3600;
+  g_TrackerMapInfo.dayLight = true;
+
+  auto tracker = MakeTrip(GPS_APP_TRACKER);
+  TRACK_ITEM_INFO t(tracker.get());
+  WriteFileBytes(t.GetFilePathName(), "1000000000,1.0,2.0,0.0,0,0,-1,0,0\r\n1000000005,1.0,2.0,0.0,0,0,-1,0,0\r\n");
+  WriteFileBytes(t.GetCellIDFilePathName(), "1000000000,cell,1.0,2.0\r\n");
+  WriteFileBytes(t.GetHeartRateFilePathName(), "1000000000,80\r\n");
+  t.ReadAllWaypoint(0);
+  EXPECT_EQ(static_cast<WAYPOINT_ITEM_INFO*>(t.points.GetHead())->time, 1000010800);
+  EXPECT_EQ(static_cast<BASE_ITEM_INFO*>(t.cellFixes.GetHead())->time, 1000000000) << "side files keep their times";
+  EXPECT_EQ(static_cast<HEARTRATE_ITEM_INFO*>(t.heartRates.GetHead())->time, 1000000000);
+
+  // Points already loaded are not read again without force.
+  WriteFileBytes(t.GetFilePathName(), "");
+  t.ReadAllWaypoint(0);
+  EXPECT_EQ(t.points.GetCount(), 2);
+
+  // Another application type neither reads nor rewrites the tracker-only files.
+  auto trip = MakeTrip(GPS_APP_TRIP);
+  TRACK_ITEM_INFO other(trip.get());
+  WriteFileBytes(other.GetFilePathName(), "5,1.0,2.0,0.0,0,0,-1,0,0\r\n");
+  WriteFileBytes(other.GetCellIDFilePathName(), "keep me\r\n");
+  other.ReadAllWaypoint(0);
+  EXPECT_TRUE(other.cellFixes.IsEmpty());
+  EXPECT_EQ(static_cast<WAYPOINT_ITEM_INFO*>(other.points.GetHead())->time, 5) << "no shift outside its profile";
+  auto* fix = new BASE_ITEM_INFO(nullptr);
+  other.cellFixes.AddTail(fix);
+  other.WriteAllWaypoint(1, nullptr, nullptr);
+  EXPECT_EQ(ReadFileBytes(other.GetCellIDFilePathName()), "keep me\r\n");
+
+  // Counting without writing: points, plus cell fixes for the tracker.
+  int counter = 0;
+  t.WriteAllWaypoint(0, &counter, nullptr);
+  EXPECT_EQ(counter, 3);
+  counter = 0;
+  other.WriteAllWaypoint(0, &counter, nullptr);
+  EXPECT_EQ(counter, 2);
+}
+
+TEST_F(TrackFiles, StoppedWritesShortenAndFailedWritesKeepTheOldFile) {
+  auto trip = MakeTrip(GPS_APP_TRIP);
+  TRACK_ITEM_INFO track(trip.get());
+  for (int i = 0; i < 5; ++i) track.points.AddTail(Point(i, 1.0, 2.0));
+  track.WriteAllWaypoint(1, nullptr, nullptr);
+  const std::string full = ReadFileBytes(track.GetFilePathName());
+
+  // A disk that fills up mid-write leaves the previous file as it was.
+  auto* extra = Point(99, 3.0, 4.0);
+  track.points.AddTail(extra);
+  navmisc::testing::FailAtomicWritesAfter(10);
+  track.WriteAllWaypoint(1, nullptr, nullptr);
+  navmisc::testing::FailAtomicWritesAfter(-1);
+  EXPECT_EQ(ReadFileBytes(track.GetFilePathName()), full);
+
+  // A stop on request keeps the lines written before it: here, none.
+  bool keepGoing = false;
+  int counter = 0;
+  track.WriteAllWaypoint(1, &counter, &keepGoing);
+  EXPECT_EQ(ReadFileBytes(track.GetFilePathName()), "");
+  EXPECT_EQ(counter, 0);
+
+  // An empty point list still rewrites the main file, empty.
+  TRACK_ITEM_INFO empty(trip.get());
+  empty.id = track.id;
+  empty.WriteAllWaypoint(1, nullptr, nullptr);
+  EXPECT_TRUE(FileExists(empty.GetFilePathName()));
+  EXPECT_EQ(ReadFileBytes(empty.GetFilePathName()), "");
+}
+
+TEST(PointNumbers, FixedDecimalsMatchTheCLibraryWhateverTheLocale) {
+  // Comma-decimal locales must not leak into files.
+  const char* previous = std::setlocale(LC_NUMERIC, nullptr);
+  const std::string saved = previous ? previous : "C";
+  const bool comma = std::setlocale(LC_NUMERIC, "de_DE.UTF-8") != nullptr;
+  std::mt19937_64 rng(42);
+  std::uniform_real_distribution<double> wide(-1e9, 1e9);
+  std::uniform_real_distribution<double> small(-200.0, 200.0);
+  std::vector<double> values = {0.0, -0.0, 0.0078125, 0.5e-6, 2.5e-7, -1e-9, 121.5, 1e14, -0.0000005,
+                                999999.9999995, 4.9e-324, 0.1, 0.7, 1.0000005};
+  for (int i = 0; i < 20000; ++i) values.push_back(i % 2 ? wide(rng) : small(rng));
+  for (double v : values) {
+    std::string ours;
+    navmisc::AppendFixed(ours, v, 6);
+    char ref[512];
+    {
+      navmisc::CLocaleScope c;
+      std::snprintf(ref, sizeof ref, "%.6f", v);
+    }
+    ASSERT_EQ(ours, ref) << "value " << v;
+  }
+  std::setlocale(LC_NUMERIC, saved.c_str());
+  if (!comma) GTEST_SKIP() << "de_DE.UTF-8 is not installed; checked in the C locale only";
+}
+
+}  // namespace

@@ -1,0 +1,278 @@
+#include "navmisc/records/trip.h"
+
+#include <gtest/gtest.h>
+
+#include <memory>
+#include <regex>
+
+#include "navmisc/platform/atomic_file.h"
+#include "navmisc/platform/files.h"
+#include "navmisc/platform/resources.h"
+#include "navmisc/platform/settings.h"
+#include "navmisc/records/user_profile.h"
+#include "testutil.h"
+
+using navmisc::testutil::DataRootScope;
+using navmisc::testutil::ReadFileBytes;
+using navmisc::testutil::TempDir;
+using navmisc::testutil::WriteFileBytes;
+
+namespace {
+
+class TripRecord : public ::testing::Test {
+ protected:
+  void SetUp() override {
+    for (auto* p : {&g_TripMapInfo, &g_SportMapInfo, &g_TrackerMapInfo, &g_WhereMapInfo}) p->Reset();
+    WriteFileBytes(root_ / L"strings.ini", "[STRINGS]\n9616=Journey\n");
+    navmisc::SetResourceFile(root_ / L"strings.ini");
+  }
+  void TearDown() override {
+    for (auto* p : {&g_TripMapInfo, &g_SportMapInfo, &g_TrackerMapInfo, &g_WhereMapInfo}) p->Reset();
+    navmisc::SetResourceFile(L"");
+    navmisc::testing::FailAtomicWritesAfter(-1);
+  }
+  static WAYPOINT_ITEM_INFO* Point(int32_t time, double lat, double lon, int32_t type = 0) {
+    auto* p = new WAYPOINT_ITEM_INFO(nullptr);
+    p->time = time;
+    p->latitude = lat;
+    p->longitude = lon;
+    p->type = type;
+    return p;
+  }
+  // A trip with two tracks, a runner and a photo on the second track, saved.
+  std::unique_ptr<BLOG_ITEM_INFO> SavedTrip() {
+    auto trip = std::make_unique<BLOG_ITEM_INFO>(GPS_APP_TRIP, nullptr, 3);
+    for (int t = 0; t < 2; ++t) {
+      auto* track = new TRACK_ITEM_INFO(trip.get());
+      track->description = t ? L"Back" : L"Out";
+      track->runner = L"R1";
+      for (int i = 0; i < 3; ++i) track->points.AddTail(Point(1000 + 100 * t + i, 25 + i * 0.001, 121));
+      trip->tracks.AddTail(track);
+    }
+    auto* runner = new RUNNER_ITEM_INFO;
+    runner->id = L"R1";
+    runner->frameCount = 2;
+    runner->frameUrl[0] = L"f0.png";
+    runner->frameUrl[1] = L"f1.png";
+    trip->runners.AddTail(runner);
+    WriteFileBytes(PathJoin(trip->GetResourcePath(), L"f0.png"), "frame0");
+    auto* photo = new PHOTO_ITEM_INFO(trip.get(), L"", L"", L"");
+    photo->itemName = L"p.jpg";
+    photo->title = L"Line one\nline \"two\"";
+    photo->latitude = 25.001;
+    photo->longitude = 121.0;
+    photo->trackItemId = static_cast<TRACK_ITEM_INFO*>(trip->tracks.GetTail())->id;
+    trip->photos.AddTail(photo);
+    trip->coverPageId = photo->photoId;
+    WriteFileBytes(photo->GetFilePathName(), "jpeg bytes");
+    trip->WriteInfo(1, nullptr, nullptr);
+    trip->WriteAllWaypoint(1, nullptr, nullptr);
+    return trip;
+  }
+
+  TempDir root_;
+  DataRootScope scope_{root_.path()};
+};
+
+TEST_F(TripRecord, NewTripGetsAnIdFolderNameAndDefaults) {
+  g_TripMapInfo.tempMode = 4;
+  g_TripMapInfo.tempStyle = 7;
+  BLOG_ITEM_INFO trip(GPS_APP_TRIP, nullptr, 0x1B);
+  EXPECT_TRUE(std::regex_match(trip.tripId.ToUtf8(), std::regex("[0-9]{12}_B[0-9]{2}"))) << trip.tripId.ToUtf8();
+  EXPECT_TRUE(IsDirectory(trip.GetResourcePath()));
+  EXPECT_EQ(trip.GetResourcePath(), PathJoin(PathJoin(root_.path(), L"Resource"), trip.tripId));
+  EXPECT_TRUE(std::regex_match(trip.name.ToUtf8(), std::regex("Journey_[0-9]{14}"))) << trip.name.ToUtf8();
+  EXPECT_EQ(trip.fileName, trip.name);
+  EXPECT_TRUE(trip.optOptimize && trip.optRevise && trip.optRedundance);
+  EXPECT_EQ(trip.displayType, 2);
+  EXPECT_EQ(trip.playbackSpeed, 60);
+  EXPECT_EQ(trip.tempMode, 4);
+  EXPECT_EQ(trip.tempStyle, 7);
+  EXPECT_EQ(trip.zoom, 10);
+  EXPECT_FALSE(trip.languageId.IsEmpty());
+
+  BLOG_ITEM_INFO where(GPS_APP_WHEREAMI, nullptr, 0);
+  EXPECT_EQ(where.GetResourcePath(), PathJoin(PathJoin(root_.path(), L"WhereRes"), L"MAP_HTML"));
+
+  // Trips made in the same second never share a folder.
+  BLOG_ITEM_INFO again(GPS_APP_TRIP, nullptr, 0x1B);
+  EXPECT_NE(again.tripId, trip.tripId);
+}
+
+TEST_F(TripRecord, SettingsFileRoundTripAndCounters) {
+  auto trip = SavedTrip();
+  int counter = 0;
+  trip->WriteInfo(0, &counter, nullptr);
+  EXPECT_EQ(counter, 3 + 1 + 2 + 1) << "3, 1, one per track, one per photo";
+
+  BLOG_ITEM_INFO back(GPS_APP_TRIP, trip->tripId, 0);
+  ASSERT_EQ(back.ReadInfo(), 1);
+  EXPECT_EQ(back.name, trip->name);
+  EXPECT_EQ(back.coverPageId, trip->coverPageId);
+  EXPECT_TRUE(back.optOptimize);
+  EXPECT_EQ(back.displayType, 2);
+  ASSERT_EQ(back.tracks.GetCount(), 2);
+  ASSERT_EQ(back.runners.GetCount(), 1);
+  auto* runner = static_cast<RUNNER_ITEM_INFO*>(back.runners.GetHead());
+  EXPECT_EQ(runner->frameCount, 2);
+  EXPECT_EQ(runner->frameUrl[1], L"f1.png");
+  ASSERT_EQ(back.photos.GetCount(), 1);
+  auto* photo = static_cast<PHOTO_ITEM_INFO*>(back.photos.GetHead());
+  EXPECT_EQ(photo->title, L"Line one\nline \"two\"");
+  EXPECT_EQ(photo->latitude, 25.001);
+  EXPECT_EQ(photo->trip, &back);
+  // Points come on demand.
+  EXPECT_TRUE(static_cast<TRACK_ITEM_INFO*>(back.tracks.GetHead())->points.IsEmpty());
+  EXPECT_EQ(back.GetUTCStartTime(), 1000);
+  EXPECT_EQ(back.GetUTCEndTime(), 1102);
+
+  // The photo's height key is written in lower case and read back all the same.
+  const std::string text = ReadFileBytes(trip->GetBlogItemProfilePathName());
+  EXPECT_NE(text.find("dimension_h0="), std::string::npos);
+  EXPECT_NE(text.find("[SECTION_PH(0)]"), std::string::npos);
+  EXPECT_NE(text.find("[SECTION_TK(1)]"), std::string::npos);
+  EXPECT_NE(text.find("[SECTION_RN(0)]"), std::string::npos);
+}
+
+TEST_F(TripRecord, ReaderDefaultsDifferFromANewTrip) {
+  BLOG_ITEM_INFO trip(GPS_APP_TRIP, L"OLD1", 0);
+  MakeDir(trip.GetResourcePath());
+  WriteFileBytes(trip.GetBlogItemProfilePathName(),
+                 "[SECTION]\ntrip_item_id=OLD1\nname=Walk\ntrack_item_info_count=1\n"
+                 "[SECTION_TK(0)]\ntrack_item_id=TK_1\n");
+  WriteFileBytes(PathJoin(trip.GetResourcePath(), L"TK_1.BIN"),
+                 "1,0.0,0.0,0,0,0,-1,0,0\r\n2,1.0,1.0,0,0,-2,-1,0,0\r\n3,1.0,1.1,0,0,-1,-1,0,0\r\n"
+                 "4,1.0,1.2,0,0,5,-1,0,0\r\n");
+  ASSERT_EQ(trip.ReadInfo(), 1);
+  EXPECT_EQ(trip.fileName, L"Walk");
+  EXPECT_FALSE(trip.optOptimize);
+  EXPECT_EQ(trip.displayType, 0);
+  EXPECT_FALSE(trip.netDirty);
+  EXPECT_FALSE(trip.netPublic);
+  auto* track = static_cast<TRACK_ITEM_INFO*>(trip.tracks.GetHead());
+  EXPECT_EQ(track->color, 16711935u);
+  EXPECT_EQ(track->transparency, 10);
+
+  long total = 0, kept = 0;
+  EXPECT_EQ(trip.GetTrackInfo(total, kept), 1);
+  EXPECT_EQ(total, 3) << "the point at 0/0 is not counted";
+  EXPECT_EQ(kept, 3) << "optimisation off keeps everything";
+  trip.optOptimize = true;
+  trip.optRevise = true;
+  trip.optRedundance = true;
+  trip.optLevel = 1;
+  trip.GetTrackInfo(total, kept);
+  EXPECT_EQ(kept, 1);
+  trip.optRevise = false;
+  trip.GetTrackInfo(total, kept);
+  EXPECT_EQ(kept, 2);
+  trip.optRedundance = false;
+  trip.GetTrackInfo(total, kept);
+  EXPECT_EQ(kept, 3);
+
+  // Without tracks: the extreme times.
+  BLOG_ITEM_INFO empty(GPS_APP_TRIP, L"EMPTY", 0);
+  EXPECT_EQ(empty.GetUTCStartTime(), 2147483647L);
+  EXPECT_EQ(empty.GetUTCEndTime(), 0);
+}
+
+TEST_F(TripRecord, BadSettingsFilesFailToRead) {
+  const std::pair<const char*, const char*> cases[] = {
+      {"NOID", "[SECTION]\nname=x\n"},
+      {"ESCAPE", "[SECTION]\ntrip_item_id=../../etc\n"},
+  };
+  for (const auto& [folder, text] : cases) {
+    BLOG_ITEM_INFO trip(GPS_APP_TRIP, CString::FromUtf8(folder), 0);
+    MakeDir(trip.GetResourcePath());
+    WriteFileBytes(trip.GetBlogItemProfilePathName(), text);
+    EXPECT_EQ(trip.ReadInfo(), 0) << folder;
+  }
+  BLOG_ITEM_INFO missing(GPS_APP_TRIP, L"MISSING", 0);
+  EXPECT_EQ(missing.ReadInfo(), 0);
+  BLOG_ITEM_INFO escaping(GPS_APP_TRIP, L"..", 0);
+  EXPECT_TRUE(escaping.GetResourcePath().IsEmpty());
+  EXPECT_EQ(escaping.ReadInfo(), 0);
+
+  // A track id that could leave the folder drops that track only.
+  BLOG_ITEM_INFO trip(GPS_APP_TRIP, L"TRACKS", 0);
+  MakeDir(trip.GetResourcePath());
+  WriteFileBytes(trip.GetBlogItemProfilePathName(),
+                 "[SECTION]\ntrip_item_id=TRACKS\ntrack_item_info_count=2\n"
+                 "[SECTION_TK(0)]\ntrack_item_id=../x\n[SECTION_TK(1)]\ntrack_item_id=TK_2\n");
+  ASSERT_EQ(trip.ReadInfo(), 1);
+  ASSERT_EQ(trip.tracks.GetCount(), 1);
+  EXPECT_EQ(static_cast<TRACK_ITEM_INFO*>(trip.tracks.GetHead())->id, L"TK_2");
+}
+
+TEST_F(TripRecord, ProfileTimeShiftAndMapProfileRegeneration) {
+  g_SportMapInfo.timeZoneShiftOn = true;
+  g_SportMapInfo.dayLight = true;
+  BLOG_ITEM_INFO trip(GPS_APP_SPORT, L"SPORT1", 0);
+  MakeDir(trip.GetResourcePath());
+  WriteFileBytes(trip.GetBlogItemProfilePathName(), "[SECTION]\ntrip_item_id=SPORT1\ntime_zone_shift=-3600\n");
+  WriteFileBytes(trip.GetMapProfilePathName(), "old map");
+  ASSERT_EQ(trip.ReadInfo(), 1);
+  EXPECT_EQ(trip.timeZoneShift, 3600);
+  EXPECT_FALSE(FileExists(trip.GetMapProfilePathName()));
+
+  g_SportMapInfo.timeZoneShiftOn = false;
+  WriteFileBytes(trip.GetMapProfilePathName(), "old map");
+  ASSERT_EQ(trip.ReadInfo(), 1);
+  EXPECT_EQ(trip.timeZoneShift, -3600);
+  EXPECT_TRUE(FileExists(trip.GetMapProfilePathName()));
+}
+
+TEST_F(TripRecord, StoppedOrFailedWritesKeepTheOldSettingsFile) {
+  auto trip = SavedTrip();
+  const std::string before = ReadFileBytes(trip->GetBlogItemProfilePathName());
+  trip->name = L"Renamed";
+  bool keepGoing = false;
+  trip->WriteInfo(1, nullptr, &keepGoing);
+  EXPECT_EQ(ReadFileBytes(trip->GetBlogItemProfilePathName()), before);
+  navmisc::testing::FailAtomicWritesAfter(100);
+  trip->WriteInfo(1, nullptr, nullptr);
+  navmisc::testing::FailAtomicWritesAfter(-1);
+  EXPECT_EQ(ReadFileBytes(trip->GetBlogItemProfilePathName()), before);
+  trip->WriteInfo(1, nullptr, nullptr);
+  EXPECT_NE(ReadFileBytes(trip->GetBlogItemProfilePathName()), before);
+}
+
+TEST_F(TripRecord, DuplicateCopiesFilesAndCarriesAssociations) {
+  auto trip = SavedTrip();
+  BLOG_ITEM_INFO copy(trip.get(), nullptr, 1);
+  EXPECT_NE(copy.tripId, trip->tripId);
+  ASSERT_EQ(copy.tracks.GetCount(), 2);
+  ASSERT_EQ(copy.photos.GetCount(), 1);
+  auto* firstCopy = static_cast<TRACK_ITEM_INFO*>(copy.tracks.GetHead());
+  auto* secondCopy = static_cast<TRACK_ITEM_INFO*>(copy.tracks.GetTail());
+  auto* secondOrig = static_cast<TRACK_ITEM_INFO*>(trip->tracks.GetTail());
+  EXPECT_NE(secondCopy->id, secondOrig->id);
+  EXPECT_EQ(ReadFileBytes(secondCopy->GetFilePathName()), ReadFileBytes(secondOrig->GetFilePathName()));
+  EXPECT_EQ(firstCopy->description, L"Out");
+  EXPECT_EQ(ReadFileBytes(PathJoin(copy.GetResourcePath(), L"f0.png")), "frame0");
+  EXPECT_FALSE(FileExists(PathJoin(copy.GetResourcePath(), L"f1.png"))) << "a missing frame is skipped";
+  EXPECT_TRUE(IsDirectory(PathJoin(copy.GetResourcePath(), L"Thumbnail")));
+
+  auto* photo = static_cast<PHOTO_ITEM_INFO*>(copy.photos.GetHead());
+  auto* orig = static_cast<PHOTO_ITEM_INFO*>(trip->photos.GetHead());
+  EXPECT_NE(photo->photoId, orig->photoId);
+  EXPECT_EQ(copy.coverPageId, photo->photoId);
+  EXPECT_EQ(photo->trackItemId, secondCopy->id) << "the photo stays on the matching track";
+  EXPECT_EQ(ReadFileBytes(photo->GetFilePathName()), "jpeg bytes");
+
+  copy.ReadAllWaypoint(0);
+  EXPECT_EQ(secondCopy->points.GetCount(), 3);
+}
+
+TEST_F(TripRecord, ReadAllWaypointDropsTracksWithoutPoints) {
+  auto trip = SavedTrip();
+  auto* ghost = new TRACK_ITEM_INFO(trip.get());  // no file at all
+  trip->tracks.AddTail(ghost);
+  auto* emptyFile = new TRACK_ITEM_INFO(trip.get());
+  WriteFileBytes(emptyFile->GetFilePathName(), "");
+  trip->tracks.AddTail(emptyFile);
+  trip->ReadAllWaypoint(1);
+  EXPECT_EQ(trip->tracks.GetCount(), 2);
+}
+
+}  // namespace

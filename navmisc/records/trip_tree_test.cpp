@@ -1,0 +1,171 @@
+#include "navmisc/records/trip_tree.h"
+
+#include <gtest/gtest.h>
+#include <unistd.h>
+
+#include "navmisc/platform/files.h"
+#include "testutil.h"
+
+using navmisc::testutil::DataRootScope;
+using navmisc::testutil::ReadFileBytes;
+using navmisc::testutil::TempDir;
+using navmisc::testutil::WriteFileBytes;
+
+namespace {
+
+class TripTree : public ::testing::Test {
+ protected:
+  CString Resource() const { return root_ / L"Resource"; }
+  // A saved trip in the tree's folder.
+  BLOG_ITEM_INFO* NewTrip(const wchar_t* name) {
+    auto* t = new BLOG_ITEM_INFO(GPS_APP_TRIP, nullptr, 0);
+    t->name = name;
+    t->WriteInfo(1, nullptr, nullptr);
+    return t;
+  }
+  TempDir root_;
+  DataRootScope scope_{root_.path()};
+};
+
+TEST_F(TripTree, NestedTreeRoundTripsAndSearches) {
+  BLOG_TREE_NODE root(nullptr);
+  root.name = L"All";
+  auto* a = NewTrip(L"a");
+  root.trips.AddTail(a);
+  auto* child = new BLOG_TREE_NODE(nullptr);
+  child->name = L"2024";
+  auto* grandchild = new BLOG_TREE_NODE(nullptr);
+  grandchild->name = L"Summer";
+  auto* deep = NewTrip(L"deep");
+  deep->serverId = L"srv-9";
+  deep->WriteInfo(1, nullptr, nullptr);
+  grandchild->trips.AddTail(deep);
+  child->children.AddTail(grandchild);
+  root.children.AddTail(child);
+  root.WriteInfo(false, 0, nullptr);
+
+  const std::string text = ReadFileBytes(Resource() + L"/RESOURCE_INFO.INI");
+  EXPECT_NE(text.find("[SECTION_0_0]"), std::string::npos);
+
+  BLOG_TREE_NODE back(nullptr);
+  ASSERT_EQ(back.ReadInfo(0, nullptr), 1);
+  EXPECT_EQ(back.name, L"All");
+  ASSERT_EQ(back.children.GetCount(), 1);
+  auto* c = static_cast<BLOG_TREE_NODE*>(back.children.GetHead());
+  ASSERT_EQ(c->children.GetCount(), 1);
+  auto* g = static_cast<BLOG_TREE_NODE*>(c->children.GetHead());
+  ASSERT_EQ(g->trips.GetCount(), 1);
+  auto* found = back.FindBlogItemFmServerID(L"srv-9");
+  ASSERT_NE(found, nullptr);
+  EXPECT_EQ(found->name, L"deep");
+  EXPECT_EQ(back.FindBlogItemFmServerID(L"SRV-9"), nullptr) << "server ids match exactly";
+  EXPECT_EQ(back._FindNodeFmBlogItem(found), g);
+  BLOG_ITEM_INFO stranger(GPS_APP_TRIP, L"X", 0);
+  EXPECT_EQ(back._FindNodeFmBlogItem(&stranger), nullptr);
+}
+
+TEST_F(TripTree, InvalidOrMissingTreesReadAsNothing) {
+  BLOG_TREE_NODE none(nullptr);
+  EXPECT_EQ(none.ReadInfo(0, nullptr), 0);
+  MakeDir(Resource());
+  WriteFileBytes(Resource() + L"/RESOURCE_INFO.INI", "[SECTION]\ntrip_item_info_count=0\n");
+  EXPECT_EQ(none.ReadInfo(0, nullptr), 0);
+
+  // Trips whose folder is gone or whose id would leave the folder drop out.
+  auto* kept = NewTrip(L"kept");
+  WriteFileBytes(Resource() + L"/RESOURCE_INFO.INI",
+                 "[SECTION]\ntree_node_name=Root\ntrip_item_info_count=3\n"
+                 "trip_item_info_(0)_resource=../../outside\n"
+                 "trip_item_info_(1)_resource=gone\n"
+                 "trip_item_info_(2)_resource=" + kept->tripId.ToUtf8() + "\n"
+                 "trip_tree_node_count=1\n[SECTION_0]\n");
+  BLOG_TREE_NODE tree(nullptr);
+  ASSERT_EQ(tree.ReadInfo(0, nullptr), 1);
+  ASSERT_EQ(tree.trips.GetCount(), 1);
+  EXPECT_EQ(static_cast<BLOG_ITEM_INFO*>(tree.trips.GetHead())->name, L"kept");
+  EXPECT_TRUE(tree.children.IsEmpty()) << "a child without a name is not valid";
+  delete kept;
+}
+
+TEST_F(TripTree, ReplaceMovesTheReplacementToTheEnd) {
+  BLOG_TREE_NODE root(nullptr);
+  auto* x = new BLOG_ITEM_INFO(GPS_APP_TRIP, L"x", 0);
+  auto* y = new BLOG_ITEM_INFO(GPS_APP_TRIP, L"y", 0);
+  auto* z = new BLOG_ITEM_INFO(GPS_APP_TRIP, L"z", 0);
+  root.trips.AddTail(x);
+  root.trips.AddTail(y);
+  EXPECT_TRUE(root.ReplaceBlogItem(x, z));
+  ASSERT_EQ(root.trips.GetCount(), 2);
+  EXPECT_EQ(root.trips.GetHead(), y);
+  EXPECT_EQ(root.trips.GetTail(), z);
+  EXPECT_FALSE(root.ReplaceBlogItem(x, z));
+  delete x;  // the caller owns the old trip
+}
+
+TEST_F(TripTree, OldTreeFileReplacesTheCurrentOne) {
+  MakeDir(Resource());
+  WriteFileBytes(Resource() + L"/RESOURCE_INFO.INI", "[SECTION]\ntree_node_name=New\n");
+  WriteFileBytes(Resource() + L"/AMBRO_V20.INI", "[SECTION]\ntree_node_name=Old\n");
+  BLOG_TREE_NODE tree(nullptr);
+  ASSERT_EQ(tree.ReadInfo(0, nullptr), 1);
+  EXPECT_EQ(tree.name, L"Old");
+  EXPECT_FALSE(FileExists(Resource() + L"/AMBRO_V20.INI"));
+}
+
+TEST_F(TripTree, CleanUpRemovesOnlyUnnamedFoldersOfACompleteTree) {
+  BLOG_TREE_NODE root(nullptr);
+  root.name = L"Root";
+  auto* top = NewTrip(L"top");
+  root.trips.AddTail(top);
+  auto* child = new BLOG_TREE_NODE(nullptr);
+  child->name = L"c";
+  auto* grandchild = new BLOG_TREE_NODE(nullptr);
+  grandchild->name = L"g";
+  auto* deep = NewTrip(L"deep");
+  grandchild->trips.AddTail(deep);
+  child->children.AddTail(grandchild);
+  root.children.AddTail(child);
+  root.WriteInfo(false, 0, nullptr);
+  const CString topId = top->tripId, deepId = deep->tripId;
+
+  MakeDir(Resource() + L"/orphan/sub");
+  WriteFileBytes(Resource() + L"/orphan/sub/file", "x");
+  // A link to a folder outside must not lead the clean-up there.
+  TempDir outside;
+  WriteFileBytes(outside / L"precious", "keep");
+  ASSERT_EQ(symlink(outside.path().ToUtf8().c_str(), (Resource() + L"/link").ToUtf8().c_str()), 0);
+
+  // A tree that was not read from its file never cleans up.
+  root.RemoveAllUnusedResource();
+  EXPECT_TRUE(IsDirectory(Resource() + L"/orphan"));
+
+  BLOG_TREE_NODE tree(nullptr);
+  ASSERT_EQ(tree.ReadInfo(0, nullptr), 1);
+  tree.RemoveAllUnusedResource();
+  EXPECT_FALSE(FileExists(Resource() + L"/orphan"));
+  EXPECT_TRUE(IsDirectory(PathJoin(Resource(), topId)));
+  EXPECT_TRUE(IsDirectory(PathJoin(Resource(), deepId)));
+  EXPECT_TRUE(FileExists(Resource() + L"/RESOURCE_INFO.INI"));
+  EXPECT_EQ(ReadFileBytes(outside / L"precious"), "keep");
+}
+
+TEST_F(TripTree, CopyDuplicatesEveryTrip) {
+  BLOG_TREE_NODE root(nullptr);
+  root.name = L"Root";
+  root.value2 = 5;
+  root.trips.AddTail(NewTrip(L"one"));
+  auto* child = new BLOG_TREE_NODE(nullptr);
+  child->name = L"c";
+  child->trips.AddTail(NewTrip(L"two"));
+  root.children.AddTail(child);
+  BLOG_TREE_NODE copy(&root);
+  EXPECT_EQ(copy.name, L"Root");
+  EXPECT_EQ(copy.value2, 5);
+  auto* t = static_cast<BLOG_ITEM_INFO*>(copy.trips.GetHead());
+  EXPECT_NE(t->tripId, static_cast<BLOG_ITEM_INFO*>(root.trips.GetHead())->tripId);
+  EXPECT_EQ(t->name, L"one");
+  ASSERT_EQ(copy.children.GetCount(), 1);
+  EXPECT_EQ(static_cast<BLOG_TREE_NODE*>(copy.children.GetHead())->trips.GetCount(), 1);
+}
+
+}  // namespace

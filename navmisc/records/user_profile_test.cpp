@@ -1,0 +1,224 @@
+#include "navmisc/records/user_profile.h"
+
+#include <gtest/gtest.h>
+
+#include <cstdlib>
+
+#include "navmisc/platform/files.h"
+#include "navmisc/platform/shared_globals.h"
+#include "testutil.h"
+
+using navmisc::testutil::DataRootScope;
+using navmisc::testutil::ReadFileBytes;
+using navmisc::testutil::TempDir;
+using navmisc::testutil::WriteFileBytes;
+
+namespace {
+
+class Profile : public ::testing::Test {
+ protected:
+  void SetUp() override {
+    setenv("NAVMISC_KEY_FILE", (keys_ / L"secret.key").ToUtf8().c_str(), 1);
+    MakeDir(root_ / L"TrackerRes");
+    MakeDir(root_ / L"SportRes");
+  }
+  void TearDown() override { unsetenv("NAVMISC_KEY_FILE"); }
+  void WriteProfile(const wchar_t* folder, const std::string& text) {
+    MakeDir(PathJoin(root_.path(), folder));
+    WriteFileBytes(PathJoin(PathJoin(root_.path(), folder), L"USER_MAP_INFO.INI"), text);
+  }
+
+  TempDir root_;
+  TempDir keys_;
+  DataRootScope scope_{root_.path()};
+};
+
+TEST_F(Profile, MissingFilesReadAsDefaults) {
+  USER_MAP_INFO p(GPS_APP_TRIP);
+  p.localize = L"DEU";
+  p.SetWeightHeight(1, 2, 2020, 70, 180);
+  p.ReadInfo();
+  EXPECT_EQ(p.localize, L"ENG");
+  EXPECT_EQ(p.height, 170.0);
+  EXPECT_EQ(p.weight, 60.0);
+  EXPECT_TRUE(p.male);
+  EXPECT_TRUE(p.metric);
+  EXPECT_TRUE(p.tutorial);
+  EXPECT_TRUE(p.verEnableCheck);
+  EXPECT_EQ(p.verCheckPeriodTime, 604800);
+  EXPECT_EQ(p.tempMode, 1);
+  EXPECT_EQ(p.tempStyle, 2);
+  EXPECT_TRUE(p.autoLaunch);
+  EXPECT_TRUE(p.geotagCallEditor);
+  EXPECT_FALSE(p.timeZoneShiftOn);
+  EXPECT_TRUE(p.weightHeights.IsEmpty());
+  EXPECT_EQ(p.GetProfilePathName(), PathJoin(PathJoin(root_.path(), L"Resource"), L"USER_MAP_INFO.INI"));
+}
+
+TEST_F(Profile, EveryValueAndListRoundTrips) {
+  g_sVersionInfo = {2, 1, 30, 4};
+  USER_MAP_INFO p(GPS_APP_TRACKER);
+  p.name = L"Zoë";
+  p.male = false;
+  p.year = 1980;
+  p.height = 181.5;
+  p.weight = 77.25;
+  p.userAccount = L"me@example.org";
+  p.trackerType = 3;
+  p.trackerTimeZone = L"+08:00";
+  p.trackerDayLight = true;
+  p.trackerTimeZoneShift = 28800;
+  p.metric = false;
+  p.localize = L"CHT";
+  p.dayLight = true;
+  p.timeZoneShift = -3600;
+  p.devVersion = 1.25;
+  p.devSerial = 12345;
+  p.exportGpx = L"/home/me/gpx folder";
+  auto* m = new MARKER_ITEM_INFO;
+  m->id = L"M1";
+  m->url = L"http://x/m1.png";
+  p.markers.AddTail(m);
+  auto* r = new RUNNER_ITEM_INFO;
+  r->id = L"R1";
+  r->frameCount = 2;
+  r->frameUrl[0] = L"a.png";
+  r->frameUrl[1] = L"b.png";
+  p.runners.AddTail(r);
+  p.SetWeightHeight(3, 14, 2021, 76.5, 181);
+  ASSERT_TRUE(p.WriteInfo());
+
+  USER_MAP_INFO q(GPS_APP_TRACKER);
+  q.ReadInfo();
+  EXPECT_EQ(q.name, L"Zoë");
+  EXPECT_FALSE(q.male);
+  EXPECT_EQ(q.year, 1980);
+  EXPECT_EQ(q.height, 181.5);
+  EXPECT_EQ(q.weight, 77.25);
+  EXPECT_EQ(q.userAccount, L"me@example.org");
+  EXPECT_EQ(q.trackerType, 3);
+  EXPECT_EQ(q.trackerTimeZone, L"+08:00");
+  EXPECT_TRUE(q.trackerDayLight);
+  EXPECT_EQ(q.trackerTimeZoneShift, 28800);
+  EXPECT_FALSE(q.metric);
+  EXPECT_EQ(q.localize, L"CHT");
+  EXPECT_EQ(q.version[0], 2);
+  EXPECT_EQ(q.version[3], 4);
+  EXPECT_FALSE(q.timeZoneShiftOn) << "written by a current version";
+  EXPECT_EQ(q.timeZoneShift, -3600);
+  EXPECT_EQ(q.devVersion, 1.25);
+  EXPECT_EQ(q.devSerial, 12345);
+  EXPECT_EQ(q.exportGpx, L"/home/me/gpx folder");
+  ASSERT_EQ(q.markers.GetCount(), 1);
+  EXPECT_EQ(static_cast<MARKER_ITEM_INFO*>(q.markers.GetHead())->url, L"http://x/m1.png");
+  ASSERT_EQ(q.runners.GetCount(), 1);
+  EXPECT_EQ(static_cast<RUNNER_ITEM_INFO*>(q.runners.GetHead())->frameUrl[1], L"b.png");
+  double w = 0, h = 0;
+  ASSERT_TRUE(q.GetWeightHeight(3, 14, 2021, w, h));
+  EXPECT_EQ(w, 76.5);
+  EXPECT_EQ(h, 181.0);
+
+  const std::string text = ReadFileBytes(q.GetProfilePathName());
+  EXPECT_NE(text.find("version=2,1,30,4"), std::string::npos);
+  EXPECT_NE(text.find("date=03/14/2021"), std::string::npos);
+  EXPECT_NE(text.find("[SECTION_MKR(0)]"), std::string::npos);
+  EXPECT_NE(text.find("url_1=b.png"), std::string::npos);
+  EXPECT_NE(text.find("tracker_timezone"), std::string::npos);
+
+  // Other applications neither keep nor read the tracker values.
+  USER_MAP_INFO sport(GPS_APP_SPORT);
+  sport.trackerType = 9;
+  ASSERT_TRUE(sport.WriteInfo());
+  EXPECT_EQ(ReadFileBytes(sport.GetProfilePathName()).find("tracker_"), std::string::npos);
+  WriteProfile(L"SportRes", "[SECTION]\ntracker_trackertype=5\n");
+  sport.ReadInfo();
+  EXPECT_EQ(sport.trackerType, 0);
+  g_sVersionInfo = {0, 0, 0, 0};
+}
+
+TEST_F(Profile, TimeShiftOnlyForTheOldReleaseVersions) {
+  const std::pair<const char*, bool> cases[] = {
+      {"1,0,807,0", true},     {"1,0,807,1599", true}, {"1,0,807,1600", false},
+      {"1,0,808,100", false},  {"1,0,807,-5", true},   {"", false},
+      {"1,0,807", true}  /* the missing fourth number stays 0 */,      {"x,0,807,1", false},   {"3, 2, 807, 12", true},
+  };
+  for (const auto& [version, on] : cases) {
+    WriteProfile(L"Resource", std::string("[SECTION]\nversion=") + version +
+                                  "\nday_light=1\ntime_zone_shift=3600\n");
+    g_TripMapInfo.ReadInfo();
+    EXPECT_EQ(g_TripMapInfo.timeZoneShiftOn, on) << version;
+    EXPECT_EQ(GetProfileTimeShift(GPS_APP_TRIP), on ? 3600 + 7200 : 0) << version;
+  }
+  g_TripMapInfo.Reset();
+  EXPECT_EQ(GetProfileTimeShift(GPS_APP_TRIP), 0);
+}
+
+TEST_F(Profile, PasswordIsStoredSealed) {
+  USER_MAP_INFO p(GPS_APP_TRIP);
+  p.password = L"s3cret-Pässword";
+  p.keepPassword = true;
+  ASSERT_TRUE(p.WriteInfo());
+  const std::string text = ReadFileBytes(p.GetProfilePathName());
+  EXPECT_EQ(text.find("s3cret"), std::string::npos);
+  EXPECT_NE(text.find("user_password=v1:"), std::string::npos);
+  USER_MAP_INFO q(GPS_APP_TRIP);
+  q.ReadInfo();
+  EXPECT_EQ(q.password, L"s3cret-Pässword");
+
+  // Altered text, another key, or a profile that does not keep it: no password.
+  std::string altered = text;
+  const size_t at = altered.find("user_password=v1:") + 20;
+  altered[at] = altered[at] == 'A' ? 'B' : 'A';
+  WriteProfile(L"Resource", altered);
+  q.ReadInfo();
+  EXPECT_TRUE(q.password.IsEmpty());
+  WriteProfile(L"Resource", text);
+  setenv("NAVMISC_KEY_FILE", (keys_ / L"other.key").ToUtf8().c_str(), 1);
+  q.ReadInfo();
+  EXPECT_TRUE(q.password.IsEmpty());
+  p.keepPassword = false;
+  ASSERT_TRUE(p.WriteInfo());
+  EXPECT_NE(ReadFileBytes(p.GetProfilePathName()).find("user_password=\n"), std::string::npos);
+}
+
+TEST_F(Profile, SuiteSettingsWinForTheVersionCheck) {
+  WriteProfile(L"Resource", "[SECTION]\nver_check_period_time=100\nver_unique_id=profile\n");
+  WriteFileBytes(root_ / L"AMBRO_SUITE_INFO.INI", "[SECTION]\nver_unique_id=suite\n");
+  USER_MAP_INFO p(GPS_APP_TRIP);
+  p.ReadInfo();
+  EXPECT_EQ(p.verUniqueId, L"suite");
+  EXPECT_EQ(p.verCheckPeriodTime, 100) << "a key the suite file lacks comes from the profile";
+  p.verLastCheckTime = 1700000000;
+  ASSERT_TRUE(p.WriteInfo());
+  EXPECT_NE(ReadFileBytes(root_ / L"AMBRO_SUITE_INFO.INI").find("ver_last_check_time=1700000000"), std::string::npos);
+}
+
+TEST_F(Profile, WeightHeightHistory) {
+  USER_MAP_INFO p(GPS_APP_SPORT);
+  double w = -1, h = -1;
+  EXPECT_FALSE(p.GetWeightHeight(1, 1, 2020, w, h));
+  EXPECT_EQ(w, -1);
+  EXPECT_FALSE(p.SetWeightHeight(6, 1, 2020, 80, 180));
+  EXPECT_TRUE(p.SetWeightHeight(6, 1, 2020, 78, 180));
+  EXPECT_EQ(p.weightHeights.GetCount(), 1);
+  EXPECT_FALSE(p.SetWeightHeight(1, 15, 2021, 75, 181));
+  EXPECT_FALSE(p.SetWeightHeight(12, 31, 2019, 85, 179));
+  const struct {
+    int month, day, year;
+    double weight;
+  } cases[] = {
+      {6, 1, 2020, 78},    // exact
+      {12, 1, 2020, 78},   // latest earlier entry
+      {1, 14, 2021, 78},
+      {1, 15, 2021, 75},
+      {3, 3, 2030, 75},
+      {1, 1, 2019, 85},    // before every entry: the earliest
+      {12, 31, 2019, 85},
+  };
+  for (const auto& c : cases) {
+    ASSERT_TRUE(p.GetWeightHeight(c.month, c.day, c.year, w, h));
+    EXPECT_EQ(w, c.weight) << c.month << "/" << c.day << "/" << c.year;
+  }
+}
+
+}  // namespace
