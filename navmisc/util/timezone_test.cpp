@@ -1,0 +1,63 @@
+#include "navmisc/util/timezone.h"
+
+#include <stdlib.h>
+#include <time.h>
+
+#include <chrono>
+#include <string>
+
+#include <gtest/gtest.h>
+
+namespace {
+
+// Sets TZ for the lifetime of the object, then puts back what was there.
+class TzScope {
+ public:
+  explicit TzScope(const char* tz) {
+    const char* old = getenv("TZ");
+    had_ = old != nullptr;
+    if (had_) old_ = old;
+    setenv("TZ", tz, 1);
+    tzset();
+  }
+  ~TzScope() {
+    if (had_) setenv("TZ", old_.c_str(), 1); else unsetenv("TZ");
+    tzset();
+  }
+
+ private:
+  bool had_ = false;
+  std::string old_;
+};
+
+TEST(TimeZone, ShiftAndDaylightByZone) {
+  struct Case {
+    const char* tz;
+    long shift_a, shift_b;  // the offset in standard and in daylight-saving time
+    int daylight;
+  } cases[] = {
+      {"Asia/Taipei", 28800, 28800, 0},
+      {"Europe/Berlin", 3600, 7200, 1},
+      {"UTC", 0, 0, 0},
+      {"America/New_York", -18000, -14400, 1},
+      {"Asia/Kolkata", 19800, 19800, 0},
+      {"Australia/Adelaide", 34200, 37800, 1},  // half-hour offset, summer at the year's ends
+      {"EST5", -18000, -18000, 0},              // POSIX rules, no database needed
+      {"CET-1CEST,M3.5.0,M10.5.0/3", 3600, 7200, 1},
+  };
+  for (const Case& c : cases) {
+    TzScope tz(c.tz);
+    const long shift = GetOSTimeZomeShift();
+    EXPECT_TRUE(shift == c.shift_a || shift == c.shift_b) << c.tz << ": " << shift;
+    EXPECT_EQ(System_DayLight(), c.daylight) << c.tz;
+  }
+}
+
+TEST(TimeZone, DaylightScanIsQuick) {
+  TzScope tz("Asia/Taipei");  // no change in the year: the whole year is scanned
+  const auto start = std::chrono::steady_clock::now();
+  EXPECT_EQ(System_DayLight(), 0);
+  EXPECT_LT(std::chrono::steady_clock::now() - start, std::chrono::milliseconds(50));
+}
+
+}  // namespace
