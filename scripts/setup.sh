@@ -12,6 +12,7 @@ packages=(
   libgtest-dev libgmock-dev libbenchmark-dev
   libxml2-utils gpsbabel gdal-bin zip unzip   # readers that check the exported documents
   tzdata
+  locales                              # a comma-decimal locale for the locale tests
 )
 
 missing=()
@@ -21,14 +22,26 @@ for p in "${packages[@]}"; do
   fi
 done
 
+SUDO=""
+if [ "$(id -u)" -ne 0 ]; then SUDO="sudo"; fi
+
+# Tests prove that numbers in files ignore the process locale; they need a comma-decimal locale.
+ensure_locale() {
+  if ! locale -a 2>/dev/null | grep -qix 'de_DE\.utf-\?8'; then
+    echo "setup: generating de_DE.UTF-8"
+    $SUDO sed -i 's/^# *de_DE.UTF-8 UTF-8/de_DE.UTF-8 UTF-8/' /etc/locale.gen
+    $SUDO locale-gen
+  fi
+}
+
 if [ ${#missing[@]} -eq 0 ]; then
   echo "setup: all packages present"
+  ensure_locale
   exit 0
 fi
 
-SUDO=""
-if [ "$(id -u)" -ne 0 ]; then SUDO="sudo"; fi
 echo "setup: installing ${missing[*]}"
 export DEBIAN_FRONTEND=noninteractive
 $SUDO apt-get update
 $SUDO apt-get install -y --no-install-recommends "${missing[@]}"
+ensure_locale

@@ -232,23 +232,30 @@ bool FastFixed(char* buf, size_t& len, double value, int decimals) {
     e = exp_bits - 1075;
   }
   const uint64_t scale = kPow10[decimals];
-  unsigned __int128 q;
+  unsigned __int128 q128;
   if (e >= 0) {
-    q = (static_cast<unsigned __int128>(mant) * scale) << e;  // |value| < 1e15 keeps this small
+    q128 = (static_cast<unsigned __int128>(mant) * scale) << e;  // |value| < 1e15 keeps this small
   } else {
     const int shift = -e;
     const unsigned __int128 n = static_cast<unsigned __int128>(mant) * scale;
     if (shift > 100) {
-      q = 0;  // far below half a unit of the last digit
+      q128 = 0;  // far below half a unit of the last digit
     } else {
-      q = n >> shift;
-      const unsigned __int128 rem = n - (q << shift);
+      q128 = n >> shift;
+      const unsigned __int128 rem = n - (q128 << shift);
       const unsigned __int128 half = static_cast<unsigned __int128>(1) << (shift - 1);
-      if (rem > half || (rem == half && (q & 1))) ++q;
+      if (rem > half || (rem == half && (q128 & 1))) ++q128;
     }
   }
-  const uint64_t whole = static_cast<uint64_t>(q / scale);
-  uint64_t frac = static_cast<uint64_t>(q % scale);
+  uint64_t whole, frac;
+  if ((q128 >> 64) == 0) {  // the usual case: plain 64-bit division
+    const uint64_t q = static_cast<uint64_t>(q128);
+    whole = q / scale;
+    frac = q % scale;
+  } else {
+    whole = static_cast<uint64_t>(q128 / scale);
+    frac = static_cast<uint64_t>(q128 % scale);
+  }
   char* p = buf;
   if (negative) *p++ = '-';
   p = std::to_chars(p, p + 24, whole).ptr;
@@ -312,6 +319,15 @@ std::string FormatA(const char* fmt, ...) {
 }
 
 void AppendFixed(std::string& out, double value, int decimals) { AppendFixedImpl(out, value, decimals); }
+
+char* WriteFixed(char* p, double value, int decimals) {
+  size_t len;
+  if (FastFixed(p, len, value, decimals)) return p + len;
+  std::string slow;
+  AppendFixedImpl(slow, value, decimals);
+  std::memcpy(p, slow.data(), slow.size());
+  return p + slow.size();
+}
 void AppendFixed(std::wstring& out, double value, int decimals) { AppendFixedImpl(out, value, decimals); }
 void AppendInt(std::string& out, long long value) { AppendIntImpl(out, value); }
 void AppendInt(std::wstring& out, long long value) { AppendIntImpl(out, value); }

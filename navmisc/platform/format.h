@@ -23,6 +23,9 @@ std::string FormatA(const char* fmt, ...) __attribute__((format(printf, 1, 2)));
 // the "C" locale (rounding included), without going through printf.
 void AppendFixed(std::string& out, double value, int decimals);
 void AppendFixed(std::wstring& out, double value, int decimals);
+// Writes the same text at `p` and returns its end. REQUIRES: room for 330 + decimals characters
+// (the longest "%.*f" of a double).
+char* WriteFixed(char* p, double value, int decimals);
 // Appends a plain decimal integer ("%d").
 void AppendInt(std::string& out, long long value);
 void AppendInt(std::wstring& out, long long value);

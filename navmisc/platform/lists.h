@@ -208,7 +208,7 @@ class BasicList {
   }
   void Grow() {
     // Raw storage for a block of nodes; values are constructed in place on use.
-    auto block = std::make_unique<Storage[]>(next_block_);
+    std::unique_ptr<Storage[]> block(new Storage[next_block_]);  // left uninitialised on purpose
     for (size_t i = 0; i < next_block_; ++i) {
       Node* n = reinterpret_cast<Node*>(&block[i]);
       n->next = free_;

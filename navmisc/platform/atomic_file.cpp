@@ -1,0 +1,200 @@
+#include "navmisc/platform/atomic_file.h"
+
+#include <fcntl.h>
+#include <limits.h>
+#include <stdlib.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <algorithm>
+#include <atomic>
+#include <cerrno>
+
+#include "navmisc/platform/files.h"
+
+namespace navmisc {
+namespace {
+
+// Large enough that a point file of a million lines costs a few hundred write calls, small
+// enough to be harmless per open file.
+constexpr size_t kBufferSize = 256 * 1024;
+// Permission bits of a file that did not exist before.
+constexpr mode_t kNewFileMode = 0644;
+
+// Bytes that may still be written before the injected fault; negative = no fault.
+std::atomic<long long> g_write_budget{-1};
+
+// How many of `wanted` bytes the fault injection lets through (all of them when it is off).
+size_t TakeWriteBudget(size_t wanted) {
+  long long budget = g_write_budget.load(std::memory_order_relaxed);
+  for (;;) {
+    if (budget < 0) return wanted;
+    const long long granted = std::min<long long>(budget, static_cast<long long>(wanted));
+    if (g_write_budget.compare_exchange_weak(budget, budget - granted, std::memory_order_relaxed)) {
+      return static_cast<size_t>(granted);
+    }
+  }
+}
+
+// Writes everything or fails; retries interrupted and partial writes. A shortened grant from
+// the fault injection writes what it allows and then fails with ENOSPC, like a full disk.
+bool WriteAll(int fd, const char* data, size_t size) {
+  const size_t allowed = TakeWriteBudget(size);
+  size_t done = 0;
+  while (done < allowed) {
+    const ssize_t n = ::write(fd, data + done, allowed - done);
+    if (n < 0) {
+      if (errno == EINTR) continue;
+      return false;
+    }
+    done += static_cast<size_t>(n);
+  }
+  if (allowed < size) {
+    errno = ENOSPC;
+    return false;
+  }
+  return true;
+}
+
+int RetryClose(int fd) {
+  // Linux releases the descriptor even when close reports EINTR; retrying could close a
+  // descriptor another thread just opened, so there is no retry here.
+  return ::close(fd);
+}
+
+bool FsyncRetry(int fd) {
+  for (;;) {
+    if (::fsync(fd) == 0) return true;
+    if (errno != EINTR) return false;
+  }
+}
+
+std::string FolderOf(const std::string& path) {
+  const size_t slash = path.rfind('/');
+  if (slash == std::string::npos) return ".";
+  if (slash == 0) return "/";
+  return path.substr(0, slash);
+}
+
+// The file that actually gets replaced: a symbolic link is followed, so that the link stays a
+// link and the file it names receives the new content.
+std::string ResolveTarget(const std::string& path) {
+  struct stat st;
+  if (::lstat(path.c_str(), &st) == 0 && S_ISLNK(st.st_mode)) {
+    char resolved[PATH_MAX];
+    if (::realpath(path.c_str(), resolved)) return resolved;
+  }
+  return path;
+}
+
+}  // namespace
+
+namespace testing {
+void FailAtomicWritesAfter(long long bytes) {
+  g_write_budget.store(bytes < 0 ? -1 : bytes, std::memory_order_relaxed);
+}
+}  // namespace testing
+
+AtomicFile::~AtomicFile() { Abandon(); }
+
+bool AtomicFile::Open(const wchar_t* path) {
+  Abandon();
+  if (!path || !*path) return false;
+  target_ = ResolveTarget(NativePath(path));
+  if (target_.empty() || target_.back() == '/') return false;
+
+  // The temporary file sits in the target's folder so that the final rename never crosses a
+  // file system; the leading dot keeps it out of ordinary listings.
+  // The name part is shortened so that the temporary name stays within NAME_MAX.
+  const size_t slash = target_.rfind('/');
+  const size_t name_start = slash == std::string::npos ? 0 : slash + 1;
+  std::string temp = target_.substr(0, name_start) + "." +
+                     target_.substr(name_start, 200) + ".tmp-XXXXXX";
+  const int fd = ::mkostemp(temp.data(), O_CLOEXEC);
+  if (fd < 0) return false;
+
+  // mkostemp creates 0600; a replaced file keeps its permission bits, a new one gets the usual
+  // 0644.
+  struct stat st;
+  const mode_t mode = (::stat(target_.c_str(), &st) == 0 && S_ISREG(st.st_mode)) ? (st.st_mode & 07777)
+                                                                                 : kNewFileMode;
+  if (::fchmod(fd, mode) != 0) {
+    RetryClose(fd);
+    ::unlink(temp.c_str());
+    return false;
+  }
+  fd_ = fd;
+  temp_ = std::move(temp);
+  failed_ = false;
+  buffer_.clear();
+  buffer_.reserve(kBufferSize);
+  return true;
+}
+
+bool AtomicFile::Write(std::string_view bytes) {
+  if (fd_ < 0 || failed_) return false;
+  if (buffer_.size() + bytes.size() <= kBufferSize) {
+    buffer_.append(bytes);
+    if (buffer_.size() == kBufferSize) return Flush();
+    return true;
+  }
+  if (!Flush()) return false;
+  if (bytes.size() >= kBufferSize) {
+    // A large block goes straight to the file rather than through the buffer.
+    if (!WriteAll(fd_, bytes.data(), bytes.size())) failed_ = true;
+    return !failed_;
+  }
+  buffer_.append(bytes);
+  return true;
+}
+
+bool AtomicFile::Flush() {
+  if (fd_ < 0 || failed_) return false;
+  if (!buffer_.empty()) {
+    if (!WriteAll(fd_, buffer_.data(), buffer_.size())) failed_ = true;
+    buffer_.clear();
+  }
+  return !failed_;
+}
+
+bool AtomicFile::Commit() {
+  if (fd_ < 0) return false;
+  // The data must be on disk before the rename makes it visible, or a crash could leave the
+  // target name pointing at an empty or partial file.
+  bool ok = Flush() && FsyncRetry(fd_);
+  const int fd = fd_;
+  fd_ = -1;
+  if (RetryClose(fd) != 0) ok = false;
+  if (ok && ::rename(temp_.c_str(), target_.c_str()) != 0) ok = false;
+  if (!ok) {
+    ::unlink(temp_.c_str());
+    temp_.clear();
+    buffer_.clear();
+    failed_ = false;
+    return false;
+  }
+  temp_.clear();
+  // Make the rename itself durable. The new content is in place either way, so a folder that
+  // cannot be synced does not fail the commit.
+  const int dir = ::open(FolderOf(target_).c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC);
+  if (dir >= 0) {
+    FsyncRetry(dir);
+    RetryClose(dir);
+  }
+  return true;
+}
+
+void AtomicFile::Abandon() {
+  if (fd_ >= 0) {
+    RetryClose(fd_);
+    fd_ = -1;
+  }
+  if (!temp_.empty()) {
+    ::unlink(temp_.c_str());
+    temp_.clear();
+  }
+  buffer_.clear();
+  failed_ = false;
+}
+
+}  // namespace navmisc

@@ -1,0 +1,450 @@
+#include "navmisc/platform/settings.h"
+
+#include <sys/stat.h>
+
+#include <cfloat>
+#include <climits>
+#include <clocale>
+#include <cmath>
+#include <filesystem>
+#include <string>
+#include <thread>
+#include <vector>
+
+#include <gtest/gtest.h>
+
+#include "navmisc/platform/atomic_file.h"
+#include "navmisc/platform/files.h"
+#include "testutil.h"
+
+namespace {
+
+using navmisc::testutil::ReadFileBytes;
+using navmisc::testutil::TempDir;
+using navmisc::testutil::WriteFileBytes;
+
+// Names of the entries in a folder, hidden ones included (temporary files start with a dot).
+std::vector<std::string> FolderEntries(const CString& folder) {
+  std::vector<std::string> names;
+  for (const auto& e : std::filesystem::directory_iterator(navmisc::NativePath(folder))) {
+    names.push_back(e.path().filename().string());
+  }
+  return names;
+}
+
+// Opens `bytes` written to a file for reading.
+unsigned long ReadBytes(const TempDir& dir, const std::string& bytes) {
+  const CString path = dir / L"in.ini";
+  WriteFileBytes(path, bytes);
+  return RD_BEGIN(path);
+}
+
+TEST(SettingsTest, EveryStringShapeRoundTrips) {
+  struct Case {
+    std::wstring value;
+    const char* written;  // the text after "k=" in the file, when it matters
+  };
+  const std::vector<Case> cases = {
+      {L"", ""},
+      {L"plain text", "plain text"},
+      {L"a=b;c#d[e]", "a=b;c#d[e]"},
+      {L";starts like a comment", ";starts like a comment"},
+      {L"#hash", "#hash"},
+      {L"[not a section]", "[not a section]"},
+      {L"quote \"inside\" and at end\"", "quote \"inside\" and at end\""},
+      {L"\"leading quote", R"("\"leading quote")"},
+      {L" leading blank", R"(" leading blank")"},
+      {L"trailing blank ", R"("trailing blank ")"},
+      {L"\ttab at start", R"("\ttab at start")"},
+      {L"line\nbreak", R"("line\nbreak")"},
+      {L"cr\rlf\r\n", R"("cr\rlf\r\n")"},
+      {L"back\\slash\\", R"("back\\slash\\")"},
+      {L"\\n is not a newline", R"("\\n is not a newline")"},
+      {L"bell\x07 del\x7F esc\x1B", R"("bell\x07 del\x7F esc\x1B")"},
+      {L"Grüße, Zürich – 東京", "Grüße, Zürich – 東京"},
+      {L"beyond the BMP: \U0001F6B4\U00010348", "beyond the BMP: \U0001F6B4\U00010348"},
+      {L"   ", R"("   ")"},
+      {L"\"", R"("\"")"},
+      {L"x\"", "x\""},
+  };
+  TempDir dir;
+  const CString path = dir / L"shapes.ini";
+  const unsigned long w = WR_BEGIN(path);
+  ASSERT_NE(w, 0u);
+  for (size_t i = 0; i < cases.size(); ++i) {
+    WR_STRING(w, L"S", FormatString(L"k%d", static_cast<int>(i)), cases[i].value.c_str());
+  }
+  ASSERT_EQ(WR_END(w), 1);
+
+  const std::string file = ReadFileBytes(path);
+  for (size_t i = 0; i < cases.size(); ++i) {
+    const std::string line = "\nk" + std::to_string(i) + "=" + cases[i].written + "\n";
+    EXPECT_NE(file.find(line), std::string::npos) << "value " << i << " not written as " << line;
+  }
+
+  const unsigned long r = RD_BEGIN(path);
+  ASSERT_NE(r, 0u);
+  for (size_t i = 0; i < cases.size(); ++i) {
+    const CString key = FormatString(L"k%d", static_cast<int>(i));
+    EXPECT_EQ(RD_STRING(r, L"S", key, L"<default>").str(), cases[i].value) << "value " << i;
+    EXPECT_TRUE(RD_EXISTS(r, L"S", key));
+  }
+  RD_END(r);
+}
+
+TEST(SettingsTest, NamesMatchWithoutCaseAndRewritesReplaceInPlace) {
+  TempDir dir;
+  const CString path = dir / L"case.ini";
+  const unsigned long w = WR_BEGIN(path);
+  WR_STRING(w, L"Trip", L"Title", L"first");
+  WR_INT(w, L"Other", L"n", 1);
+  WR_STRING(w, L"TRIP", L"dimension_h0", L"480");
+  WR_STRING(w, L"trip", L"TITLE", L"second");  // same key: replaces, keeps its place
+  WR_STRING(w, L"Straße", L"Ä", L"umlaut");
+  ASSERT_EQ(WR_END(w), 1);
+  EXPECT_EQ(ReadFileBytes(path),
+            "[Trip]\nTitle=second\ndimension_h0=480\n\n[Other]\nn=1\n\n[Straße]\nÄ=umlaut\n");
+
+  const unsigned long r = RD_BEGIN(path);
+  EXPECT_EQ(RD_STRING(r, L"tRiP", L"title"), L"second");
+  EXPECT_EQ(RD_INT(r, L"trip", L"DIMENSION_H0", 0), 480);
+  EXPECT_EQ(RD_INT(r, L"OTHER", L"N", 0), 1);
+  // Only ASCII letters fold; other letters match exactly as written.
+  EXPECT_EQ(RD_STRING(r, L"STRAßE", L"Ä"), L"umlaut");
+  EXPECT_FALSE(RD_EXISTS(r, L"Straße", L"ä"));
+  EXPECT_FALSE(RD_EXISTS(r, L"Trip", L"n"));
+  RD_END(r);
+}
+
+TEST(SettingsTest, NumbersRoundTripExactlyAndBadTextGivesDefault) {
+  const std::vector<double> doubles = {0.1, 1e-300, -0.0, DBL_MAX, -DBL_MAX, DBL_MIN,
+                                       DBL_TRUE_MIN, 4.9406564584124654e-324 * 3, 1.0 / 3,
+                                       123456789.125, -2.5e+20, INFINITY, -INFINITY};
+  const std::vector<int> ints = {0, -1, 42, INT_MAX, INT_MIN};
+  TempDir dir;
+  const CString path = dir / L"num.ini";
+  const unsigned long w = WR_BEGIN(path);
+  for (size_t i = 0; i < doubles.size(); ++i) WR_FLOAT(w, L"F", FormatString(L"d%d", int(i)), doubles[i]);
+  for (size_t i = 0; i < ints.size(); ++i) WR_INT(w, L"I", FormatString(L"i%d", int(i)), ints[i]);
+  WR_FLOAT(w, L"F", L"nan", NAN);
+  ASSERT_EQ(WR_END(w), 1);
+  EXPECT_NE(ReadFileBytes(path).find("\nd0=0.1\n"), std::string::npos);
+
+  const unsigned long r = RD_BEGIN(path);
+  for (size_t i = 0; i < doubles.size(); ++i) {
+    const double got = RD_FLOAT(r, L"F", FormatString(L"d%d", int(i)), 7);
+    EXPECT_EQ(got, doubles[i]) << i;
+    EXPECT_EQ(std::signbit(got), std::signbit(doubles[i])) << i;
+  }
+  for (size_t i = 0; i < ints.size(); ++i) EXPECT_EQ(RD_INT(r, L"I", FormatString(L"i%d", int(i)), 7), ints[i]);
+  EXPECT_TRUE(std::isnan(RD_FLOAT(r, L"F", L"nan", 7)));
+  RD_END(r);
+
+  struct Parse {
+    const char* text;
+    int as_int;  // -7 = the default
+    double as_float;
+  };
+  const std::vector<Parse> parses = {
+      {"12", 12, 12},          {"+7", 7, 7},          {"-0", 0, -0.0},
+      {"\"12\"", 12, 12},      {"12abc", -7, -7},     {"1.5", -7, 1.5},
+      {"1,5", -7, -7},         {"", -7, -7},          {"0x10", -7, -7},
+      {"2147483648", -7, 2147483648.0},               {"-2147483649", -7, -2147483649.0},
+      {"1e999", -7, -7},       {"abc", -7, -7},       {"+-1", -7, -7},
+      {"\" 12\"", -7, -7},     {"1e3", -7, 1000},     {"007", 7, 7},
+  };
+  std::string file = "[P]\n";
+  for (size_t i = 0; i < parses.size(); ++i) file += "v" + std::to_string(i) + "=" + parses[i].text + "\n";
+  const unsigned long p = ReadBytes(dir, file);
+  for (size_t i = 0; i < parses.size(); ++i) {
+    const CString key = FormatString(L"v%d", int(i));
+    EXPECT_EQ(RD_INT(p, L"P", key, -7), parses[i].as_int) << parses[i].text;
+    EXPECT_EQ(RD_FLOAT(p, L"P", key, -7), parses[i].as_float) << parses[i].text;
+  }
+  RD_END(p);
+}
+
+TEST(SettingsTest, NumbersIgnoreCommaDecimalLocale) {
+  const std::string previous = setlocale(LC_ALL, nullptr);
+  if (!setlocale(LC_ALL, "de_DE.UTF-8")) GTEST_SKIP() << "de_DE.UTF-8 not installed (scripts/setup.sh makes it)";
+  ASSERT_EQ(*localeconv()->decimal_point, ',');
+  TempDir dir;
+  const CString path = dir / L"de.ini";
+  const unsigned long w = WR_BEGIN(path);
+  WR_FLOAT(w, L"S", L"lat", 47.376887);
+  ASSERT_EQ(WR_END(w), 1);
+  const std::string text = ReadFileBytes(path);
+  const unsigned long r = RD_BEGIN(path);
+  const double lat = RD_FLOAT(r, L"S", L"lat", 0);
+  RD_END(r);
+  setlocale(LC_ALL, previous.c_str());
+  EXPECT_EQ(text, "[S]\nlat=47.376887\n");
+  EXPECT_EQ(lat, 47.376887);
+}
+
+TEST(SettingsTest, HandWrittenFilesReadAsDocumented) {
+  const std::string file =
+      "\xEF\xBB\xBF"
+      "top=before any header\r\n"
+      "; comment=not a key\r\n"
+      "  # another=comment\r\n"
+      "[ Trip ]\r\n"
+      "  title =  Morning run  \r\n"
+      "title=second occurrence is ignored\r\n"
+      "no equals sign here\r\n"
+      "=no key\r\n"
+      "quoted=\"a\\tb\\x41\\q\" trailing text ignored\r\n"
+      "open=\"unterminated \\n stays raw\r\n"
+      "empty=\r\n"
+      "eq=a=b\r\n"
+      "[Other]\n"
+      "k=other\n"
+      "[TRIP]\n"
+      "merged=yes\n"
+      "title=later section, still a duplicate\n"
+      "[broken\n"
+      "lost=1\n"
+      "[]\n"
+      "nameless=ok\n";
+  struct Expect {
+    const wchar_t* section;
+    const wchar_t* key;
+    const wchar_t* value;  // null = absent
+  };
+  const std::vector<Expect> expects = {
+      {L"", L"top", L"before any header"},
+      {L"", L"comment", nullptr},
+      {L"", L"; comment", nullptr},
+      {L"Trip", L"title", L"Morning run"},
+      {L"Trip", L"no equals sign here", nullptr},
+      {L"Trip", L"quoted", L"a\tbA\\q"},
+      {L"Trip", L"open", L"\"unterminated \\n stays raw"},
+      {L"Trip", L"empty", L""},
+      {L"Trip", L"eq", L"a=b"},
+      {L"Trip", L"merged", L"yes"},
+      {L"other", L"k", L"other"},
+      {L"broken", L"lost", nullptr},
+      {L"Trip", L"lost", nullptr},
+      {L"", L"nameless", L"ok"},
+  };
+  TempDir dir;
+  const unsigned long r = ReadBytes(dir, file);
+  ASSERT_NE(r, 0u);
+  for (const auto& e : expects) {
+    EXPECT_EQ(RD_EXISTS(r, e.section, e.key), e.value != nullptr) << e.key;
+    if (e.value) {
+      EXPECT_EQ(RD_STRING(r, e.section, e.key, L"<default>"), e.value) << e.key;
+    }
+  }
+  RD_END(r);
+}
+
+TEST(SettingsTest, DamagedFilesReadWhatTheyCan) {
+  TempDir dir;
+  {  // NUL bytes, control characters and invalid UTF-8
+    const char raw[] = "[S]\nnul=a\0b\nk\0x=1\n\xFF\xFE=2\nbad=\xC3(\xFF\nz=\"\\x00\"\n";
+    const unsigned long r = ReadBytes(dir, std::string(raw, sizeof raw - 1));
+    EXPECT_EQ(RD_STRING(r, L"S", L"nul").str(), L"a");
+    EXPECT_EQ(RD_STRING(r, L"S", L"bad"), L"\xFFFD(\xFFFD");
+    EXPECT_EQ(RD_STRING(r, L"S", L"z").str(), L"");
+    EXPECT_TRUE(RD_EXISTS(r, L"S", L"z"));
+    EXPECT_EQ(RD_INT(r, L"S", L"\xFFFD\xFFFD", 0), 2);
+    RD_END(r);
+  }
+  {  // UTF-16 with a byte-order mark, both byte orders, a pair beyond the BMP included
+    const std::u16string text = u"[S]\r\nk=Grüße \U0001F6B4\r\n";
+    std::string le = "\xFF\xFE", be = "\xFE\xFF";
+    for (char16_t u : text) {
+      le += {static_cast<char>(u & 0xFF), static_cast<char>(u >> 8)};
+      be += {static_cast<char>(u >> 8), static_cast<char>(u & 0xFF)};
+    }
+    for (const std::string& bytes : {le, be}) {
+      const unsigned long r = ReadBytes(dir, bytes);
+      EXPECT_EQ(RD_STRING(r, L"s", L"K"), L"Grüße \U0001F6B4");
+      RD_END(r);
+    }
+  }
+  {  // A 100 MB line costs neither unbounded memory nor the lines after it; values over 1 MiB
+     // are dropped, values of exactly 1 MiB kept.
+    std::string big = "[S]\nhuge=" + std::string(100 << 20, 'x') + "\nafter=1\n";
+    big += "max=" + std::string(1 << 20, 'y') + "\nover=" + std::string((1 << 20) + 1, 'z') + "\n";
+    const unsigned long r = ReadBytes(dir, big);
+    EXPECT_FALSE(RD_EXISTS(r, L"S", L"huge"));
+    EXPECT_EQ(RD_INT(r, L"S", L"after", 0), 1);
+    EXPECT_EQ(RD_STRING(r, L"S", L"max").GetLength(), 1 << 20);
+    EXPECT_FALSE(RD_EXISTS(r, L"S", L"over"));
+    RD_END(r);
+  }
+  {  // Not a file at all
+    EXPECT_EQ(RD_BEGIN(dir / L"missing.ini"), 0u);
+    EXPECT_EQ(RD_BEGIN(dir.path()), 0u);
+    EXPECT_EQ(RD_BEGIN(L""), 0u);
+  }
+}
+
+TEST(SettingsTest, FailedOrUnfinishedWritesLeaveTheOldFile) {
+  TempDir dir;
+  const CString path = dir / L"keep.ini";
+  const std::string old = "[S]\nk=old\n";
+  WriteFileBytes(path, old);
+  auto write_new = [&] {
+    const unsigned long w = WR_BEGIN(path);
+    WR_STRING(w, L"S", L"k", L"a new value that is longer than the old one");
+    WR_INT(w, L"S", L"n", 5);
+    return WR_END(w);
+  };
+  // The new document has 54 bytes: fail at its first, second, middle and last byte.
+  for (long long budget : {0LL, 1LL, 20LL, 53LL}) {
+    navmisc::testing::FailAtomicWritesAfter(budget);
+    const int result = write_new();
+    navmisc::testing::FailAtomicWritesAfter(-1);
+    EXPECT_EQ(result, 0) << budget;
+    EXPECT_EQ(ReadFileBytes(path), old) << budget;
+    EXPECT_EQ(FolderEntries(dir.path()), std::vector<std::string>{"keep.ini"}) << budget;
+  }
+
+  const unsigned long unended = WR_BEGIN(path);
+  WR_STRING(unended, L"S", L"k", L"never written");
+  EXPECT_EQ(ReadFileBytes(path), old);
+  EXPECT_EQ(WR_END(WR_BEGIN(dir / L"no/such/folder.ini")), 0);
+
+  ASSERT_EQ(write_new(), 1);
+  const unsigned long r = RD_BEGIN(path);
+  EXPECT_EQ(RD_INT(r, L"S", L"n", 0), 5);
+  RD_END(r);
+  EXPECT_EQ(WR_END(unended), 1);  // still usable, and now it replaces the file
+}
+
+TEST(SettingsTest, UnknownHandlesAndInvalidNamesDoNothing) {
+  TempDir dir;
+  const CString path = dir / L"h.ini";
+  WriteFileBytes(path, "[S]\nk=1\n");
+  const unsigned long r1 = RD_BEGIN(path), r2 = RD_BEGIN(path);
+  ASSERT_NE(r1, 0u);
+  EXPECT_NE(r1, r2);
+  RD_END(r1);
+  for (unsigned long h : {0UL, r1, r2 + 1000, ~0UL}) {
+    EXPECT_EQ(RD_INT(h, L"S", L"k", -3), -3);
+    EXPECT_EQ(RD_FLOAT(h, L"S", L"k", 2.5), 2.5);
+    EXPECT_EQ(RD_STRING(h, L"S", L"k", L"d"), L"d");
+    EXPECT_FALSE(RD_EXISTS(h, L"S", L"k"));
+    RD_END(h);
+    WR_INT(h, L"S", L"k", 1);
+    EXPECT_EQ(WR_END(h), 0);
+  }
+  EXPECT_EQ(RD_INT(r2, L"S", L"k", -3), 1);  // the other reader is unaffected
+  RD_END(r2);
+  EXPECT_EQ(WR_BEGIN(L""), 0u);
+  EXPECT_EQ(WR_BEGIN(nullptr), 0u);
+
+  // Names that a file cannot carry are refused rather than written broken.
+  const unsigned long w = WR_BEGIN(path);
+  WR_INT(w, L"S", L"a=b", 1);
+  WR_INT(w, L"S", L"", 1);
+  WR_INT(w, L"S", L"; c", 1);
+  WR_INT(w, L"S", L"line\nbreak", 1);
+  WR_INT(w, L"S ", L"k", 1);
+  WR_INT(w, L"S", L"ok", 1);
+  ASSERT_EQ(WR_END(w), 1);
+  EXPECT_EQ(WR_END(w), 0);
+  EXPECT_EQ(ReadFileBytes(path), "[S]\nok=1\n");
+}
+
+TEST(SettingsTest, ConcurrentReadersAndWriters) {
+  TempDir dir;
+  std::vector<std::thread> threads;
+  std::vector<int> failures(4, 0);
+  for (int t = 0; t < 4; ++t) {
+    threads.emplace_back([&, t] {
+      const CString path = dir / FormatString(L"t%d.ini", t);
+      for (int i = 0; i < 100; ++i) {
+        const unsigned long w = WR_BEGIN(path);
+        WR_INT(w, L"S", L"i", i * 10 + t);
+        if (WR_END(w) != 1) ++failures[t];
+        const unsigned long r = RD_BEGIN(path);
+        if (RD_INT(r, L"S", L"i", -1) != i * 10 + t) ++failures[t];
+        RD_END(r);
+      }
+    });
+  }
+  for (auto& th : threads) th.join();
+  EXPECT_EQ(failures, std::vector<int>(4, 0));
+}
+
+TEST(AtomicFileTest, WritesLargeFilesAndKeepsModeAndLinks) {
+  TempDir dir;
+  const CString path = dir / L"points.txt";
+  WriteFileBytes(path, "old");
+  ASSERT_EQ(chmod(navmisc::NativePath(path).c_str(), 0600), 0);
+  const std::string link = navmisc::NativePath(dir / L"link.txt");
+  ASSERT_EQ(symlink("points.txt", link.c_str()), 0);
+
+  std::string expected;
+  {
+    navmisc::AtomicFile f;
+    ASSERT_TRUE(f.Open(CString::FromUtf8(link)));
+    for (int i = 0; i < 1000000; ++i) {
+      const std::string line = std::to_string(i) + ",47.1234567,8.7654321\n";
+      expected += line;
+      ASSERT_TRUE(f.Write(line));
+    }
+    const std::string block(600 * 1024, 'b');  // larger than the buffer
+    ASSERT_TRUE(f.Write(block));
+    expected += block;
+    EXPECT_EQ(ReadFileBytes(path), "old");
+    ASSERT_TRUE(f.Commit());
+    EXPECT_FALSE(f.Write("late"));
+  }
+  EXPECT_TRUE(ReadFileBytes(path) == expected);
+  struct stat st;
+  ASSERT_EQ(lstat(link.c_str(), &st), 0);
+  EXPECT_TRUE(S_ISLNK(st.st_mode));
+  ASSERT_EQ(stat(navmisc::NativePath(path).c_str(), &st), 0);
+  EXPECT_EQ(st.st_mode & 0777, 0600u);
+
+  const CString fresh = dir / L"fresh.txt";
+  {
+    navmisc::AtomicFile f;
+    ASSERT_TRUE(f.Open(fresh));
+    ASSERT_TRUE(f.Write("x"));
+    ASSERT_TRUE(f.Commit());
+  }
+  ASSERT_EQ(stat(navmisc::NativePath(fresh).c_str(), &st), 0);
+  EXPECT_EQ(st.st_mode & 0777, 0644u);
+}
+
+TEST(AtomicFileTest, FailuresAndAbandonLeaveTargetAndNoTemporaryFile) {
+  TempDir dir;
+  const CString path = dir / L"t.txt";
+  WriteFileBytes(path, "old");
+  {
+    navmisc::AtomicFile f;  // destroyed without Commit
+    ASSERT_TRUE(f.Open(path));
+    ASSERT_TRUE(f.Write(std::string(1 << 20, 'a')));
+  }
+  {
+    navmisc::AtomicFile f;
+    ASSERT_TRUE(f.Open(path));
+    ASSERT_TRUE(f.Write("abc"));
+    f.Abandon();
+    EXPECT_FALSE(f.Commit());
+  }
+  {  // a full disk in the middle of a large file: the failure sticks and Commit refuses
+    navmisc::testing::FailAtomicWritesAfter(300 * 1024);
+    navmisc::AtomicFile f;
+    ASSERT_TRUE(f.Open(path));
+    bool all_ok = true;
+    for (int i = 0; i < 1000; ++i) all_ok = f.Write(std::string(1024, 'c')) && all_ok;
+    navmisc::testing::FailAtomicWritesAfter(-1);
+    EXPECT_FALSE(all_ok);
+    EXPECT_FALSE(f.Write("more"));
+    EXPECT_FALSE(f.Commit());
+  }
+  EXPECT_EQ(ReadFileBytes(path), "old");
+  EXPECT_EQ(FolderEntries(dir.path()), std::vector<std::string>{"t.txt"});
+  navmisc::AtomicFile f;
+  EXPECT_FALSE(f.Open(dir / L"missing/t.txt"));
+  EXPECT_FALSE(f.Open(L""));
+}
+
+}  // namespace
