@@ -2,6 +2,7 @@
 
 #include <cctype>
 #include <charconv>
+#include <cstdint>
 #include <cstdlib>
 
 #include "navmisc/platform/format.h"
@@ -18,32 +19,36 @@ void End(std::string& out) { out.append(kLineEnd); }
 bool IsSpace(char c) { return c == ' ' || c == '\t' || c == '\n' || c == '\r' || c == '\v' || c == '\f'; }
 
 // "%d": blanks, an optional sign, at least one digit.
-bool ScanInt(std::string_view s, size_t& i, int32_t& out) {
-  size_t p = i;
-  while (p < s.size() && IsSpace(s[p])) ++p;
+[[gnu::always_inline]] inline bool ScanInt(std::string_view s, size_t& i, int32_t& out) {
+  const char* p = s.data() + i;
+  const char* const end = s.data() + s.size();
+  while (p < end && IsSpace(*p)) ++p;
   bool neg = false;
-  if (p < s.size() && (s[p] == '+' || s[p] == '-')) neg = s[p++] == '-';
-  const size_t digits = p;
-  // Like the C reader: the number is taken as a long, clamped on overflow, then cut to 32 bits.
-  unsigned long long v = 0;
-  bool overflow = false;
-  while (p < s.size() && s[p] >= '0' && s[p] <= '9') {
-    const unsigned d = static_cast<unsigned>(s[p] - '0');
-    if (v > (9223372036854775807ull - d) / 10) overflow = true;
-    else v = v * 10 + d;
-    ++p;
-  }
+  if (p < end && (*p == '+' || *p == '-')) neg = *p++ == '-';
+  const char* const digits = p;
+  // Up to 18 digits cannot overflow; longer runs take the careful loop.
+  uint64_t v = 0;
+  const char* fast_end = end - p > 18 ? p + 18 : end;
+  while (p < fast_end && static_cast<unsigned>(*p - '0') < 10) v = v * 10 + static_cast<unsigned>(*p++ - '0');
   if (p == digits) return false;
+  // Like the C reader: the number is taken as a long, clamped on overflow, then cut to 32 bits.
+  constexpr uint64_t kMax = 9223372036854775807ull;
+  bool overflow = false;
+  while (p < end && static_cast<unsigned>(*p - '0') < 10) {
+    const unsigned d = static_cast<unsigned>(*p++ - '0');
+    if (overflow || v > kMax / 10 || (v == kMax / 10 && d > kMax % 10)) overflow = true;
+    else v = v * 10 + d;
+  }
   long long signedV;
   if (overflow) signedV = neg ? (-9223372036854775807ll - 1) : 9223372036854775807ll;
   else signedV = neg ? -static_cast<long long>(v) : static_cast<long long>(v);
   out = static_cast<int32_t>(static_cast<uint32_t>(static_cast<unsigned long long>(signedV)));
-  i = p;
+  i = static_cast<size_t>(p - s.data());
   return true;
 }
 
 // "%lf": blanks, then a floating-point number as strtod reads it.
-bool ScanDouble(std::string_view s, size_t& i, double& out) {
+[[gnu::always_inline]] inline bool ScanDouble(std::string_view s, size_t& i, double& out) {
   size_t p = i;
   while (p < s.size() && IsSpace(s[p])) ++p;
   const char* first = s.data() + p;
@@ -52,6 +57,32 @@ bool ScanDouble(std::string_view s, size_t& i, double& out) {
   if (first < last && *first == '+') {
     plus = true;
     ++first;
+  }
+  // The common case, "-ddd.dddddd": with at most 15 digits the digits form an exact integer and
+  // 10^k is exact, so one IEEE division gives the correctly rounded value, the same double that
+  // strtod gives. Anything else takes the general readers.
+  {
+    const char* q = first;
+    const bool neg = q < last && *q == '-' && !plus;
+    if (neg) ++q;
+    uint64_t m = 0;
+    int digits = 0, fraction = 0;
+    const char* d = q;
+    while (d < last && *d >= '0' && *d <= '9') { m = m * 10 + static_cast<unsigned>(*d - '0'); ++d; ++digits; }
+    if (d < last && *d == '.') {
+      ++d;
+      while (d < last && *d >= '0' && *d <= '9') { m = m * 10 + static_cast<unsigned>(*d - '0'); ++d; ++digits; ++fraction; }
+    }
+    const bool more = d < last && (*d == 'e' || *d == 'E' || *d == 'x' || *d == 'X' || *d == 'p' || *d == 'P');
+    if (digits > 0 && digits <= 15 && !more && d - q > (fraction ? 1 : 0)) {
+      static constexpr double kPow10[] = {1e0, 1e1, 1e2, 1e3, 1e4, 1e5, 1e6, 1e7, 1e8,
+                                          1e9, 1e10, 1e11, 1e12, 1e13, 1e14, 1e15};
+      double v = static_cast<double>(m);
+      if (fraction) v /= kPow10[fraction];
+      out = neg ? -v : v;
+      i = static_cast<size_t>(d - s.data());
+      return true;
+    }
   }
   // from_chars reads no hexadecimal: "0x.." (after a sign) goes through strtod below.
   const char* digits = (first < last && *first == '-') ? first + 1 : first;
@@ -74,7 +105,7 @@ bool ScanDouble(std::string_view s, size_t& i, double& out) {
   return true;
 }
 
-bool Expect(std::string_view s, size_t& i, char c) {
+[[gnu::always_inline]] inline bool Expect(std::string_view s, size_t& i, char c) {
   if (i < s.size() && s[i] == c) {
     ++i;
     return true;
@@ -110,16 +141,23 @@ void ForEachToken(std::string_view line, F f) {
 }  // namespace
 
 void AppendPointLine(std::string& out, const WAYPOINT_ITEM_INFO& p) {
-  Int(out, p.time); Comma(out);
-  Fixed(out, p.latitude); Comma(out);
-  Fixed(out, p.longitude); Comma(out);
-  Fixed(out, p.altitude); Comma(out);
-  Int(out, p.speed); Comma(out);
-  Int(out, p.type); Comma(out);
-  Int(out, p.course); Comma(out);
-  Int(out, p.extraA); Comma(out);
-  Int(out, p.extraB);
-  End(out);
+  // The hot path of saving a track: the line is built in place, then appended once.
+  char line[4 * 12 + 3 * 340 + 16];
+  char* at = line;
+  auto integer = [&](int32_t v) { at = std::to_chars(at, at + 12, v).ptr; };
+  auto fixed = [&](double v) { at = WriteFixed(at, v, kDecimals); };
+  integer(p.time); *at++ = ',';
+  fixed(p.latitude); *at++ = ',';
+  fixed(p.longitude); *at++ = ',';
+  fixed(p.altitude); *at++ = ',';
+  integer(p.speed); *at++ = ',';
+  integer(p.type); *at++ = ',';
+  integer(p.course); *at++ = ',';
+  integer(p.extraA); *at++ = ',';
+  integer(p.extraB);
+  *at++ = '\r';
+  *at++ = '\n';
+  out.append(line, static_cast<size_t>(at - line));
 }
 
 void AppendCellFixLine(std::string& out, const BASE_ITEM_INFO& c) {

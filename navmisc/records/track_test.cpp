@@ -5,7 +5,10 @@
 #include <clocale>
 #include <cstdio>
 #include <memory>
+#include <cstring>
 #include <random>
+
+#include "navmisc/records/point_codec.h"
 
 #include "navmisc/platform/atomic_file.h"
 #include "navmisc/platform/files.h"
@@ -258,6 +261,38 @@ TEST(PointNumbers, FixedDecimalsMatchTheCLibraryWhateverTheLocale) {
   }
   std::setlocale(LC_NUMERIC, saved.c_str());
   if (!comma) GTEST_SKIP() << "de_DE.UTF-8 is not installed; checked in the C locale only";
+}
+
+}  // namespace
+
+namespace {
+
+TEST(PointNumbers, ReadingGivesTheCLibrarysDoubles) {
+  std::mt19937_64 rng(9);
+  std::uniform_real_distribution<double> any(-1e6, 1e6);
+  std::vector<std::string> texts = {"0", "-0", "-0.000000", "1.5e3", "123456789012345678.5", "0.1",
+                                    "999999999999999", "9999999999999999", "1.", ".5", "-.25",
+                                    "0.000000000000000000000001", "2.2250738585072014e-308", "1e400"};
+  for (int i = 0; i < 5000; ++i) {
+    char buf[64];
+    std::snprintf(buf, sizeof buf, i % 2 ? "%.6f" : "%.9g", any(rng));
+    texts.push_back(buf);
+  }
+  for (const std::string& t : texts) {
+    WAYPOINT_ITEM_INFO p(nullptr);
+    navmisc::point_file::ScanPointLine("1," + t + ",0,0,0,0,0,0,0", p);
+    const double expected = std::strtod(t.c_str(), nullptr);
+    EXPECT_EQ(std::memcmp(&p.latitude, &expected, sizeof expected), 0) << t;
+  }
+  // Integers: overflow clamps like strtol, then keeps the low 32 bits.
+  const std::pair<const char*, int32_t> ints[] = {{"2147483647", 2147483647}, {"2147483648", -2147483647 - 1},
+                                                  {"-5", -5}, {"99999999999999999999", -1},
+                                                  {"-99999999999999999999", 0}, {" +7", 7}};
+  for (const auto& [text, value] : ints) {
+    WAYPOINT_ITEM_INFO p(nullptr);
+    navmisc::point_file::ScanPointLine(text, p);
+    EXPECT_EQ(p.time, value) << text;
+  }
 }
 
 }  // namespace
