@@ -1,0 +1,375 @@
+#include "navmisc/geo/gps_helper.h"
+
+#include <algorithm>
+#include <cmath>
+
+#include "navmisc/geo/trace.h"
+#include "navmisc/platform/shared_globals.h"
+
+using navmisc::geo::kDegToRad;
+using navmisc::geo::kRadToDeg;
+
+namespace navmisc::geo {
+
+UnitVector ToUnitVector(double lat, double lon) {
+  const double la = lat * kDegToRad;
+  const double lo = lon * kDegToRad;
+  const double c = std::cos(la);
+  return {c * std::cos(lo), c * std::sin(lo), std::sin(la)};
+}
+
+double AngleBetween(const UnitVector& a, const UnitVector& b) {
+  const double dx = a.x - b.x, dy = a.y - b.y, dz = a.z - b.z;
+  const double half = std::sqrt(dx * dx + dy * dy + dz * dz) * 0.5;
+  return 2.0 * std::asin(std::min(1.0, half));
+}
+
+// The nearest point of the chord a-b to p, pushed back onto the sphere. That point lies on the
+// arc, so the result is never less than the true distance to the arc (which keeps the bounds of
+// the indexed search valid), and for legs of a track (metres to kilometres) it differs from the
+// exact arc distance by far less than a millimetre. Chord-based angles stay accurate for tiny
+// separations, where the haversine-free formulas with acos would lose everything.
+double SegmentDistanceKm(const UnitVector& a, const UnitVector& b, const UnitVector& p,
+                         double* where) {
+  const double dx = b.x - a.x, dy = b.y - a.y, dz = b.z - a.z;
+  const double dd = dx * dx + dy * dy + dz * dz;
+  double t = 0.0;
+  if (dd > 0.0) {
+    t = ((p.x - a.x) * dx + (p.y - a.y) * dy + (p.z - a.z) * dz) / dd;
+    t = std::clamp(t, 0.0, 1.0);
+  }
+  UnitVector q{a.x + t * dx, a.y + t * dy, a.z + t * dz};
+  const double len = std::sqrt(q.x * q.x + q.y * q.y + q.z * q.z);
+  if (len > 1e-12) {
+    q.x /= len;
+    q.y /= len;
+    q.z /= len;
+  } else {
+    q = a;  // antipodal ends: every great circle through them is as good
+  }
+  if (where) *where = t;
+  return AngleBetween(q, p) * kEarthRadiusKm;
+}
+
+}  // namespace navmisc::geo
+
+namespace {
+
+double RadiusOf(CGPSHelper::DIS_UNIT unit) {
+  switch (static_cast<int>(unit)) {
+    case CGPSHelper::DIS_MILE: return 3956.0;
+    case CGPSHelper::DIS_NAUTICAL_MILE: return 3437.7;
+    case CGPSHelper::DIS_KILOMETER: return 6371.0;
+    case CGPSHelper::DIS_METER: return 6371000.0;
+    default: return 0.0;
+  }
+}
+
+}  // namespace
+
+CGPSHelper::~CGPSHelper() = default;
+
+double CGPSHelper::GetDistance(double lat1, double lon1, double lat2, double lon2, DIS_UNIT unit) {
+  if (lat1 == lat2 && lon1 == lon2) return 0.0;
+  const double dLat = (lat2 - lat1) * kDegToRad;
+  const double dLon = (lon2 - lon1) * kDegToRad;
+  const double a = std::pow(std::sin(dLat / 2.0), 2.0) +
+                   std::cos(lat1 * kDegToRad) * std::cos(lat2 * kDegToRad) *
+                       std::pow(std::sin(dLon / 2.0), 2.0);
+  const double c = 2.0 * std::atan2(std::sqrt(a), std::sqrt(1.0 - a));
+  // Below a centimetre the difference is rounding noise of the inputs, not a distance.
+  if (c * 6371000.0 < 0.01) return 0.0;
+  return c * RadiusOf(unit);
+}
+
+double CGPSHelper::GetInitialBearing(double lat1, double lon1, double lat2, double lon2) {
+  if (lat1 == lat2 && lon1 == lon2) return 0.0;
+  const double la1 = lat1 * kDegToRad, la2 = lat2 * kDegToRad;
+  const double dLon = (lon2 - lon1) * kDegToRad;
+  const double theta =
+      std::atan2(std::sin(dLon) * std::cos(la2),
+                 std::cos(la1) * std::sin(la2) - std::sin(la1) * std::cos(la2) * std::cos(dLon)) *
+      kRadToDeg;
+  // Whole degrees on purpose: the fraction is truncated after the shift into 0..720.
+  return static_cast<double>(static_cast<int>(theta + 360.0) % 360);
+}
+
+void CGPSHelper::GetMidiPoint(double lat1, double lon1, double lat2, double lon2, double& lat,
+                              double& lon) {
+  const double la1 = lat1 * kDegToRad, la2 = lat2 * kDegToRad;
+  const double dLon = (lon2 - lon1) * kDegToRad;
+  const double bx = std::cos(la2) * std::cos(dLon);
+  const double by = std::cos(la2) * std::sin(dLon);
+  const double cx = std::cos(la1) + bx;
+  lat = std::atan2(std::sin(la1) + std::sin(la2), std::sqrt(cx * cx + by * by)) * kRadToDeg;
+  lon = (lon1 * kDegToRad + std::atan2(by, cx)) * kRadToDeg;
+}
+
+void CGPSHelper::GetDestinationPoint(double lat, double lon, double bearing, double distance,
+                                     double& lat2, double& lon2) {
+  lat2 = 0.0;
+  lon2 = 0.0;
+  const double delta = distance * 0.0001569612305760477;  // km over a 6371 km radius
+  const double theta = bearing * kDegToRad;
+  const double la1 = lat * kDegToRad;
+  const double la2 =
+      std::asin(std::cos(theta) * std::cos(la1) * std::sin(delta) + std::sin(la1) * std::cos(delta));
+  const double lo2 = lon * kDegToRad + std::atan2(std::sin(theta) * std::cos(la1) * std::sin(delta),
+                                                  std::cos(delta) - std::sin(la2) * std::sin(la1));
+  lat2 = la2 * kRadToDeg;
+  lon2 = lo2 * kRadToDeg;
+}
+
+void CGPSHelper::GetPointBetween2Point(double lat1, double lon1, double lat2, double lon2,
+                                       double distance, double& lat, double& lon) {
+  lat = 0.0;
+  lon = 0.0;
+  const double bearing = GetInitialBearing(lat1, lon1, lat2, lon2);
+  GetDestinationPoint(lat1, lon1, bearing, distance * 0.001, lat, lon);
+}
+
+double CGPSHelper::_GetMinDistance(double lat1, double lon1, double lat2, double lon2, double lat,
+                                   double lon, double* where) {
+  using namespace navmisc::geo;
+  return SegmentDistanceKm(ToUnitVector(lat1, lon1), ToUnitVector(lat2, lon2),
+                           ToUnitVector(lat, lon), where);
+}
+
+double CGPSHelper::GetMinDistance(const sWayPoint* points, int count, double lat, double lon,
+                                  double* where) {
+  if (!points || count < 1) return -1.0;
+  if (count == 1) {
+    return _GetMinDistance(points[0].latitude, points[0].longitude, points[0].latitude,
+                           points[0].longitude, lat, lon, where);
+  }
+  double best = 0.0, bestWhere = 0.0;
+  for (int i = 0; i + 1 < count; ++i) {
+    double w = 0.0;
+    const double d = _GetMinDistance(points[i].latitude, points[i].longitude,
+                                     points[i + 1].latitude, points[i + 1].longitude, lat, lon, &w);
+    if (i == 0 || d < best) {
+      best = d;
+      bestWhere = w;
+    }
+  }
+  if (where) *where = bestWhere;
+  return best;
+}
+
+void CGPSHelper::MappingToXY(const sWayPoint* points, int& count, CPoint* screen, long& size,
+                             long margin, double* deviation, double* scaleOut) {
+  if (!points || count < 1) return;
+  const int n = count;
+  const double firstLat = points[0].latitude, firstLon = points[0].longitude;
+  const double lastLat = points[n - 1].latitude, lastLon = points[n - 1].longitude;
+  double maxLat = points[0].latitude, minLon = points[0].longitude, maxDev = 0.0;
+  for (int i = 0; i < n; ++i) {
+    const double lat = points[i].latitude, lon = points[i].longitude;
+    maxLat = std::max(maxLat, lat);
+    minLon = std::min(minLon, lon);
+    if (i > 0) {
+      maxDev = std::max(maxDev,
+                        _GetMinDistance(firstLat, firstLon, lastLat, lastLon, lat, lon, nullptr));
+    }
+  }
+  long maxX = 0, maxY = 0;
+  for (int i = 0; i < n; ++i) {
+    const double lat = points[i].latitude, lon = points[i].longitude;
+    screen[i].x = static_cast<long>(GetDistance(lat, minLon, lat, lon, DIS_METER));
+    screen[i].y = static_cast<long>(GetDistance(maxLat, lon, lat, lon, DIS_METER));
+    maxX = std::max(maxX, screen[i].x);
+    maxY = std::max(maxY, screen[i].y);
+  }
+  const long extent = std::max(maxX, maxY);
+  double scale = 1.0;
+  // With a size of 0 or less the coarsening below could never make the track fit (0 / scale
+  // stays 0), so such a request is served at one metre per pixel like a small track.
+  if (size > 0 && extent >= size) {
+    while (static_cast<long>(extent / scale) >= size) scale += 0.2;
+  } else {
+    size = extent + 2 * margin;
+  }
+  for (int i = 0; i < n; ++i) {
+    screen[i].x = static_cast<long>(screen[i].x / scale) + margin;
+    screen[i].y = static_cast<long>(screen[i].y / scale) + margin;
+  }
+  if (deviation) *deviation = maxDev * 1000.0 / scale + 0.5;
+  if (scaleOut) *scaleOut = scale;
+}
+
+uint32_t CGPSHelper::_GetTimeDurationSec(long a, long b) {
+  return static_cast<uint32_t>(static_cast<unsigned long>(b) - static_cast<unsigned long>(a));
+}
+
+long CGPSHelper::_GetTimeDurationSec(const COleDateTime& a, const COleDateTime& b) {
+  return std::lround((b - a) * 86400.0);
+}
+
+// ---- cleaning passes -------------------------------------------------------------------------
+
+int CGPSHelper::Revise(sWayPoint* points, int& count) {
+  if (!points || count <= 4) return 0;
+  int dropped = _Revise_by_interval(points, count, 5.0);
+  dropped += _Revise_max_acceleration(points, count, 33.333333333333336);  // 120 km/h
+  return dropped;
+}
+
+int CGPSHelper::_Revise_by_interval(sWayPoint* points, int& count, double factor) {
+  if (!points || count - 1 < 2) return 0;
+  int64_t sum = 0;
+  for (int i = 1; i < count; ++i) sum += int64_t{points[i].time} - points[i - 1].time;
+  const double limit = static_cast<double>(sum) / (count - 1) * factor;
+  int dropped = 0;
+  // The first and the last point are never dropped.
+  for (int i = 1; i <= count - 2; ++i) {
+    if (static_cast<double>(int64_t{points[i].time} - points[i - 1].time) > limit) {
+      points[i].valid = 0;
+      ++dropped;
+    }
+  }
+  return dropped;
+}
+
+int CGPSHelper::_Revise_max_acceleration(sWayPoint* points, int& count, double speedLimit) {
+  if (!points || count < 2) return 0;
+  auto speed = [&](int from, int to) {
+    const double metres = GetDistance(points[from].latitude, points[from].longitude,
+                                      points[to].latitude, points[to].longitude, DIS_KILOMETER) *
+                          1000.0;
+    return metres / static_cast<double>(_GetTimeDurationSec(points[from].time, points[to].time));
+  };
+  int prev = 0, i = 1, dropped = 0;
+  while (i < count) {
+    if (!(speed(prev, i) > speedLimit)) {
+      prev = i;
+      ++i;
+      continue;
+    }
+    if (i >= count - 1) {
+      points[i].valid = 0;  // a fast last point has nothing after it to vouch for it
+      return dropped + 1;
+    }
+    bool spike = false;
+    for (int k = 1; k <= 3 && !spike; ++k) {
+      if (i + k < count - 1 && speed(i + k - 1, i + k) < speedLimit) spike = true;
+    }
+    if (spike) {
+      points[i].valid = 0;
+      ++dropped;
+      prev = i + 1;
+      i += 2;
+    } else {
+      prev = i;
+      ++i;
+    }
+  }
+  return dropped;
+}
+
+int CGPSHelper::Reduce(sWayPoint* points, int& count) {
+  const bool sport = g_nProductId == GPS_APP_SPORT;
+  double leave = sport ? 3.0 : 50.0;
+  if (points && count > 50) {
+    double sum = 0.0;
+    for (int i = 1; i < count; ++i) {
+      sum += GetDistance(points[i - 1].latitude, points[i - 1].longitude, points[i].latitude,
+                         points[i].longitude, DIS_KILOMETER);
+    }
+    // A densely logged track would otherwise hide its slow sections inside the leave radius.
+    const double meanLeg = sum / (count - 1) * 1000.0;
+    if (meanLeg < leave) leave = meanLeg;
+  }
+  const double ret = sport ? 0.5 : 6.0;
+  return _Reduce_Stop_To_Move(points, count, 0.6, ret, leave);
+}
+
+int CGPSHelper::_Reduce_Stop_To_Move(sWayPoint* points, int& count, double stopSpeed,
+                                     double returnRadius, double leaveRadius) {
+  return StopWalk(points, count, stopSpeed, returnRadius, leaveRadius, false);
+}
+
+int CGPSHelper::_Revise_Stop_To_Move(sWayPoint* points, int& count, double stopSpeed,
+                                     double returnRadius, double leaveRadius) {
+  return StopWalk(points, count, stopSpeed, returnRadius, leaveRadius, true);
+}
+
+int CGPSHelper::StopWalk(sWayPoint* points, int count, double stopSpeed, double returnRadius,
+                         double leaveRadius, bool reviseTexts) {
+  if (!points || count < 6) return 0;
+  auto metres = [&](double lat1, double lon1, int to) {
+    return GetDistance(lat1, lon1, points[to].latitude, points[to].longitude, DIS_KILOMETER) *
+           1000.0;
+  };
+  bool stopped = false;
+  int r = 0, dropped = 0;
+  double stopLat = 0.0, stopLon = 0.0;
+  for (int i = 1; i < count - 1; ++i) {  // the last point is never looked at
+    if (!stopped) {
+      const double d = metres(points[r].latitude, points[r].longitude, i);
+      const uint32_t t = _GetTimeDurationSec(points[r].time, points[i].time);
+      // A zero time step gives an infinite speed for a move and NaN (a stop) for no move.
+      const double v = d / static_cast<double>(t);
+      navmisc::GeoTrace("\nPt%d -> Pt%d = %.6f, time = %ds, speed = %.6f", r, i, d,
+                        static_cast<int>(t), v);
+      if (!(v > stopSpeed) || points[i].speed <= 0) {
+        stopped = true;
+        stopLat = points[i].latitude;
+        stopLon = points[i].longitude;
+        navmisc::GeoTrace("\nStop point = %d", i);
+      }
+      ++r;
+      continue;
+    }
+    const double d = metres(stopLat, stopLon, i);
+    if (d < leaveRadius || points[i].speed < 1) {
+      if (reviseTexts) {
+        navmisc::GeoTrace("\nptStop -> pt%d = %.6f < %.6f, Still Stop point", i, d, leaveRadius);
+      } else {
+        navmisc::GeoTrace("\nptStop -> pt%d = %.6f < %.6f, Still Stop point , Draw out.", i, d,
+                          leaveRadius);
+      }
+      points[i].valid = 0;
+      ++dropped;
+      continue;
+    }
+    navmisc::GeoTrace("\nptStop -> pt%d = %.6f > %.6f, May be start moving point", i, d,
+                      leaveRadius);
+    int ahead = 3;
+    if (i + 3 > count - 1) {
+      ahead = i - count + 4;
+      if (ahead < 1) break;
+    }
+    bool staying = false;
+    for (int j = i + 1; j <= i + ahead && j <= count - 1; ++j) {  // never past the last point
+      const double dj = metres(stopLat, stopLon, j);
+      navmisc::GeoTrace(reviseTexts ? "\nptStop -> pt%d = %.6f" : "\n\tptStop -> pt%d = %.6f", j,
+                        dj);
+      if (!(dj > returnRadius) || !(dj > d)) staying = true;
+    }
+    if (staying) {
+      navmisc::GeoTrace("\nInvalidate point = %d", i);
+      points[i].valid = 0;
+      ++dropped;
+    } else {
+      navmisc::GeoTrace("\nStart Moving point = %d", i);
+      stopped = false;
+      r = i;
+    }
+  }
+  return dropped;
+}
+
+void CGPSHelper::_Arrange(sWayPoint* points, int& count) {
+  if (!points || count < 1) return;
+  int kept = 0;
+  for (int i = 0; i < count; ++i) {
+    if (points[i].valid) points[kept++] = points[i];
+  }
+  for (int i = kept; i < count; ++i) points[i] = sWayPoint{};
+  count = kept;
+}
+
+double GetGpsDistance(double a, double b, double /*c*/, double d) {
+  CGPSHelper helper;
+  return helper.GetDistance(a, b, a, d, CGPSHelper::DIS_KILOMETER);
+}
