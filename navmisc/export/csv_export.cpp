@@ -1,0 +1,179 @@
+#include "navmisc/export/csv_export.h"
+
+#include <unordered_set>
+
+#include "navmisc/export/detail/export_common.h"
+#include "navmisc/geo/gps_helper.h"
+#include "navmisc/platform/datetime.h"
+#include "navmisc/platform/files.h"
+#include "navmisc/records/photo.h"
+#include "navmisc/records/track.h"
+#include "navmisc/records/trip.h"
+
+namespace {
+
+using navmisc::exportdetail::AppendFixed;
+using navmisc::exportdetail::AppendInt;
+using navmisc::exportdetail::BufferedWriter;
+using navmisc::exportdetail::OpenForWriting;
+using navmisc::exportdetail::UniqueFile;
+
+// Spreadsheets of the time held 65536 rows: one header and 65534 points leave room to spare.
+constexpr int kPointsPerFile = 65534;
+constexpr double kFeetPerMetre = 3.280842;
+constexpr double kMilesPerKilometre = 0.621371;
+
+constexpr std::string_view kFirstHeader =
+    "Date, Time, Latitude, Longitude, Altitude, Speed, Course, Type, Distance, Essential\r";
+// Later files of a split export end their header in "Exception"; readers of older exports rely
+// on the difference.
+constexpr std::string_view kContinuationHeader =
+    "Date, Time, Latitude, Longitude, Altitude, Speed, Course, Type, Distance, Exception\r";
+
+// "%02d"
+void AppendTwo(std::string& out, int v) {
+  if (v >= 0 && v < 10) out += '0';
+  AppendInt(out, v);
+}
+
+CString SplitFileName(const CString& path, int number) {
+  CString name = FormatString(L"%s_%d.csv", PathFileTitle(path).c_str(), number);
+  CString folder = PathFolder(path);
+  return folder.IsEmpty() ? name : PathJoin(folder, name);
+}
+
+// The trip's point filter: which points it treats as exceptions rather than essential.
+struct PointFilter {
+  explicit PointFilter(const BLOG_ITEM_INFO* trip)
+      : enabled(trip && trip->optOptimize),
+        revised(trip && trip->optRevise),
+        redundant(trip && trip->optRedundance),
+        level(trip ? trip->optLevel : 0) {}
+  bool IsException(int32_t type) const {
+    return enabled && ((type == -2 && revised) || (type == -1 && redundant) || type < level);
+  }
+  bool enabled, revised, redundant;
+  int32_t level;
+};
+
+class CsvWriter {
+ public:
+  CsvWriter(CPtrList& photos, const BLOG_ITEM_INFO* trip, bool metric)
+      : filter_(trip), shift_(trip ? trip->timeZoneShift : 0), metric_(metric) {
+    for (const PHOTO_ITEM_INFO* photo : navmisc::Items<PHOTO_ITEM_INFO>(photos)) {
+      if (photo && photo->playbackTime >= 1) photoTimes_.insert(photo->playbackTime);
+    }
+  }
+
+  bool Open(const CString& path, std::string_view header) {
+    writer_.reset();
+    file_ = OpenForWriting(path);
+    if (!file_) return false;
+    writer_ = std::make_unique<BufferedWriter>(file_.get());
+    writer_->Append(header);
+    return true;
+  }
+  void Close() {
+    writer_.reset();
+    file_.reset();
+  }
+
+  // `first` and `last` tell the point's place in its track's list; `prev` is the track's
+  // previous written point, or null.
+  void WriteLine(const WAYPOINT_ITEM_INFO& p, const WAYPOINT_ITEM_INFO* prev, bool first, bool last) {
+    std::string& out = writer_->text();
+    int year, month, day, hour, minute, second;
+    GetDateTimeInfo(static_cast<long>(p.time) + shift_, year, month, day, hour, minute, second);
+    AppendTwo(out, year);
+    out += '/';
+    AppendTwo(out, month);
+    out += '/';
+    AppendTwo(out, day);
+    out += ", ";
+    AppendTwo(out, hour);
+    out += ':';
+    AppendTwo(out, minute);
+    out += ':';
+    AppendTwo(out, second);
+    out += ", ";
+    AppendFixed(out, p.latitude, 6);
+    out += ", ";
+    AppendFixed(out, p.longitude, 6);
+    out += ", ";
+    AppendFixed(out, metric_ ? p.altitude : p.altitude * kFeetPerMetre, 2);
+    // Two blanks before the speed: spreadsheet templates made from older exports expect them.
+    out += ",  ";
+    const double speed = p.speed;  // metres per hour
+    AppendFixed(out, metric_ ? speed : speed * 0.001 * kMilesPerKilometre, 2);
+    out += ", ";
+    int course = p.course;
+    if (course == -1) {
+      course = prev ? static_cast<int>(helper_.GetInitialBearing(prev->latitude, prev->longitude,
+                                                                 p.latitude, p.longitude))
+                    : 0;
+    }
+    AppendInt(out, course);
+    out += ", ";
+    int type = first ? -2 : last ? -4 : 0;
+    if (photoTimes_.count(p.time)) --type;
+    AppendInt(out, type);
+    out += ", ";
+    double metres =
+        prev ? GetGpsDistance(prev->latitude, prev->longitude, p.latitude, p.longitude) * 1000.0 : 0.0;
+    AppendFixed(out, metric_ ? metres : metres * kMilesPerKilometre, 2);
+    out += ", ";
+    if (!filter_.IsException(p.type)) out += '1';
+    out += '\r';
+    writer_->MaybeFlush();
+  }
+
+ private:
+  PointFilter filter_;
+  long shift_;
+  bool metric_;
+  std::unordered_set<int32_t> photoTimes_;
+  CGPSHelper helper_;
+  UniqueFile file_;
+  std::unique_ptr<BufferedWriter> writer_;
+};
+
+}  // namespace
+
+int ExportCsv(CString path, CPtrList& tracks, CPtrList& photos, BLOG_ITEM_INFO* trip, bool metric) {
+  ClearTargetFile(path);
+  long long total = 0;
+  for (const TRACK_ITEM_INFO* track : navmisc::Items<TRACK_ITEM_INFO>(tracks)) {
+    if (track) total += track->points.GetCount();
+  }
+  const bool split = total >= kPointsPerFile;
+  int number = 1;
+
+  CsvWriter csv(photos, trip, metric);
+  if (!csv.Open(split ? SplitFileName(path, number) : path, kFirstHeader)) return 0;
+  int lines = 0;
+  for (const TRACK_ITEM_INFO* track : navmisc::Items<TRACK_ITEM_INFO>(tracks)) {
+    if (!track) continue;
+    const int count = track->points.GetCount();
+    int index = 0;
+    const WAYPOINT_ITEM_INFO* prev = nullptr;
+    for (const WAYPOINT_ITEM_INFO* p : navmisc::Items<WAYPOINT_ITEM_INFO>(track->points)) {
+      if (p && p->time != -1) {
+        // A point that is both first and last is typed as first.
+        csv.WriteLine(*p, prev, index == 0, index == count - 1);
+        prev = p;
+      }
+      ++index;
+      // Points without a time take their place in the file's count all the same.
+      if (++lines == kPointsPerFile) {
+        csv.Close();
+        ++number;
+        CString next = SplitFileName(path, number);
+        ClearTargetFile(next);
+        if (!csv.Open(next, kContinuationHeader)) return 0;
+        lines = 0;
+      }
+    }
+  }
+  csv.Close();
+  return 1;
+}

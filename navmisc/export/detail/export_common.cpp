@@ -1,0 +1,74 @@
+#include "navmisc/export/detail/export_common.h"
+
+#include "navmisc/platform/datetime.h"
+#include "navmisc/platform/files.h"
+#include "navmisc/platform/textconv.h"
+
+namespace navmisc::exportdetail {
+
+UniqueFile OpenForWriting(const wchar_t* path) {
+  std::string native = NativePath(path);
+  if (native.empty()) return nullptr;
+  return UniqueFile(std::fopen(native.c_str(), "wb"));
+}
+
+std::string Utf8Field(std::wstring_view text, size_t bufferSize) {
+  std::string out;
+  if (bufferSize == 0 || !WideToUtf8(text, out)) return {};
+  const size_t limit = bufferSize - 1;
+  if (out.size() > limit) {
+    size_t cut = limit;
+    // Step back over continuation bytes so that the cut falls before a lead byte.
+    while (cut > 0 && (static_cast<unsigned char>(out[cut]) & 0xC0) == 0x80) --cut;
+    out.resize(cut);
+  }
+  return out;
+}
+
+std::string StdTimeText(int32_t time) { return ToUtf8Lossy(TimeTToStdStringTime(time).view()); }
+
+std::string StdTimeTextZ(int32_t time) {
+  std::string s = StdTimeText(time);
+  if (s.empty() || s.back() != 'Z') s += 'Z';
+  return s;
+}
+
+namespace {
+
+int64_t FloorDiv(int64_t a, int64_t b) { return a / b - ((a % b != 0) && ((a < 0) != (b < 0))); }
+
+void PutTwo(char* p, int v) {
+  p[0] = static_cast<char>('0' + v / 10);
+  p[1] = static_cast<char>('0' + v % 10);
+}
+
+}  // namespace
+
+void TimeTextZWriter::Append(std::string& out, int32_t time) {
+  const int64_t day = FloorDiv(time, 86400);
+  const int sod = static_cast<int>(time - day * 86400);
+  char clock[9];
+  PutTwo(clock, sod / 3600);
+  clock[2] = ':';
+  PutTwo(clock + 3, sod / 60 % 60);
+  clock[5] = ':';
+  PutTwo(clock + 6, sod % 60);
+  clock[8] = 'Z';
+  if (day == day_) {
+    out.append(date_, sizeof date_);
+    out.append(clock, sizeof clock);
+    return;
+  }
+  std::string text = StdTimeTextZ(time);
+  out += text;
+  // Reuse the date part only when the platform text has exactly the expected shape and clock,
+  // so that the fast path can never disagree with it.
+  if (text.size() == 20 && text[10] == 'T' && text.compare(11, 9, clock, 9) == 0) {
+    text.copy(date_, sizeof date_);
+    day_ = day;
+  } else {
+    day_ = INT64_MIN;
+  }
+}
+
+}  // namespace navmisc::exportdetail

@@ -1,0 +1,97 @@
+#include "navmisc/export/gpx_export.h"
+
+#include "navmisc/export/detail/export_common.h"
+#include "navmisc/platform/files.h"
+#include "navmisc/records/photo.h"
+#include "navmisc/records/track.h"
+
+namespace {
+
+using navmisc::exportdetail::AppendFixed;
+using navmisc::exportdetail::BufferedWriter;
+using navmisc::exportdetail::TimeTextZWriter;
+using navmisc::exportdetail::Utf8Field;
+
+// The readers' fixed-size text buffers, terminator included.
+constexpr size_t kTextBuffer = 2048;
+// Stored speeds are metres per hour; GPX wants metres per second.
+constexpr double kMetresPerHourToMetresPerSecond = 0.0002777777777777778;
+
+void WriteWaypoint(std::string& out, const PHOTO_ITEM_INFO& item, TimeTextZWriter& times) {
+  CString flattened = item.description;
+  // Keeps every description on one line; lone CR or LF stay as they are.
+  flattened.Replace(L"\r\n", L"&#13;");
+  out += "\r\n<wpt lat=\"";
+  AppendFixed(out, item.latitude, 6);
+  out += "\" lon=\"";
+  AppendFixed(out, item.longitude, 6);
+  out += "\">\r\n<ele>";
+  AppendFixed(out, item.altitude, 6);
+  out += "</ele>";
+  // 0 and -1 both mean the item has no time of its own.
+  if (item.playbackTime != 0 && item.playbackTime != -1) {
+    out += "\r\n<time>";
+    times.Append(out, item.playbackTime);
+    out += "</time>";
+  }
+  out += "\r\n<name>";
+  out += Utf8Field(item.title.view(), kTextBuffer);
+  out += "</name>\r\n<desc>";
+  out += Utf8Field(flattened.view(), kTextBuffer);
+  out += "</desc>\r\n<sym>Waypoint</sym>\r\n</wpt>";
+}
+
+void WriteTrack(BufferedWriter& w, const TRACK_ITEM_INFO& track, TimeTextZWriter& times) {
+  std::string& out = w.text();
+  out += "\r\n<trk>\r\n<name>";
+  out += Utf8Field(track.GetName().view(), kTextBuffer);
+  // The document's colour is the same for every track, whatever its colour in the trip.
+  out += "</name>\r\n<desc>Color:004000ff</desc>\r\n<trkseg>";
+  for (const WAYPOINT_ITEM_INFO* p : navmisc::Items<WAYPOINT_ITEM_INFO>(track.points)) {
+    if (!p || p->time == -1) continue;
+    out += "\r\n<trkpt lat=\"";
+    AppendFixed(out, p->latitude, 6);
+    out += "\" lon=\"";
+    AppendFixed(out, p->longitude, 6);
+    out += "\">\r\n<ele>";
+    AppendFixed(out, p->altitude, 6);
+    out += "</ele>\r\n<time>";
+    times.Append(out, p->time);
+    out += "</time>\r\n<speed>";
+    AppendFixed(out, p->speed * kMetresPerHourToMetresPerSecond, 2);
+    out += "</speed>\r\n</trkpt>";
+    w.MaybeFlush();
+  }
+  out += "\r\n</trkseg>\r\n</trk>";
+}
+
+}  // namespace
+
+int ExportGpx(CString path, CPtrList& tracks, CPtrList& items) {
+  ClearTargetFile(path);
+  navmisc::exportdetail::UniqueFile file = navmisc::exportdetail::OpenForWriting(path);
+  if (!file) return 0;
+
+  TimeTextZWriter times;
+  {
+    BufferedWriter w(file.get());
+    std::string& out = w.text();
+    out += "<?xml version=\"1.0\" encoding=\"UTF-8\" standalone=\"yes\" ?>\r\n<gpx creator=\"Corvane ";
+    out += navmisc::exportdetail::kMakerAddress;
+    out += "/1.1\" version=\"1.0\" xmlns=\"http://www.topografix.com/GPX/1/0\""
+           " xmlns:xsi=\"http://www.w3.org/2001/XMLSchema-instance\""
+           " xsi:schemaLocation=\"http://www.topografix.com/GPX/1/0"
+           " http://www.topografix.com/GPX/1/0/gpx.xsd\">";
+    // Waypoints always precede tracks, whichever list the caller filled first.
+    for (const PHOTO_ITEM_INFO* item : navmisc::Items<PHOTO_ITEM_INFO>(items)) {
+      if (!item) continue;
+      WriteWaypoint(out, *item, times);
+      w.MaybeFlush();
+    }
+    for (const TRACK_ITEM_INFO* track : navmisc::Items<TRACK_ITEM_INFO>(tracks)) {
+      if (track) WriteTrack(w, *track, times);
+    }
+    out += "\r\n</gpx>";
+  }
+  return 1;
+}

@@ -1,0 +1,137 @@
+#include "navmisc/export/tcx_from_trip.h"
+
+#include <algorithm>
+#include <utility>
+#include <vector>
+
+#include "navmisc/export/detail/export_common.h"
+#include "navmisc/geo/gps_helper.h"
+#include "navmisc/platform/textconv.h"
+#include "navmisc/records/items.h"
+#include "navmisc/records/track.h"
+#include "navmisc/records/trip.h"
+
+namespace {
+
+constexpr uint8_t kHasPosition = 1;
+constexpr uint8_t kHasHeartRate = 2;
+constexpr uint8_t kHasCadence = 4;
+constexpr uint8_t kHasSpeed = 8;
+
+// One value per second, by time, from sample records of `Sample` (a time and values up to the
+// end marker 255).
+template <class Sample>
+class PerSecond {
+ public:
+  explicit PerSecond(const CPtrList& samples) {
+    for (const Sample* s : navmisc::Items<Sample>(samples)) {
+      if (!s || s->time == -1) continue;
+      const int used = s->UsedCount();
+      for (int i = 0; i < used; ++i) values_.emplace_back(static_cast<int64_t>(s->time) + i, s->values[i]);
+    }
+    // Records may overlap; the first record's sample wins a shared second.
+    std::stable_sort(values_.begin(), values_.end(),
+                     [](const auto& a, const auto& b) { return a.first < b.first; });
+  }
+  // The sample at `time`, or -1.
+  int At(int64_t time) const {
+    auto it = std::lower_bound(values_.begin(), values_.end(), time,
+                               [](const auto& v, int64_t t) { return v.first < t; });
+    return it != values_.end() && it->first == time ? it->second : -1;
+  }
+
+ private:
+  std::vector<std::pair<int64_t, uint8_t>> values_;
+};
+
+bool HasPosition(const WAYPOINT_ITEM_INFO& p) {
+  return !((p.latitude == 0.0 && p.longitude == 0.0) || (p.latitude == 45.0 && p.longitude == 45.0));
+}
+
+}  // namespace
+
+bool FillTcxLap(TRACK_ITEM_INFO& track, TcxLap& lap) {
+  PerSecond<HEARTRATE_ITEM_INFO> heartRates(track.heartRates);
+  PerSecond<CYCLING_CADENCE_RPM_ITEM_INFO> cadences(track.cadences);
+  CGPSHelper helper;
+
+  const WAYPOINT_ITEM_INFO* previous = nullptr;  // last point with a time and a position
+  const WAYPOINT_ITEM_INFO* first = nullptr;
+  const WAYPOINT_ITEM_INFO* last = nullptr;
+  double distance = 0.0;
+  double maxSpeed = 0.0;
+  long long heartSum = 0;
+  int heartCount = 0;
+  int heartMax = 0;
+  for (WAYPOINT_ITEM_INFO* p : navmisc::Items<WAYPOINT_ITEM_INFO>(track.points)) {
+    if (!p) continue;
+    p->workDistance = 0.0;
+    p->workSpeed = 0.0;
+    p->workHeartRate = 0;
+    p->workCadence = 0;
+    uint8_t& flags = p->flags[WAYPOINT_ITEM_INFO::kFlagPresence];
+    flags = 0;
+    if (p->time == -1) continue;
+
+    flags = kHasSpeed;
+    if (HasPosition(*p)) {
+      flags |= kHasPosition;
+      if (previous) {
+        distance += helper.GetDistance(previous->latitude, previous->longitude, p->latitude,
+                                       p->longitude, CGPSHelper::DIS_METER);
+      }
+      previous = p;
+    }
+    p->workDistance = distance;
+    p->workSpeed = p->speed / 3600.0;
+    maxSpeed = std::max(maxSpeed, p->workSpeed);
+    // 0 is no heart rate a reader accepts: the belt lost contact.
+    if (int hr = heartRates.At(p->time); hr > 0) {
+      flags |= kHasHeartRate;
+      p->workHeartRate = hr;
+      heartSum += hr;
+      ++heartCount;
+      heartMax = std::max(heartMax, hr);
+    }
+    if (int cadence = cadences.At(p->time); cadence >= 0) {
+      flags |= kHasCadence;
+      p->workCadence = cadence;
+    }
+    if (!first) first = p;
+    last = p;
+  }
+  if (!first) return false;
+
+  lap.startTime = first->time;
+  lap.totalTimeSeconds = static_cast<double>(static_cast<int64_t>(last->time) - first->time);
+  lap.distanceMeters = distance;
+  lap.maximumSpeed = maxSpeed;
+  lap.calories = 0;
+  lap.averageHeartRate = heartCount ? static_cast<int32_t>((heartSum + heartCount / 2) / heartCount) : 0;
+  lap.maximumHeartRate = heartMax;
+  lap.tracks.RemoveAll();
+  lap.tracks.AddTail(&track);
+  return true;
+}
+
+int FillTcxActivity(CPtrList& tracks, int32_t sportType, CTcxActivities& activity) {
+  navmisc::DeleteAll<TcxLap>(activity.laps);
+  activity.sportType = sportType;
+  for (TRACK_ITEM_INFO* track : navmisc::Items<TRACK_ITEM_INFO>(tracks)) {
+    if (!track) continue;
+    auto* lap = new TcxLap;
+    if (FillTcxLap(*track, *lap)) activity.laps.AddTail(lap);
+    else delete lap;
+  }
+  if (!activity.laps.IsEmpty()) {
+    const auto* firstLap = static_cast<const TcxLap*>(activity.laps.GetHead());
+    activity.Id = navmisc::FromUtf8Lossy(navmisc::exportdetail::StdTimeTextZ(firstLap->startTime));
+  }
+  return activity.laps.GetCount();
+}
+
+int FillTcxActivity(BLOG_ITEM_INFO& trip, int32_t sportType, CTcxActivities& activity) {
+  int laps = FillTcxActivity(trip.tracks, sportType, activity);
+  if (laps == 0) activity.Id = trip.tripId;
+  return laps;
+}
