@@ -20,7 +20,7 @@ locale_t CLocale() {
 }
 
 // One conversion of a format, split into its parts.
-struct Spec {
+struct Conversion {
   std::string flags;
   int width = -1;
   int precision = -1;
@@ -34,7 +34,7 @@ void AppendAscii(Out& out, std::string_view text) {
 }
 
 template <class Out>
-void Pad(Out& out, size_t len, const Spec& s, auto emit) {
+void Pad(Out& out, size_t len, const Conversion& s, auto emit) {
   const bool left = s.flags.find('-') != std::string::npos;
   const size_t w = s.width > 0 ? static_cast<size_t>(s.width) : 0;
   if (!left && w > len) out.append(w - len, ' ');
@@ -42,7 +42,7 @@ void Pad(Out& out, size_t len, const Spec& s, auto emit) {
   if (left && w > len) out.append(w - len, ' ');
 }
 
-std::string BuildSpec(const Spec& s, const char* length_override, char conv) {
+std::string BuildConversion(const Conversion& s, const char* length_override, char conv) {
   std::string f = "%";
   f += s.flags;
   if (s.width >= 0) f += std::to_string(s.width);
@@ -56,19 +56,19 @@ std::string BuildSpec(const Spec& s, const char* length_override, char conv) {
 }
 
 template <class T>
-std::string Snprintf(const std::string& spec, T value) {
+std::string Snprintf(const std::string& pattern, T value) {
   char buf[128];
-  int n = std::snprintf(buf, sizeof buf, spec.c_str(), value);
+  int n = std::snprintf(buf, sizeof buf, pattern.c_str(), value);
   if (n < 0) return {};
   if (static_cast<size_t>(n) < sizeof buf) return std::string(buf, static_cast<size_t>(n));
   std::string big(static_cast<size_t>(n) + 1, '\0');
-  std::snprintf(big.data(), big.size(), spec.c_str(), value);
+  std::snprintf(big.data(), big.size(), pattern.c_str(), value);
   big.resize(static_cast<size_t>(n));
   return big;
 }
 
 // Formats one numeric or pointer conversion, consuming its argument.
-std::string FormatNumber(const Spec& s, va_list& args) {
+std::string FormatNumber(const Conversion& s, va_list& args) {
   const char c = s.conv;
   const std::string& l = s.length;
   if (c == 'd' || c == 'i') {
@@ -78,7 +78,7 @@ std::string FormatNumber(const Spec& s, va_list& args) {
     else v = va_arg(args, int);
     if (l == "h") v = static_cast<short>(v);
     if (l == "hh") v = static_cast<signed char>(v);
-    return Snprintf(BuildSpec(s, "ll", c), v);
+    return Snprintf(BuildConversion(s, "ll", c), v);
   }
   if (c == 'u' || c == 'o' || c == 'x' || c == 'X') {
     unsigned long long v;
@@ -87,14 +87,14 @@ std::string FormatNumber(const Spec& s, va_list& args) {
     else v = va_arg(args, unsigned int);
     if (l == "h") v = static_cast<unsigned short>(v);
     if (l == "hh") v = static_cast<unsigned char>(v);
-    return Snprintf(BuildSpec(s, "ll", c), v);
+    return Snprintf(BuildConversion(s, "ll", c), v);
   }
   if (c == 'f' || c == 'F' || c == 'e' || c == 'E' || c == 'g' || c == 'G' || c == 'a' ||
       c == 'A') {
-    if (l == "L") return Snprintf(BuildSpec(s, "L", c), va_arg(args, long double));
-    return Snprintf(BuildSpec(s, "", c), va_arg(args, double));
+    if (l == "L") return Snprintf(BuildConversion(s, "L", c), va_arg(args, long double));
+    return Snprintf(BuildConversion(s, "", c), va_arg(args, double));
   }
-  if (c == 'p') return Snprintf(BuildSpec(s, "", 'p'), va_arg(args, void*));
+  if (c == 'p') return Snprintf(BuildConversion(s, "", 'p'), va_arg(args, void*));
   return {};
 }
 
@@ -125,7 +125,7 @@ std::basic_string<Char> VFormat(const Char* fmt, va_list in_args) {
       ++p;
       continue;
     }
-    Spec s;
+    Conversion s;
     while (*p == '-' || *p == '+' || *p == ' ' || *p == '#' || *p == '0') s.flags += static_cast<char>(*p++);
     if (*p == '*') {
       s.width = va_arg(args, int);
