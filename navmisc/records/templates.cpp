@@ -9,9 +9,12 @@ CPtrList g_plTemplateItemList;
 namespace {
 
 // A value that starts with ".\" lies in the templates folder; any other value is kept as it is.
+// The catalogue writes the relative part with backslashes: they separate folders here too.
 CString ResolveTemplatePath(const CString& folder, const CString& value) {
-  if (value.Left(2) == L".\\") return PathJoin(folder, value.Mid(2));
-  return value;
+  if (value.Left(2) != L".\\") return value;
+  CString rest = value.Mid(2);
+  rest.Replace(L"\\", L"/");
+  return PathJoin(folder, rest);
 }
 
 }  // namespace

@@ -27,7 +27,7 @@ TEST(Templates, CatalogueIsLocalisedAndResolved) {
   auto* t0 = static_cast<TEMPLATE_ITEM_INFO*>(g_plTemplateItemList.GetHead());
   EXPECT_EQ(t0->name, L"Klassisch");
   EXPECT_EQ(t0->description, L"Plain page") << "an empty translation falls back";
-  EXPECT_EQ(t0->thumbnailPath, (prog / L"Templates") + L"/thumbs\\a.png");
+  EXPECT_EQ(t0->thumbnailPath, (prog / L"Templates") + L"/thumbs/a.png");
   EXPECT_EQ(t0->landmarkPath, L"/abs/l.png");
   EXPECT_EQ(t0->landmarkWidth, 120);
   EXPECT_EQ(t0->mode, 2);

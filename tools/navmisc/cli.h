@@ -65,5 +65,8 @@ int CmdOptimize(Args& args);
 int CmdPlot(Args& args);
 int CmdPlace(Args& args);
 int CmdExport(Args& args);
+int CmdProfile(Args& args);
+int CmdTemplates(Args& args);
+int CmdTimeZone(Args& args);
 
 }  // namespace navmisc::cli

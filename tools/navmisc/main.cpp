@@ -28,6 +28,12 @@ constexpr const char* kHelp =
     "                    where a trip was at a time, or when it passed a position\n"
     "  export TRIP --format gpx|kml|kmz|tcx|csv [--metric] -o FILE\n"
     "                    write a trip as an interchange document\n"
+    "  profile [--app A] [--on MM/DD/YYYY]\n"
+    "                    show an application's user profile (A as for trips, or where)\n"
+    "  templates [--language CODE]\n"
+    "                    list the web-page templates of the program's catalogue\n"
+    "  timezone          the local offset from UTC and whether the zone observes daylight\n"
+    "                    saving\n"
     "\n"
     "Options:\n"
     "  --data-root DIR   the data folder (default $XDG_DATA_HOME/navmisc, else\n"
@@ -78,6 +84,9 @@ int main(int argc, char** argv) {
       {"demo", navmisc::cli::CmdDemo},
       {"trips", navmisc::cli::CmdTrips},
       {"export", navmisc::cli::CmdExport},
+      {"profile", navmisc::cli::CmdProfile},
+      {"templates", navmisc::cli::CmdTemplates},
+      {"timezone", navmisc::cli::CmdTimeZone},
   };
   auto it = commands.find(command);
   if (it == commands.end()) {
