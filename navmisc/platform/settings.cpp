@@ -612,6 +612,8 @@ void WR_STRING(unsigned long handle, const wchar_t* section, const wchar_t* key,
   WriteText(handle, section, key, std::move(text));
 }
 
+void WR_ABANDON(unsigned long handle) { Writers().Take(handle); }
+
 int WR_END(unsigned long handle) {
   const auto writer = Writers().Take(handle);
   if (!writer) return 0;

@@ -29,3 +29,5 @@ void WR_STRING(unsigned long handle, const wchar_t* section, const wchar_t* key,
 // Writes the document atomically and releases the handle: 1 on success, 0 when the file could
 // not be written (the previous file is then intact).
 int WR_END(unsigned long handle);
+// Drops an unfinished document and releases the handle; the file stays as it was.
+void WR_ABANDON(unsigned long handle);

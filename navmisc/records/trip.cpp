@@ -172,7 +172,13 @@ void BLOG_ITEM_INFO::WriteInfo(int write, int* counter, bool* keepGoing) {
     WR_STRING(h, s, L"tags", tags);
   }
   if (counter) *counter += 1;
-  // A stop on request returns before WR_END: the old settings file stays as it was.
+  // A stop on request never reaches WR_END: the old settings file stays as it was, and the
+  // unfinished document is dropped.
+  auto stopped = [&] {
+    if (!keepGoing || *keepGoing) return false;
+    if (write) WR_ABANDON(h);
+    return true;
+  };
   if (write) {
     WR_INT(h, s, L"runner_item_info_count", runners.GetCount());
     int n = 0;
@@ -186,20 +192,20 @@ void BLOG_ITEM_INFO::WriteInfo(int write, int* counter, bool* keepGoing) {
       WR_INT(h, rs, L"count", r->frameCount);
       for (int f = 0; f < r->frameCount && f < RUNNER_ITEM_INFO::kMaxFrames; ++f)
         WR_STRING(h, rs, FormatString(L"url(%d)", f), r->frameUrl[f]);
-      if (keepGoing && !*keepGoing) return;
+      if (stopped()) return;
     }
     WR_INT(h, s, L"track_item_info_count", tracks.GetCount());
   }
   int n = 0;
   for (auto* t : Items<TRACK_ITEM_INFO>(tracks)) {
     t->WriteInfo(h, ListSection(L"%s_TK(%d)", n++), write, counter, keepGoing);
-    if (keepGoing && !*keepGoing) return;
+    if (stopped()) return;
   }
   if (write) WR_INT(h, s, L"photo_item_info_count", photos.GetCount());
   n = 0;
   for (auto* p : Items<PHOTO_ITEM_INFO>(photos)) {
     p->WriteInfo(h, ListSection(L"%s_PH(%d)", n++), write, counter);
-    if (keepGoing && !*keepGoing) return;
+    if (stopped()) return;
   }
   if (write) WR_END(h);
 }
