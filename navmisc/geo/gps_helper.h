@@ -84,8 +84,10 @@ class CGPSHelper {
   void _Arrange(sWayPoint* points, int& count);
 
  private:
+  // Distances between the records of one array (see gps_helper.cpp).
+  class RecordDistances;
   int StopWalk(sWayPoint* points, int count, double stopSpeed, double returnRadius,
-               double leaveRadius, bool reviseTexts);
+               double leaveRadius, bool reviseTexts, const RecordDistances& distances);
 };
 
 // The east-west distance in kilometres at latitude `a` between longitudes `b` and `d`: the first
