@@ -19,37 +19,49 @@ UnitVector ToUnitVector(double lat, double lon) {
   return {c * std::cos(lo), c * std::sin(lo), std::sin(la)};
 }
 
-double AngleBetween(const UnitVector& a, const UnitVector& b) {
-  const double dx = a.x - b.x, dy = a.y - b.y, dz = a.z - b.z;
-  const double half = std::sqrt(dx * dx + dy * dy + dz * dz) * 0.5;
-  return 2.0 * std::asin(std::min(1.0, half));
+namespace {
+
+UnitVector Cross(const UnitVector& a, const UnitVector& b) {
+  return {a.y * b.z - a.z * b.y, a.z * b.x - a.x * b.z, a.x * b.y - a.y * b.x};
 }
 
-// The nearest point of the chord a-b to p, pushed back onto the sphere. That point lies on the
-// arc, so the result is never less than the true distance to the arc (which keeps the bounds of
-// the indexed search valid), and for legs of a track (metres to kilometres) it differs from the
-// exact arc distance by far less than a millimetre. Chord-based angles stay accurate for tiny
-// separations, where the haversine-free formulas with acos would lose everything.
+double Dot(const UnitVector& a, const UnitVector& b) { return a.x * b.x + a.y * b.y + a.z * b.z; }
+
+}  // namespace
+
+// atan2 of the sine and cosine stays accurate for tiny and for nearly opposite directions,
+// where acos or a chord's asin lose their digits.
+double AngleBetween(const UnitVector& a, const UnitVector& b) {
+  const UnitVector c = Cross(a, b);
+  return std::atan2(std::sqrt(Dot(c, c)), Dot(a, b));
+}
+
+// The nearest point of the great circle through a and b is p's projection onto the circle's
+// plane; when that lies outside the arc, the nearer end is the nearest point.
 double SegmentDistanceKm(const UnitVector& a, const UnitVector& b, const UnitVector& p,
                          double* where) {
-  const double dx = b.x - a.x, dy = b.y - a.y, dz = b.z - a.z;
-  const double dd = dx * dx + dy * dy + dz * dz;
-  double t = 0.0;
-  if (dd > 0.0) {
-    t = ((p.x - a.x) * dx + (p.y - a.y) * dy + (p.z - a.z) * dz) / dd;
-    t = std::clamp(t, 0.0, 1.0);
+  const UnitVector n = Cross(a, b);
+  const double nn = Dot(n, n);
+  const double ends[2] = {AngleBetween(p, a), AngleBetween(p, b)};
+  // Outside the arc (or without a circle: equal ends, or p at the circle's pole, where every
+  // point of the circle is equally far) the nearer end answers.
+  auto nearerEnd = [&] {
+    const bool second = ends[1] < ends[0];
+    if (where) *where = second ? 1.0 : 0.0;
+    return ends[second ? 1 : 0] * kEarthRadiusKm;
+  };
+  if (nn == 0.0) return nearerEnd();
+  const double k = Dot(p, n) / nn;
+  UnitVector q{p.x - k * n.x, p.y - k * n.y, p.z - k * n.z};
+  const double qq = Dot(q, q);
+  if (qq == 0.0 || !(Dot(Cross(a, q), n) >= 0.0 && Dot(Cross(q, b), n) >= 0.0)) return nearerEnd();
+  const double len = std::sqrt(qq);
+  q = {q.x / len, q.y / len, q.z / len};
+  if (where) {
+    const double arc = AngleBetween(a, b);
+    *where = arc > 0.0 ? std::min(1.0, AngleBetween(a, q) / arc) : 0.0;
   }
-  UnitVector q{a.x + t * dx, a.y + t * dy, a.z + t * dz};
-  const double len = std::sqrt(q.x * q.x + q.y * q.y + q.z * q.z);
-  if (len > 1e-12) {
-    q.x /= len;
-    q.y /= len;
-    q.z /= len;
-  } else {
-    q = a;  // antipodal ends: every great circle through them is as good
-  }
-  if (where) *where = t;
-  return AngleBetween(q, p) * kEarthRadiusKm;
+  return AngleBetween(p, q) * kEarthRadiusKm;
 }
 
 }  // namespace navmisc::geo
