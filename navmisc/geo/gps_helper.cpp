@@ -42,13 +42,12 @@ double SegmentDistanceKm(const UnitVector& a, const UnitVector& b, const UnitVec
                          double* where) {
   const UnitVector n = Cross(a, b);
   const double nn = Dot(n, n);
-  const double ends[2] = {AngleBetween(p, a), AngleBetween(p, b)};
   // Outside the arc (or without a circle: equal ends, or p at the circle's pole, where every
   // point of the circle is equally far) the nearer end answers.
   auto nearerEnd = [&] {
-    const bool second = ends[1] < ends[0];
-    if (where) *where = second ? 1.0 : 0.0;
-    return ends[second ? 1 : 0] * kEarthRadiusKm;
+    const double toA = AngleBetween(p, a), toB = AngleBetween(p, b);
+    if (where) *where = toB < toA ? 1.0 : 0.0;
+    return (toB < toA ? toB : toA) * kEarthRadiusKm;
   };
   if (nn == 0.0) return nearerEnd();
   const double k = Dot(p, n) / nn;

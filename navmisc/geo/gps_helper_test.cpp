@@ -241,13 +241,13 @@ TEST(GpsHelper, WayPointArrayKeepsListSlotsAndArrangeCompacts) {
   list.AddTail(&p2);
   navmisc::WayPointArray array = navmisc::MakeWayPointArray(list);
   // One record per list entry: the non-null points first, in order, then the defaults.
-  EXPECT_EQ(array[0].latitude, 1.0);
-  EXPECT_EQ(array[0].speed, 3600);
-  EXPECT_EQ(array[0].extraA, -8);
-  EXPECT_EQ(array[0].valid, 1);
-  EXPECT_EQ(array[1].time, 20);
-  EXPECT_EQ(array[2].time, -1);
-  EXPECT_EQ(array[2].valid, 0);
+  EXPECT_EQ(+array[0].latitude, 1.0);
+  EXPECT_EQ(+array[0].speed, 3600);
+  EXPECT_EQ(+array[0].extraA, -8);
+  EXPECT_EQ(+array[0].valid, 1);
+  EXPECT_EQ(+array[1].time, 20);
+  EXPECT_EQ(+array[2].time, -1);
+  EXPECT_EQ(+array[2].valid, 0);
   EXPECT_EQ(CreateWayPointArray(CPtrList()), nullptr);
 
   Helper h;
@@ -256,11 +256,11 @@ TEST(GpsHelper, WayPointArrayKeepsListSlotsAndArrangeCompacts) {
   int count = 3;
   h._Arrange(array.get(), count);
   EXPECT_EQ(count, 2);
-  EXPECT_EQ(array[0].time, 20);
-  EXPECT_EQ(array[1].time, -1);
-  EXPECT_EQ(array[2].valid, 0);  // reset to the defaults
-  EXPECT_EQ(array[2].time, -1);
-  EXPECT_EQ(array[2].latitude, 0.0);
+  EXPECT_EQ(+array[0].time, 20);
+  EXPECT_EQ(+array[1].time, -1);
+  EXPECT_EQ(+array[2].valid, 0);  // reset to the defaults
+  EXPECT_EQ(+array[2].time, -1);
+  EXPECT_EQ(+array[2].latitude, 0.0);
 }
 
 }  // namespace

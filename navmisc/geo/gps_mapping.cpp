@@ -122,10 +122,9 @@ int CGPSMapping::MappingPointToTime(sWayPoint point, long& time, double toleranc
       time = m_pPoints[i].time;
       return 1;
     }
-    double where = 0.0;
     const double d = _GetMinDistance(m_pPoints[i].latitude, m_pPoints[i].longitude,
                                      m_pPoints[i + 1].latitude, m_pPoints[i + 1].longitude, lat,
-                                     lon, &where);
+                                     lon, nullptr);
     if (best < 0 || d < bestDistance) {
       best = i;
       bestDistance = d;

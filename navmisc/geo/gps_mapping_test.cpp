@@ -74,7 +74,7 @@ TEST(Mapping, TimeToPointInterpolatesOnePointPerSecond) {
       EXPECT_EQ(speed, -1);
       continue;
     }
-    EXPECT_EQ(answer.time, c.answerTime) << c.time;
+    EXPECT_EQ(+answer.time, c.answerTime) << c.time;
     EXPECT_EQ(speed, c.speed) << c.time;
     EXPECT_EQ(alt, c.alt) << c.time;
     if (!std::isnan(c.lat)) {
@@ -86,7 +86,7 @@ TEST(Mapping, TimeToPointInterpolatesOnePointPerSecond) {
   // interpolated points drift north of the great circle: 65 m in the middle.
   sWayPoint middle;
   ASSERT_EQ(mapping->MappingTimeToPoint(1010 + 1800, middle), 1);
-  EXPECT_NEAR((middle.latitude - 47.01) * 111195.0, 65.0, 0.5);
+  EXPECT_NEAR((+middle.latitude - 47.01) * 111195.0, 65.0, 0.5);
 }
 
 TEST(Mapping, LegAfterAPointMarkedMinus8IsNotInterpolated) {
@@ -94,9 +94,9 @@ TEST(Mapping, LegAfterAPointMarkedMinus8IsNotInterpolated) {
   static_cast<WAYPOINT_ITEM_INFO*>(track->points.GetHead())->extraA = -8;
   sWayPoint answer;
   ASSERT_EQ(MappingOf(*track)->MappingTimeToPoint(1005, answer), 1);
-  EXPECT_EQ(answer.time, 1000);
-  EXPECT_EQ(answer.latitude, 47.0);
-  EXPECT_EQ(answer.extraA, -8);
+  EXPECT_EQ(+answer.time, 1000);
+  EXPECT_EQ(+answer.latitude, 47.0);
+  EXPECT_EQ(+answer.extraA, -8);
 }
 
 TEST(Mapping, PointToTimeWithinTolerance) {

@@ -118,8 +118,10 @@ bool HandOutLevels(const Working& working, bool smoothing, int* progress, bool* 
     xs.reserve(working.records.size());
     ys.reserve(working.records.size());
     for (const sWayPoint& w : working.records) {
-      xs.push_back(w.longitude);
-      ys.push_back(w.latitude);
+      // By value: a packed double must not be bound to a reference.
+      const double lon = w.longitude, lat = w.latitude;
+      xs.push_back(lon);
+      ys.push_back(lat);
     }
     levels = KeepLevels(xs, ys);
     for (size_t i = 0; i < levels.size(); ++i) byLevel[levels[i]].push_back(working.points[i]);
