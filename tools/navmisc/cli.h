@@ -66,4 +66,7 @@ int CmdPlot(Args& args);
 int CmdPlace(Args& args);
 int CmdExport(Args& args);
 
+// The demo's geometry step (demo_geo.cpp): optimises the sample trips, writes a plot.
+void DemoGeometry();
+
 }  // namespace navmisc::cli

@@ -78,6 +78,9 @@ int main(int argc, char** argv) {
       {"demo", navmisc::cli::CmdDemo},
       {"trips", navmisc::cli::CmdTrips},
       {"export", navmisc::cli::CmdExport},
+      {"optimize", navmisc::cli::CmdOptimize},
+      {"plot", navmisc::cli::CmdPlot},
+      {"place", navmisc::cli::CmdPlace},
   };
   auto it = commands.find(command);
   if (it == commands.end()) {
