@@ -11,6 +11,7 @@
 #include <vector>
 
 #include "navmisc/geo/cleaning.h"
+#include "navmisc/platform/shared_globals.h"
 #include "navmisc/records/trip.h"
 
 namespace navmisc::testing {
@@ -57,6 +58,18 @@ class OwnedPoints {
   }
 
   CPtrList list;
+};
+
+// Sets the shared product identity (which selects the stop thresholds) for a scope.
+class ProductScope {
+ public:
+  explicit ProductScope(GPS_APP_PROG_TYPE product) : previous_(g_nProductId) { g_nProductId = product; }
+  ~ProductScope() { g_nProductId = previous_; }
+  ProductScope(const ProductScope&) = delete;
+  ProductScope& operator=(const ProductScope&) = delete;
+
+ private:
+  GPS_APP_PROG_TYPE previous_;
 };
 
 // Positions a given number of metres east and north of 47 N 8 E (degrees).

@@ -8,23 +8,14 @@
 #include "geo_reference.h"
 #include "navmisc/geo/gps_helper.h"
 #include "navmisc/geo/trace.h"
-#include "navmisc/platform/shared_globals.h"
 
 namespace {
 
+using navmisc::testing::ProductScope;
 using navmisc::testing::MetresEast;
 using navmisc::testing::MetresNorth;
 using navmisc::testing::OwnedPoints;
 using Indices = std::vector<int>;
-
-class ProductScope {
- public:
-  explicit ProductScope(GPS_APP_PROG_TYPE product) : previous_(g_nProductId) { g_nProductId = product; }
-  ~ProductScope() { g_nProductId = previous_; }
-
- private:
-  GPS_APP_PROG_TYPE previous_;
-};
 
 // 20 fixes 5 s apart walking east at 10 m/s, with `edit` applied to fix i before it is added.
 struct Fix {

@@ -29,7 +29,6 @@ TEST(GpsHelper, DistancesMatchReferenceValuesInEveryUnit) {
   } cases[] = {
       {{51.5074, -0.1278}, {48.8566, 2.3522}, 343.55606034104176, 213.32722880382374, 185.37791063167464},
       {{40.7128, -74.0060}, {34.0522, -118.2437}, 3935.746254609723, 2443.8568801186725, 2123.6720922103036},
-      {{-33.8688, 151.2093}, {-36.8485, 174.7633}, 2155.8983259777406, 1338.680548982568, 1163.29173994878},
       {{0, 0}, {0, 1}, 111.19492664455873, 69.04522520889567, 59.999183695809066},
       {{0, 0}, {90, 0}, 10007.543398010286, 6214.07026880061, 5399.926532622816},
       {{0, 0}, {0, 180}, 20015.086796020572, 12428.14053760122, 10799.853065245632},
@@ -155,68 +154,53 @@ TEST(GpsHelper, DistanceToSegmentsAndPolylines) {
   EXPECT_EQ(h.GetMinDistance(line.data(), 0, 0.5, 1.01, &where), -1.0);
 }
 
-TEST(GpsHelper, MappingToXYPlotsNorthUpAndCoarsensBySteps) {
-  Helper h;
-  // One record: drawn at the margin, the area shrinks to the margins.
-  std::vector<sWayPoint> one(1);
-  one[0].latitude = 47;
-  one[0].longitude = 8;
-  std::vector<CPoint> screen(1);
-  int count = 1;
-  long size = 400;
+struct Plot {
+  std::vector<CPoint> screen;
+  long size;
   double deviation = -1;
-  h.MappingToXY(one.data(), count, screen.data(), size, 10, &deviation);
-  EXPECT_EQ(screen[0].x, 10);
-  EXPECT_EQ(screen[0].y, 10);
-  EXPECT_EQ(size, 20);
-  EXPECT_EQ(deviation, 0.5);
+};
 
-  // A size of 0 or less cannot make the coarsening loop run forever.
-  std::vector<sWayPoint> leg(2);
-  leg[1].longitude = 0.01;  // 1111.9 m east on the equator
-  screen.assign(2, CPoint{});
-  for (long requested : {0L, -5L}) {
-    size = requested;
-    h.MappingToXY(leg.data(), count = 2, screen.data(), size, 3, nullptr);
-    EXPECT_EQ(size, 1111 + 6);
+Plot PlotOf(const std::vector<Pos>& track, long size, long margin) {
+  std::vector<sWayPoint> records(track.size());
+  for (size_t i = 0; i < track.size(); ++i) {
+    records[i].latitude = track[i].lat;
+    records[i].longitude = track[i].lon;
   }
+  Plot plot{std::vector<CPoint>(track.size(), CPoint{-1, -1}), size};
+  int count = static_cast<int>(track.size());
+  Helper().MappingToXY(records.data(), count, plot.screen.data(), plot.size, margin, &plot.deviation);
+  return plot;
+}
 
+TEST(GpsHelper, MappingToXYPlotsNorthUpAndCoarsensBySteps) {
+  const std::vector<Pos> leg = {{0, 0}, {0, 0.01}};  // 1111.9 m east on the equator
   const struct {
-    long size, expectSize, expectX;
-  } scales[] = {
-      {2000, 1111 + 2 * 5, 1111 + 5},  // fits at one metre per pixel
-      {1111, 1111, 925 + 5},           // at its own extent: 1111 / 1.2
-      {500, 500, 462 + 5},             // 1111 / 2.2 = 505 is still too wide; 2.4 fits
+    std::vector<Pos> track;
+    long size, margin, expectSize;
+    CPoint last;
+    double deviation;
+  } cases[] = {
+      {{{47, 8}}, 400, 10, 20, {10, 10}, 0.5},  // one record: at the margin
+      {leg, 0, 3, 1111 + 6, {1111 + 3, 3}, 0.5},  // sizes of 0 or less cannot loop for ever
+      {leg, -5, 3, 1111 + 6, {1111 + 3, 3}, 0.5},
+      {leg, 2000, 5, 1111 + 10, {1111 + 5, 5}, 0.5},  // fits at one metre per pixel
+      {leg, 1111, 5, 1111, {925 + 5, 5}, 0.5},        // at its own extent: 1111 / 1.2
+      {leg, 500, 5, 500, {462 + 5, 5}, 0.5},          // 1111 / 2.2 = 505 is too wide; 2.4 fits
+      // North up; the bend lies 111.2 m off the line from first to last.
+      {{{0, 0}, {0.001, 0.0005}, {0, 0.001}}, 1000, 0, 111, {111, 111}, 111.19 + 0.5},
   };
-  for (const auto& s : scales) {
-    size = s.size;
-    h.MappingToXY(leg.data(), count = 2, screen.data(), size, 5, nullptr);
-    EXPECT_EQ(size, s.expectSize) << s.size;
-    EXPECT_EQ(screen[0].x, 5);
-    EXPECT_EQ(screen[1].x, s.expectX) << s.size;
-    EXPECT_EQ(screen[1].y, 5);
+  for (const auto& c : cases) {
+    const Plot plot = PlotOf(c.track, c.size, c.margin);
+    EXPECT_EQ(plot.size, c.expectSize) << c.size;
+    EXPECT_EQ(plot.screen.front().x, c.margin) << c.size;
+    EXPECT_EQ(plot.screen.back().x, c.last.x) << c.size;
+    EXPECT_EQ(plot.screen.back().y, c.last.y) << c.size;
+    EXPECT_NEAR(plot.deviation, c.deviation, 0.01) << c.size;
   }
-
-  // North up: the northern point is drawn higher; the middle point of a bend lies 111.2 m off
-  // the line from first to last.
-  std::vector<sWayPoint> bend(3);
-  bend[1].latitude = 0.001;
-  bend[1].longitude = 0.0005;
-  bend[2].longitude = 0.001;
-  screen.assign(3, CPoint{});
-  size = 1000;
-  h.MappingToXY(bend.data(), count = 3, screen.data(), size, 0, &deviation);
-  EXPECT_EQ(screen[1].y, 0);
-  EXPECT_EQ(screen[0].y, 111);
-  EXPECT_EQ(screen[2].x, 111);
-  EXPECT_NEAR(deviation, 111.19 + 0.5, 0.01);
-
-  // Nothing to plot: nothing is touched.
-  size = 77;
-  screen[0] = CPoint{-1, -1};
-  h.MappingToXY(bend.data(), count = 0, screen.data(), size, 0, &deviation);
-  EXPECT_EQ(size, 77);
-  EXPECT_EQ(screen[0].x, -1);
+  EXPECT_EQ(PlotOf({{0, 0}, {0.001, 0.0005}, {0, 0.001}}, 1000, 0).screen[1].y, 0);
+  const Plot none = PlotOf({}, 77, 0);  // nothing to plot: nothing is touched
+  EXPECT_EQ(none.size, 77);
+  EXPECT_EQ(none.deviation, -1);
 }
 
 TEST(GpsHelper, TimeSpansAreUnsignedAndUnchecked) {
@@ -230,37 +214,29 @@ TEST(GpsHelper, TimeSpansAreUnsignedAndUnchecked) {
 TEST(GpsHelper, WayPointArrayKeepsListSlotsAndArrangeCompacts) {
   CPtrList list;
   WAYPOINT_ITEM_INFO p1, p2;
-  p1.latitude = 1;
   p1.time = 10;
   p1.speed = 3600;
   p1.extraA = -8;
-  p2.latitude = 2;
   p2.time = 20;
-  list.AddTail(&p1);
-  list.AddTail(static_cast<void*>(nullptr));
-  list.AddTail(&p2);
+  for (void* entry : {static_cast<void*>(&p1), static_cast<void*>(nullptr), static_cast<void*>(&p2)}) list.AddTail(entry);
   navmisc::WayPointArray array = navmisc::MakeWayPointArray(list);
   // One record per list entry: the non-null points first, in order, then the defaults.
-  EXPECT_EQ(+array[0].latitude, 1.0);
   EXPECT_EQ(+array[0].speed, 3600);
   EXPECT_EQ(+array[0].extraA, -8);
-  EXPECT_EQ(+array[0].valid, 1);
   EXPECT_EQ(+array[1].time, 20);
+  EXPECT_EQ(+array[1].valid, 1);
   EXPECT_EQ(+array[2].time, -1);
   EXPECT_EQ(+array[2].valid, 0);
   EXPECT_EQ(CreateWayPointArray(CPtrList()), nullptr);
 
-  Helper h;
   array[0].valid = 0;
   array[2].valid = 1;
   int count = 3;
-  h._Arrange(array.get(), count);
+  Helper()._Arrange(array.get(), count);
   EXPECT_EQ(count, 2);
   EXPECT_EQ(+array[0].time, 20);
   EXPECT_EQ(+array[1].time, -1);
   EXPECT_EQ(+array[2].valid, 0);  // reset to the defaults
-  EXPECT_EQ(+array[2].time, -1);
-  EXPECT_EQ(+array[2].latitude, 0.0);
 }
 
 }  // namespace

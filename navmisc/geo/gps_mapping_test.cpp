@@ -6,6 +6,7 @@
 #include <memory>
 #include <random>
 #include <string>
+#include <tuple>
 #include <vector>
 
 #include "geo_reference.h"
@@ -187,27 +188,21 @@ TEST(Mapping, PlacementPrefersTimeThenPositionThenClears) {
 }
 
 TEST(Mapping, PhotoAndTrackListsStayInOrder) {
-  struct Spec {
-    const char* name;
-    bool placed;
-    int32_t playback, original;
-  };
-  // Inserted in this order; equal keys go before the photos already there.
-  const Spec specs[] = {
-      {"P1", true, 100, 0}, {"U1", false, 0, 5},  {"P2", true, 50, 0},  {"N1", true, 0, 30},
-      {"P3", true, 100, 0}, {"N2", true, 0, 10},  {"U2", false, 0, 1},  {"U3", false, 0, 5},
-  };
+  // Inserted in this order (name, placed, playback time, original time); equal keys go before
+  // the photos already there.
+  const std::tuple<const char*, bool, int32_t, int32_t> specs[] = {
+      {"P1", true, 100, 0}, {"U1", false, 0, 5}, {"P2", true, 50, 0}, {"N1", true, 0, 30},
+      {"P3", true, 100, 0}, {"N2", true, 0, 10}, {"U2", false, 0, 1}, {"U3", false, 0, 5}};
   std::vector<std::unique_ptr<PHOTO_ITEM_INFO>> photos;
   CPtrList list;
-  for (const Spec& s : specs) {
-    auto photo = std::make_unique<PHOTO_ITEM_INFO>();
-    photo->photoId = CString::FromUtf8(s.name);
-    photo->latitude = s.placed ? 47.0 : 0.0;
-    photo->longitude = s.placed ? 8.0 : 0.0;
-    photo->playbackTime = s.playback;
-    photo->originalTime = s.original;
-    InsertItemToPhotoList(list, photo.get());
-    photos.push_back(std::move(photo));
+  for (const auto& [name, placed, playback, original] : specs) {
+    photos.push_back(std::make_unique<PHOTO_ITEM_INFO>());
+    PHOTO_ITEM_INFO& photo = *photos.back();
+    photo.photoId = CString::FromUtf8(name);
+    photo.latitude = photo.longitude = placed ? 1.0 : 0.0;
+    photo.playbackTime = playback;
+    photo.originalTime = original;
+    InsertItemToPhotoList(list, &photo);
   }
   std::string order;
   for (void* v : list) order += static_cast<PHOTO_ITEM_INFO*>(v)->photoId.ToUtf8() + " ";

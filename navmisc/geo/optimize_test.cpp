@@ -9,12 +9,12 @@
 
 #include "geo_reference.h"
 #include "navmisc/platform/files.h"
-#include "navmisc/platform/shared_globals.h"
 #include "navmisc/records/trip.h"
 #include "testutil.h"
 
 namespace {
 
+using navmisc::testing::ProductScope;
 using navmisc::testing::OptimizeTripLiterally;
 constexpr int kKept = WAYPOINT_ITEM_INFO::kFlagKept;
 
@@ -61,15 +61,6 @@ void ExpectSameLevels(BLOG_ITEM_INFO& a, BLOG_ITEM_INFO& b, const std::string& w
   }
 }
 
-class ProductScope {
- public:
-  explicit ProductScope(GPS_APP_PROG_TYPE product) : previous_(g_nProductId) { g_nProductId = product; }
-  ~ProductScope() { g_nProductId = previous_; }
-
- private:
-  GPS_APP_PROG_TYPE previous_;
-};
-
 // The one-pass levels against a separate Smooth run for every level.
 TEST(OptimizeWaypoint, LevelsEqualTheLiteralMethod) {
   const struct {
@@ -79,7 +70,7 @@ TEST(OptimizeWaypoint, LevelsEqualTheLiteralMethod) {
       {{{1, 3000}}, GPS_APP_TRIP},
       {{{2, 1500}, {3, 400}, {4, 120}}, GPS_APP_TRIP},
       {{{5, 2500}, {6, 1200}}, GPS_APP_SPORT},
-      {{{7, 60}, {8, 101}, {9, 102}, {10, 1}}, GPS_APP_TRACKER},
+      {{{7, 60}, {8, 101}, {9, 102}, {10, 1}}, GPS_APP_TRACKER},  // a lone fix gets a twin
       {{{11, 5000}}, GPS_APP_TRACKER},
   };
   for (const auto& c : cases) {
@@ -124,22 +115,6 @@ TEST(OptimizeWaypoint, ShortTracksAreNotRevisedOrSmoothed) {
     // Smoothing hands every remaining point a level of 100 or below.
     EXPECT_EQ(essential, c.smoothed ? 0 : c.points - badFixes) << c.points;
   }
-}
-
-TEST(OptimizeWaypoint, LoneFixGetsATwinOneSecondLater) {
-  auto trip = std::make_unique<BLOG_ITEM_INFO>(GPS_APP_TRIP, L"OPT", 0);
-  auto* track = new TRACK_ITEM_INFO(trip.get());
-  trip->tracks.AddTail(track);
-  auto* fix = new WAYPOINT_ITEM_INFO(nullptr);
-  fix->time = 2147483647;  // the twin's time wraps rather than overflowing
-  fix->latitude = 47;
-  track->points.AddTail(fix);
-  trip->OptimizeWaypoint(GPS_APP_TRIP, 1, nullptr, nullptr);
-  const auto points = PointsOf(track);
-  ASSERT_EQ(points.size(), 2u);
-  EXPECT_EQ(points[1]->time, -2147483647 - 1);
-  EXPECT_EQ(points[1]->latitude, 47.0);
-  EXPECT_EQ(points[1]->type, navmisc::kLevelNeverDropped);
 }
 
 TEST(OptimizeWaypoint, OffKeepsTheLevelsAndRecomputesTheDisplayLevel) {

@@ -30,7 +30,7 @@ std::string ColourOf(int level) {
 // level, so that the points that carry the shape stand out.
 double RadiusOf(int level, double base) {
   if (level == kLevelBadFix || level == kLevelStop) return base * 1.6;
-  if (level >= kLevelNeverDropped) return base * 1.8;
+  if (level >= kLevelNeverDropped) return base * 2.0;
   if (level < 0) return base;
   return base * (0.8 + std::min(level, kSmoothSteps) / static_cast<double>(kSmoothSteps));
 }

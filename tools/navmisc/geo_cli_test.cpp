@@ -39,6 +39,13 @@ std::vector<WAYPOINT_ITEM_INFO*> AllPoints(BLOG_ITEM_INFO& trip) {
   return out;
 }
 
+// A command line, the exit code it must end with and a text its output must hold.
+struct Expectation {
+  std::string args;
+  int code;
+  std::string shows;
+};
+
 class GeoCommands : public ::testing::Test {
  protected:
   void SetUp() override {
@@ -63,6 +70,14 @@ class GeoCommands : public ::testing::Test {
   }
 
   std::string Tool(const std::string& args) { return "--data-root " + root.path().ToUtf8() + " " + args; }
+
+  void Check(const std::vector<Expectation>& cases, const std::string& prefix = "") {
+    for (const Expectation& c : cases) {
+      const Result r = RunTool(Tool(prefix + c.args));
+      EXPECT_EQ(r.code, c.code) << c.args << "\n" << r.output;
+      EXPECT_NE(r.output.find(c.shows), std::string::npos) << c.args << "\n" << r.output;
+    }
+  }
 
   navmisc::testutil::TempDir root;
   navmisc::testutil::DataRootScope scope{root.path()};
@@ -116,11 +131,7 @@ TEST_F(GeoCommands, PlaceAnswersByTimeOrPosition) {
   const WAYPOINT_ITEM_INFO* fix = AllPoints(*trip)[700];
   const std::string lat = navmisc::FormatA("%.6f", fix->latitude);
   const std::string lon = navmisc::FormatA("%.6f", fix->longitude);
-  const struct {
-    std::string args;
-    int code;
-    std::string shows;
-  } cases[] = {
+  Check({
       {"--time " + std::to_string(fix->time), 0, "latitude   " + lat},
       {"--lat " + lat + " --lon " + lon + " --tolerance 5", 0, "placed by position"},
       {"--lat 10 --lon 10", 1, "no track of the trip passed within 50 m"},
@@ -129,20 +140,11 @@ TEST_F(GeoCommands, PlaceAnswersByTimeOrPosition) {
       {"--lat 10", 2, "--lat and --lon go together"},
       {"--lat 0 --lon 0", 2, "0/0 stands for no position"},
       {"--time yesterday", 2, "is not a time"},
-  };
-  for (const auto& c : cases) {
-    const Result r = RunTool(Tool("place GEOTRIP " + c.args));
-    EXPECT_EQ(r.code, c.code) << c.args << "\n" << r.output;
-    EXPECT_NE(r.output.find(c.shows), std::string::npos) << c.args << "\n" << r.output;
-  }
+  }, "place GEOTRIP ");
 }
 
 TEST_F(GeoCommands, ClearErrors) {
-  const struct {
-    std::string args;
-    int code;
-    std::string shows;
-  } cases[] = {
+  Check({
       {"optimize NOPE", 1, "no trip 'NOPE'"},
       {"optimize", 2, "optimize takes one trip id"},
       {"plot GEOTRIP", 2, "plot needs -o FILE.svg"},
@@ -151,12 +153,7 @@ TEST_F(GeoCommands, ClearErrors) {
       {"optimize --help", 0, "Usage: navmisc optimize TRIP"},
       {"plot --help", 0, "Usage: navmisc plot TRIP"},
       {"place --help", 0, "Usage: navmisc place TRIP"},
-  };
-  for (const auto& c : cases) {
-    const Result r = RunTool(Tool(c.args));
-    EXPECT_EQ(r.code, c.code) << c.args << "\n" << r.output;
-    EXPECT_NE(r.output.find(c.shows), std::string::npos) << c.args << "\n" << r.output;
-  }
+  });
 }
 
 }  // namespace
