@@ -104,7 +104,8 @@ TEST_F(GeoCommands, OptimizeStoresTheLibrarysLevels) {
   // --off keeps the levels and chooses the display level again.
   const Result off = RunTool(Tool("optimize GEOTRIP --off"));
   ASSERT_EQ(off.code, 0) << off.output;
-  const auto again = AllPoints(*Load());
+  auto reloaded = Load();
+  const auto again = AllPoints(*reloaded);
   for (size_t i = 0; i < a.size(); ++i) ASSERT_EQ(again[i]->type, a[i]->type) << i;
 }
 
