@@ -23,11 +23,6 @@ using Entries = std::vector<WAYPOINT_ITEM_INFO*>;
 struct Working {
   Entries points;
   std::vector<sWayPoint> records;
-
-  void Add(WAYPOINT_ITEM_INFO* p) {
-    points.push_back(p);
-    records.push_back(ToWayPoint(*p));
-  }
 };
 
 void Advance(int* progress) {
@@ -50,25 +45,27 @@ const std::vector<double>& Tolerances() {
 Working LevelBadFixes(const Entries& entries) {
   const int n = static_cast<int>(entries.size());
   const bool revise = n > 50;
+  Working working;
   // The wrapper's array: one record per non-null entry, in order, the rest left at the defaults.
-  std::vector<sWayPoint> all(revise ? entries.size() : 0);
+  // It becomes the working records in place below.
+  std::vector<sWayPoint>& all = working.records;
+  all.resize(entries.size());
   int next = 0;
   for (WAYPOINT_ITEM_INFO* p : entries) {
     if (!p) continue;
     p->type = kLevelNeverDropped;
-    if (revise) {
-      p->flags[kKept] = 0;
-      all[next++] = ToWayPoint(*p);
-    }
+    if (revise) p->flags[kKept] = 0;
+    all[next++] = ToWayPoint(*p);
   }
   if (revise) {
     CGPSHelper helper;
     int count = n;
     helper.Revise(all.data(), count);
   }
-  Working working;
-  working.points.reserve(entries.size());
-  working.records.reserve(entries.size());
+  // Entry k takes its mark from record k and its data from record `own` (its own record, at or
+  // before k); the working records are written at `still`, at or before `own`, so nothing is
+  // overwritten before it is read.
+  size_t own = 0, still = 0;
   for (int k = 0; k < n; ++k) {
     WAYPOINT_ITEM_INFO* p = entries[k];
     if (!p) continue;
@@ -77,8 +74,15 @@ Working LevelBadFixes(const Entries& entries) {
       if (all[k].valid == 1) p->flags[kKept] = 1;
       if (!p->flags[kKept] && p->type == kLevelNeverDropped) p->type = kLevelBadFix;
     }
-    if (p->type == kLevelNeverDropped) working.Add(p);
+    if (p->type == kLevelNeverDropped) {
+      sWayPoint record = all[own];
+      record.valid = 1;
+      all[still++] = record;
+      working.points.push_back(p);
+    }
+    ++own;
   }
+  all.resize(still);
   return working;
 }
 
