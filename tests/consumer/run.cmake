@@ -9,6 +9,8 @@ if(rc)
 endif()
 execute_process(COMMAND ${CMAKE_COMMAND} -S ${SOURCE_DIR}/tests/consumer -B ${WORK_DIR}/build
                         -DCMAKE_PREFIX_PATH=${prefix} -DCMAKE_BUILD_TYPE=Release
+                        "-DCMAKE_CXX_FLAGS=${CONSUMER_FLAGS}"
+                        "-DCMAKE_EXE_LINKER_FLAGS=${CONSUMER_FLAGS}"
                 RESULT_VARIABLE rc)
 if(rc)
   message(FATAL_ERROR "configure of the consumer failed: ${rc}")
