@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <cmath>
+#include <vector>
 
 #include "navmisc/geo/trace.h"
 #include "navmisc/platform/shared_globals.h"
@@ -18,37 +19,48 @@ UnitVector ToUnitVector(double lat, double lon) {
   return {c * std::cos(lo), c * std::sin(lo), std::sin(la)};
 }
 
-double AngleBetween(const UnitVector& a, const UnitVector& b) {
-  const double dx = a.x - b.x, dy = a.y - b.y, dz = a.z - b.z;
-  const double half = std::sqrt(dx * dx + dy * dy + dz * dz) * 0.5;
-  return 2.0 * std::asin(std::min(1.0, half));
+namespace {
+
+UnitVector Cross(const UnitVector& a, const UnitVector& b) {
+  return {a.y * b.z - a.z * b.y, a.z * b.x - a.x * b.z, a.x * b.y - a.y * b.x};
 }
 
-// The nearest point of the chord a-b to p, pushed back onto the sphere. That point lies on the
-// arc, so the result is never less than the true distance to the arc (which keeps the bounds of
-// the indexed search valid), and for legs of a track (metres to kilometres) it differs from the
-// exact arc distance by far less than a millimetre. Chord-based angles stay accurate for tiny
-// separations, where the haversine-free formulas with acos would lose everything.
+double Dot(const UnitVector& a, const UnitVector& b) { return a.x * b.x + a.y * b.y + a.z * b.z; }
+
+}  // namespace
+
+// atan2 of the sine and cosine stays accurate for tiny and for nearly opposite directions,
+// where acos or a chord's asin lose their digits.
+double AngleBetween(const UnitVector& a, const UnitVector& b) {
+  const UnitVector c = Cross(a, b);
+  return std::atan2(std::sqrt(Dot(c, c)), Dot(a, b));
+}
+
+// The nearest point of the great circle through a and b is p's projection onto the circle's
+// plane; when that lies outside the arc, the nearer end is the nearest point.
 double SegmentDistanceKm(const UnitVector& a, const UnitVector& b, const UnitVector& p,
                          double* where) {
-  const double dx = b.x - a.x, dy = b.y - a.y, dz = b.z - a.z;
-  const double dd = dx * dx + dy * dy + dz * dz;
-  double t = 0.0;
-  if (dd > 0.0) {
-    t = ((p.x - a.x) * dx + (p.y - a.y) * dy + (p.z - a.z) * dz) / dd;
-    t = std::clamp(t, 0.0, 1.0);
+  const UnitVector n = Cross(a, b);
+  const double nn = Dot(n, n);
+  // Outside the arc (or without a circle: equal ends, or p at the circle's pole, where every
+  // point of the circle is equally far) the nearer end answers.
+  auto nearerEnd = [&] {
+    const double toA = AngleBetween(p, a), toB = AngleBetween(p, b);
+    if (where) *where = toB < toA ? 1.0 : 0.0;
+    return (toB < toA ? toB : toA) * kEarthRadiusKm;
+  };
+  if (nn == 0.0) return nearerEnd();
+  const double k = Dot(p, n) / nn;
+  UnitVector q{p.x - k * n.x, p.y - k * n.y, p.z - k * n.z};
+  const double qq = Dot(q, q);
+  if (qq == 0.0 || !(Dot(Cross(a, q), n) >= 0.0 && Dot(Cross(q, b), n) >= 0.0)) return nearerEnd();
+  const double len = std::sqrt(qq);
+  q = {q.x / len, q.y / len, q.z / len};
+  if (where) {
+    const double arc = AngleBetween(a, b);
+    *where = arc > 0.0 ? std::min(1.0, AngleBetween(a, q) / arc) : 0.0;
   }
-  UnitVector q{a.x + t * dx, a.y + t * dy, a.z + t * dz};
-  const double len = std::sqrt(q.x * q.x + q.y * q.y + q.z * q.z);
-  if (len > 1e-12) {
-    q.x /= len;
-    q.y /= len;
-    q.z /= len;
-  } else {
-    q = a;  // antipodal ends: every great circle through them is as good
-  }
-  if (where) *where = t;
-  return AngleBetween(q, p) * kEarthRadiusKm;
+  return AngleBetween(p, q) * kEarthRadiusKm;
 }
 
 }  // namespace navmisc::geo
@@ -65,22 +77,74 @@ double RadiusOf(CGPSHelper::DIS_UNIT unit) {
   }
 }
 
+// The central angle (radians) between two positions by the haversine formula, with the cosines
+// of both latitudes supplied by the caller. 0 for identical positions, and for positions less
+// than a centimetre apart: that difference is rounding noise of the inputs, not a distance.
+double HaversineAngle(double lat1, double lon1, double cosLat1, double lat2, double lon2,
+                      double cosLat2) {
+  if (lat1 == lat2 && lon1 == lon2) return 0.0;
+  const double dLat = (lat2 - lat1) * kDegToRad;
+  const double dLon = (lon2 - lon1) * kDegToRad;
+  const double a = std::pow(std::sin(dLat / 2.0), 2.0) +
+                   cosLat1 * cosLat2 * std::pow(std::sin(dLon / 2.0), 2.0);
+  const double c = 2.0 * std::atan2(std::sqrt(a), std::sqrt(1.0 - a));
+  return c * 6371000.0 < 0.01 ? 0.0 : c;
+}
+
+// Truncation toward zero of a pixel distance. A distance that is not a number (a NaN
+// coordinate) lands on the left or top edge rather than in undefined behaviour.
+long TruncatePixels(double metres) {
+  return std::isfinite(metres) ? static_cast<long>(metres) : 0L;
+}
+
 }  // namespace
 
 CGPSHelper::~CGPSHelper() = default;
 
 double CGPSHelper::GetDistance(double lat1, double lon1, double lat2, double lon2, DIS_UNIT unit) {
-  if (lat1 == lat2 && lon1 == lon2) return 0.0;
-  const double dLat = (lat2 - lat1) * kDegToRad;
-  const double dLon = (lon2 - lon1) * kDegToRad;
-  const double a = std::pow(std::sin(dLat / 2.0), 2.0) +
-                   std::cos(lat1 * kDegToRad) * std::cos(lat2 * kDegToRad) *
-                       std::pow(std::sin(dLon / 2.0), 2.0);
-  const double c = 2.0 * std::atan2(std::sqrt(a), std::sqrt(1.0 - a));
-  // Below a centimetre the difference is rounding noise of the inputs, not a distance.
-  if (c * 6371000.0 < 0.01) return 0.0;
-  return c * RadiusOf(unit);
+  return HaversineAngle(lat1, lon1, std::cos(lat1 * kDegToRad), lat2, lon2,
+                        std::cos(lat2 * kDegToRad)) *
+         RadiusOf(unit);
 }
+
+// GetDistance in kilometres between records of one array, as the cleaning passes measure them:
+// the cosine of every latitude is taken once per array instead of twice per distance, and the
+// lengths of the legs between neighbours can be kept for a later look. The arithmetic is
+// GetDistance's own, so every result is the same to the last bit.
+class CGPSHelper::RecordDistances {
+ public:
+  RecordDistances(const sWayPoint* points, int count)
+      : points_(points), cos_(static_cast<size_t>(std::max(count, 0))) {
+    for (int i = 0; i < count; ++i) cos_[i] = std::cos(points[i].latitude * kDegToRad);
+  }
+
+  double Km(int from, int to) const {
+    const sWayPoint& a = points_[from];
+    const sWayPoint& b = points_[to];
+    return HaversineAngle(a.latitude, a.longitude, cos_[from], b.latitude, b.longitude,
+                          cos_[to]) *
+           RadiusOf(DIS_KILOMETER);
+  }
+  double Metres(int from, int to) const { return Km(from, to) * 1000.0; }
+
+  // The sum of Km(i - 1, i) over the array, added up in order; the legs are kept for Leg.
+  double SumOfLegsKm() {
+    legs_.assign(cos_.size(), 0.0);
+    double sum = 0.0;
+    for (size_t i = 1; i < legs_.size(); ++i) {
+      legs_[i] = Km(static_cast<int>(i) - 1, static_cast<int>(i));
+      sum += legs_[i];
+    }
+    return sum;
+  }
+  // Km(i - 1, i).
+  double LegKm(int i) const { return legs_.empty() ? Km(i - 1, i) : legs_[i]; }
+
+ private:
+  const sWayPoint* points_;
+  std::vector<double> cos_;
+  std::vector<double> legs_;
+};
 
 double CGPSHelper::GetInitialBearing(double lat1, double lon1, double lat2, double lon2) {
   if (lat1 == lat2 && lon1 == lon2) return 0.0;
@@ -90,6 +154,7 @@ double CGPSHelper::GetInitialBearing(double lat1, double lon1, double lat2, doub
       std::atan2(std::sin(dLon) * std::cos(la2),
                  std::cos(la1) * std::sin(la2) - std::sin(la1) * std::cos(la2) * std::cos(dLon)) *
       kRadToDeg;
+  if (std::isnan(theta)) return 0.0;  // a NaN coordinate has no direction to truncate
   // Whole degrees on purpose: the fraction is truncated after the shift into 0..720.
   return static_cast<double>(static_cast<int>(theta + 360.0) % 360);
 }
@@ -175,8 +240,8 @@ void CGPSHelper::MappingToXY(const sWayPoint* points, int& count, CPoint* screen
   long maxX = 0, maxY = 0;
   for (int i = 0; i < n; ++i) {
     const double lat = points[i].latitude, lon = points[i].longitude;
-    screen[i].x = static_cast<long>(GetDistance(lat, minLon, lat, lon, DIS_METER));
-    screen[i].y = static_cast<long>(GetDistance(maxLat, lon, lat, lon, DIS_METER));
+    screen[i].x = TruncatePixels(GetDistance(lat, minLon, lat, lon, DIS_METER));
+    screen[i].y = TruncatePixels(GetDistance(maxLat, lon, lat, lon, DIS_METER));
     maxX = std::max(maxX, screen[i].x);
     maxY = std::max(maxY, screen[i].y);
   }
@@ -232,11 +297,10 @@ int CGPSHelper::_Revise_by_interval(sWayPoint* points, int& count, double factor
 
 int CGPSHelper::_Revise_max_acceleration(sWayPoint* points, int& count, double speedLimit) {
   if (!points || count < 2) return 0;
+  const RecordDistances distances(points, count);
   auto speed = [&](int from, int to) {
-    const double metres = GetDistance(points[from].latitude, points[from].longitude,
-                                      points[to].latitude, points[to].longitude, DIS_KILOMETER) *
-                          1000.0;
-    return metres / static_cast<double>(_GetTimeDurationSec(points[from].time, points[to].time));
+    return distances.Metres(from, to) /
+           static_cast<double>(_GetTimeDurationSec(points[from].time, points[to].time));
   };
   int prev = 0, i = 1, dropped = 0;
   while (i < count) {
@@ -269,43 +333,39 @@ int CGPSHelper::_Revise_max_acceleration(sWayPoint* points, int& count, double s
 int CGPSHelper::Reduce(sWayPoint* points, int& count) {
   const bool sport = g_nProductId == GPS_APP_SPORT;
   double leave = sport ? 3.0 : 50.0;
+  RecordDistances distances(points, points ? count : 0);
   if (points && count > 50) {
-    double sum = 0.0;
-    for (int i = 1; i < count; ++i) {
-      sum += GetDistance(points[i - 1].latitude, points[i - 1].longitude, points[i].latitude,
-                         points[i].longitude, DIS_KILOMETER);
-    }
     // A densely logged track would otherwise hide its slow sections inside the leave radius.
-    const double meanLeg = sum / (count - 1) * 1000.0;
+    const double meanLeg = distances.SumOfLegsKm() / (count - 1) * 1000.0;
     if (meanLeg < leave) leave = meanLeg;
   }
   const double ret = sport ? 0.5 : 6.0;
-  return _Reduce_Stop_To_Move(points, count, 0.6, ret, leave);
+  // The stop pass measures the same legs again: it gets them from `distances`.
+  return StopWalk(points, count, 0.6, ret, leave, false, distances);
 }
 
 int CGPSHelper::_Reduce_Stop_To_Move(sWayPoint* points, int& count, double stopSpeed,
                                      double returnRadius, double leaveRadius) {
-  return StopWalk(points, count, stopSpeed, returnRadius, leaveRadius, false);
+  return StopWalk(points, count, stopSpeed, returnRadius, leaveRadius, false,
+                  RecordDistances(points, points ? count : 0));
 }
 
 int CGPSHelper::_Revise_Stop_To_Move(sWayPoint* points, int& count, double stopSpeed,
                                      double returnRadius, double leaveRadius) {
-  return StopWalk(points, count, stopSpeed, returnRadius, leaveRadius, true);
+  return StopWalk(points, count, stopSpeed, returnRadius, leaveRadius, true,
+                  RecordDistances(points, points ? count : 0));
 }
 
 int CGPSHelper::StopWalk(sWayPoint* points, int count, double stopSpeed, double returnRadius,
-                         double leaveRadius, bool reviseTexts) {
+                         double leaveRadius, bool reviseTexts, const RecordDistances& distances) {
   if (!points || count < 6) return 0;
-  auto metres = [&](double lat1, double lon1, int to) {
-    return GetDistance(lat1, lon1, points[to].latitude, points[to].longitude, DIS_KILOMETER) *
-           1000.0;
-  };
   bool stopped = false;
-  int r = 0, dropped = 0;
-  double stopLat = 0.0, stopLon = 0.0;
+  int r = 0, stop = 0, dropped = 0;
   for (int i = 1; i < count - 1; ++i) {  // the last point is never looked at
     if (!stopped) {
-      const double d = metres(points[r].latitude, points[r].longitude, i);
+      // The reference is always the point just before: r follows one behind, and a point that
+      // starts moving becomes the reference of the next one.
+      const double d = distances.LegKm(i) * 1000.0;
       const uint32_t t = _GetTimeDurationSec(points[r].time, points[i].time);
       // A zero time step gives an infinite speed for a move and NaN (a stop) for no move.
       const double v = d / static_cast<double>(t);
@@ -313,14 +373,13 @@ int CGPSHelper::StopWalk(sWayPoint* points, int count, double stopSpeed, double 
                         static_cast<int>(t), v);
       if (!(v > stopSpeed) || points[i].speed <= 0) {
         stopped = true;
-        stopLat = points[i].latitude;
-        stopLon = points[i].longitude;
+        stop = i;
         navmisc::GeoTrace("\nStop point = %d", i);
       }
       ++r;
       continue;
     }
-    const double d = metres(stopLat, stopLon, i);
+    const double d = distances.Metres(stop, i);
     if (d < leaveRadius || points[i].speed < 1) {
       if (reviseTexts) {
         navmisc::GeoTrace("\nptStop -> pt%d = %.6f < %.6f, Still Stop point", i, d, leaveRadius);
@@ -341,17 +400,18 @@ int CGPSHelper::StopWalk(sWayPoint* points, int count, double stopSpeed, double 
     }
     bool staying = false;
     for (int j = i + 1; j <= i + ahead && j <= count - 1; ++j) {  // never past the last point
-      const double dj = metres(stopLat, stopLon, j);
+      const double dj = distances.Metres(stop, j);
       navmisc::GeoTrace(reviseTexts ? "\nptStop -> pt%d = %.6f" : "\n\tptStop -> pt%d = %.6f", j,
                         dj);
       if (!(dj > returnRadius) || !(dj > d)) staying = true;
     }
+    // Only the earlier form names its decision after the look-ahead.
     if (staying) {
-      navmisc::GeoTrace("\nInvalidate point = %d", i);
+      if (reviseTexts) navmisc::GeoTrace("\nInvalidate point = %d", i);
       points[i].valid = 0;
       ++dropped;
     } else {
-      navmisc::GeoTrace("\nStart Moving point = %d", i);
+      if (reviseTexts) navmisc::GeoTrace("\nStart Moving point = %d", i);
       stopped = false;
       r = i;
     }

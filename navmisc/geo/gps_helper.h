@@ -84,8 +84,10 @@ class CGPSHelper {
   void _Arrange(sWayPoint* points, int& count);
 
  private:
+  // Distances between the records of one array (see gps_helper.cpp).
+  class RecordDistances;
   int StopWalk(sWayPoint* points, int count, double stopSpeed, double returnRadius,
-               double leaveRadius, bool reviseTexts);
+               double leaveRadius, bool reviseTexts, const RecordDistances& distances);
 };
 
 // The east-west distance in kilometres at latitude `a` between longitudes `b` and `d`: the first
@@ -104,11 +106,12 @@ struct UnitVector {
   double x, y, z;
 };
 UnitVector ToUnitVector(double lat, double lon);
-// Distance (km) from `p` to the arc a-b; `*where` receives the fraction of the arc. Exactly the
-// computation of CGPSHelper::_GetMinDistance, for callers that convert their points once.
+// Distance (km) from `p` to the great-circle arc a-b (the shorter one); `*where` (if given)
+// receives the fraction 0..1 of the arc at which the nearest point lies. Exactly the computation
+// of CGPSHelper::_GetMinDistance, for callers that convert their points once.
 double SegmentDistanceKm(const UnitVector& a, const UnitVector& b, const UnitVector& p,
                          double* where);
-// Angle (radians) between two unit vectors, from their chord.
+// Angle (radians, 0..pi) between two unit vectors.
 double AngleBetween(const UnitVector& a, const UnitVector& b);
 
 }  // namespace navmisc::geo

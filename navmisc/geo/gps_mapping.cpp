@@ -122,10 +122,9 @@ int CGPSMapping::MappingPointToTime(sWayPoint point, long& time, double toleranc
       time = m_pPoints[i].time;
       return 1;
     }
-    double where = 0.0;
     const double d = _GetMinDistance(m_pPoints[i].latitude, m_pPoints[i].longitude,
                                      m_pPoints[i + 1].latitude, m_pPoints[i + 1].longitude, lat,
-                                     lon, &where);
+                                     lon, nullptr);
     if (best < 0 || d < bestDistance) {
       best = i;
       bestDistance = d;
@@ -217,20 +216,22 @@ class IndexedTrack : public CGPSMapping {
       const double d = LegDistance(i, p);
       if (d < achieved) achieved = d;
     }
-    if (std::isnan(achieved)) achieved = std::numeric_limits<double>::infinity();
-    int best = -1;
-    double bestDistance = 0.0;
-    for (size_t b = 0; b < blocks_.size(); ++b) {
-      if (lower_[b] > achieved) continue;
-      for (int i = blocks_[b].first; i < blocks_[b].last; ++i) {
-        const double d = LegDistance(i, p);
-        if (best < 0 || d < bestDistance) {
-          best = i;
-          bestDistance = d;
+    // The plain scan starts from leg 0 whatever its distance (even a NaN one, which nothing
+    // then replaces) and moves on only to strictly nearer legs.
+    int best = 0;
+    double bestDistance = LegDistance(0, p);
+    if (!std::isnan(bestDistance)) {
+      for (size_t b = 0; b < blocks_.size(); ++b) {
+        if (lower_[b] > achieved) continue;
+        for (int i = blocks_[b].first; i < blocks_[b].last; ++i) {
+          const double d = LegDistance(i, p);
+          if (d < bestDistance) {
+            best = i;
+            bestDistance = d;
+          }
         }
       }
     }
-    if (best < 0) return 0;
     return _MapPointNearLeg(best, lat, lon, time, tolerance);
   }
 
@@ -238,8 +239,9 @@ class IndexedTrack : public CGPSMapping {
   static constexpr int kBlockLegs = 32;
   // Caps wider than this (radians) are not used for bounds; a track's legs never come close.
   static constexpr double kMaxCapRadius = 1.0;
-  // Covers the rounding of the distances compared against the caps, many times over.
-  static constexpr double kCapSlack = 1e-9;
+  // Covers the rounding of the angles compared against the caps (radians, about 6 m), with a
+  // wide margin even for a position nearly opposite the track, where asin loses the most.
+  static constexpr double kCapSlack = 1e-6;
 
   struct Block {
     int first = 0, last = 0;  // legs [first, last), that is points first .. last

@@ -21,10 +21,6 @@ constexpr int kSmoothSteps = 100;  // levels 100 .. 0
 // The Smooth tolerance (degrees) of level k.
 inline double SmoothLevelTolerance(int k) { return k * 0.0001; }
 
-// How the smoothing levels are found. Both give the same levels, kept-marks, progress and
-// cancellation points; the second runs Smooth once per level and serves as the reference.
-enum class SmoothLevelMethod { kSplitTree, kRepeatedSmooth };
-
 // For every point of `points` (WAYPOINT_ITEM_INFO*, nulls skipped), the largest k in 0 .. 100 at
 // which Smooth(points, SmoothLevelTolerance(k)) keeps it, in one Douglas-Peucker pass.
 std::vector<int> SmoothKeepLevels(const CPtrList& points);
@@ -33,10 +29,13 @@ std::vector<int> SmoothKeepLevels(const CPtrList& points);
 // list owns its points and `ownsPoints` says so). `progress` (may be null) advances by 100 after
 // the revise step, after the reduction step and after each of the 101 smoothing steps. Returns
 // false, at once, when `*keepGoing` (may be null) is found cleared after a smoothing step; the
-// levels set so far stay.
+// levels set so far stay, and the kept-marks are those that Smooth would have left at that step.
+//
+// The result is exactly that of running Smooth once per level from 100 down to 0, but the
+// Douglas-Peucker split tree is built once: where a range splits does not depend on the
+// tolerance, only whether it splits (see douglas_peucker.cpp).
 bool OptimizeTrackPoints(CPtrList& points, bool ownsPoints, int optimise, int* progress,
-                         bool* keepGoing,
-                         SmoothLevelMethod method = SmoothLevelMethod::kSplitTree);
+                         bool* keepGoing);
 
 // The display level of a track: the smallest L in 0 .. 100 at which fewer than the limit of
 // points (1000 for the trip application, 11000 otherwise) have a level of at least L; 101 when

@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <cmath>
+#include <cstring>
 #include <vector>
 
 #include "navmisc/geo/gps_helper.h"
@@ -23,6 +24,15 @@ std::string ColourOf(int level) {
   const int r = 160 - k * 150 / kSmoothSteps;
   const int g = 200 - k * 150 / kSmoothSteps;
   return FormatA("#%02x%02x%02x", r, g, 230 - k * 80 / kSmoothSteps);
+}
+
+// Dropped points a little larger, so that a lone bad fix is seen; kept points grow with their
+// level, so that the points that carry the shape stand out.
+double RadiusOf(int level, double base) {
+  if (level == kLevelBadFix || level == kLevelStop) return base * 1.6;
+  if (level >= kLevelNeverDropped) return base * 2.0;
+  if (level < 0) return base;
+  return base * (0.8 + std::min(level, kSmoothSteps) / static_cast<double>(kSmoothSteps));
 }
 
 // A round length (1, 2 or 5 times a power of ten metres) near a quarter of the picture.
@@ -65,16 +75,21 @@ std::string RenderTrackPlotSvg(BLOG_ITEM_INFO& trip, const TrackPlotOptions& opt
   int count = static_cast<int>(all.size());
   CGPSHelper helper;
   helper.MappingToXY(all.data(), count, screen.data(), size, options.margin, nullptr, &scale);
-  if (all.empty()) size = options.size;
-
+  // The square is cut to what the tracks use: a track coarsened to fit keeps `size` for its
+  // extent alone, with the margins on top, and a wide track leaves the bottom of it empty.
+  long used = 0, height = all.empty() ? options.size : 0;
+  for (const CPoint& p : screen) {
+    used = std::max(used, p.x + options.margin + 1);
+    height = std::max(height, p.y + options.margin + 1);
+  }
   const long keyHeight = 60;
-  const long width = std::max(size, 640L);  // room for the key under a small track
+  const long width = std::max(used, 640L);  // room for the key under a small track
   std::string svg;
   svg += FormatA(
       "<?xml version=\"1.0\" encoding=\"UTF-8\"?>\n"
       "<svg xmlns=\"http://www.w3.org/2000/svg\" width=\"%ld\" height=\"%ld\" "
       "viewBox=\"0 0 %ld %ld\">\n<rect width=\"100%%\" height=\"100%%\" fill=\"#ffffff\"/>\n",
-      width, size + keyHeight, width, size + keyHeight);
+      width, height + keyHeight, width, height + keyHeight);
   int begin = 0;
   for (int end : trackEnds) {
     if (end - begin >= 2) {
@@ -90,14 +105,14 @@ std::string RenderTrackPlotSvg(BLOG_ITEM_INFO& trip, const TrackPlotOptions& opt
   std::stable_sort(order.begin(), order.end(), [&](int a, int b) { return levels[a] < levels[b]; });
   for (int i : order) {
     svg += FormatA("<circle cx=\"%ld\" cy=\"%ld\" r=\"", screen[i].x, screen[i].y);
-    AppendFixed(svg, options.radius, 1);
+    AppendFixed(svg, RadiusOf(levels[i], options.radius), 1);
     svg += "\" fill=\"" + ColourOf(levels[i]) + "\"/>\n";
   }
 
   // Scale bar: `scale` metres per pixel.
-  const double barMetres = ScaleBarMetres(static_cast<double>(size) * scale);
+  const double barMetres = ScaleBarMetres(static_cast<double>(std::max(used, height)) * scale);
   const long barPixels = std::max(1L, std::lround(barMetres / scale));
-  const long y = size + 20;
+  const long y = height + 20;
   svg += FormatA(
       "<g font-family=\"sans-serif\" font-size=\"11\">\n"
       "<line x1=\"10\" y1=\"%ld\" x2=\"%ld\" y2=\"%ld\" stroke=\"#000000\" stroke-width=\"3\"/>\n"
@@ -107,13 +122,14 @@ std::string RenderTrackPlotSvg(BLOG_ITEM_INFO& trip, const TrackPlotOptions& opt
     int level;
     const char* text;
   };
-  const KeyEntry key[] = {{kLevelBadFix, "bad fix"}, {kLevelStop, "stop"}, {0, "level 0"},
-                          {50, "level 50"},          {100, "level 100"}, {kLevelNeverDropped, "essential"}};
-  long x = std::max(140L, 20 + barPixels);
+  const KeyEntry key[] = {{kLevelBadFix, "bad fix (-2)"}, {kLevelStop, "stop (-1)"},
+                          {0, "level 0"},                 {50, "50"},
+                          {100, "100"},                   {kLevelNeverDropped, "never dropped"}};
+  long x = std::max(100L, 30 + barPixels);
   for (const KeyEntry& e : key) {
     svg += FormatA("<circle cx=\"%ld\" cy=\"%ld\" r=\"4\" fill=\"%s\"/><text x=\"%ld\" y=\"%ld\">%s</text>\n",
                    x, y - 4, ColourOf(e.level).c_str(), x + 7, y, e.text);
-    x += 80;
+    x += 20 + 7 * static_cast<long>(std::strlen(e.text));
   }
   svg += "</g>\n</svg>\n";
   return svg;

@@ -8,15 +8,19 @@ sWayPoint* CreateWayPointArray(const CPtrList& points) {
   sWayPoint* array = new sWayPoint[static_cast<size_t>(count)];
   int k = 0;
   for (const WAYPOINT_ITEM_INFO* p : navmisc::Items<const WAYPOINT_ITEM_INFO>(points)) {
-    if (!p) continue;
-    sWayPoint& w = array[k++];
-    w.latitude = p->latitude;
-    w.longitude = p->longitude;
-    w.altitude = p->altitude;
-    w.speed = p->speed;
-    w.time = p->time;
-    w.extraA = p->extraA;
-    w.valid = 1;
+    if (p) array[k++] = ToWayPoint(*p);
   }
   return array;
+}
+
+sWayPoint ToWayPoint(const WAYPOINT_ITEM_INFO& p) {
+  sWayPoint w;
+  w.latitude = p.latitude;
+  w.longitude = p.longitude;
+  w.altitude = p.altitude;
+  w.speed = p.speed;
+  w.time = p.time;
+  w.extraA = p.extraA;
+  w.valid = 1;
+  return w;
 }

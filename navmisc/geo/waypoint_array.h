@@ -24,6 +24,12 @@ struct sWayPoint {
 
 static_assert(sizeof(sWayPoint) == 8 * 3 + 4 + 4 + 1 + 4, "sWayPoint must stay packed");
 
+class WAYPOINT_ITEM_INFO;
+
+// The working record of one point: its position, altitude, speed, time and extra value A, with
+// `valid` set.
+sWayPoint ToWayPoint(const WAYPOINT_ITEM_INFO& point);
+
 // Builds the working array of `points` (WAYPOINT_ITEM_INFO*, in list order): exactly
 // points.GetCount() records, one per non-null entry in order with `valid` set; null entries are
 // skipped, so the array ends with that many default records (valid 0). Returns null for an empty

@@ -69,4 +69,7 @@ int CmdProfile(Args& args);
 int CmdTemplates(Args& args);
 int CmdTimeZone(Args& args);
 
+// The demo's geometry step (demo_geo.cpp): optimises the sample trips, writes a plot.
+void DemoGeometry();
+
 }  // namespace navmisc::cli

@@ -87,6 +87,9 @@ int main(int argc, char** argv) {
       {"profile", navmisc::cli::CmdProfile},
       {"templates", navmisc::cli::CmdTemplates},
       {"timezone", navmisc::cli::CmdTimeZone},
+      {"optimize", navmisc::cli::CmdOptimize},
+      {"plot", navmisc::cli::CmdPlot},
+      {"place", navmisc::cli::CmdPlace},
   };
   auto it = commands.find(command);
   if (it == commands.end()) {

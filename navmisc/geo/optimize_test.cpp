@@ -1,0 +1,248 @@
+#include "navmisc/geo/optimize.h"
+
+#include <gtest/gtest.h>
+
+#include <memory>
+#include <string>
+#include <utility>
+#include <vector>
+
+#include "geo_reference.h"
+#include "navmisc/platform/files.h"
+#include "navmisc/records/trip.h"
+#include "testutil.h"
+
+namespace {
+
+using navmisc::testing::ProductScope;
+using navmisc::testing::OptimizeTripLiterally;
+constexpr int kKept = WAYPOINT_ITEM_INFO::kFlagKept;
+
+struct TrackSpec {
+  uint32_t seed;
+  int points;
+};
+
+std::unique_ptr<BLOG_ITEM_INFO> MakeTrip(const std::vector<TrackSpec>& specs,
+                                         const wchar_t* folder = L"OPT") {
+  auto trip = std::make_unique<BLOG_ITEM_INFO>(GPS_APP_TRIP, folder, 0);
+  for (const TrackSpec& s : specs) {
+    auto* track = new TRACK_ITEM_INFO(trip.get());
+    navmisc::testing::AppendNoisyTrack(track->points, s.seed, s.points);
+    trip->tracks.AddTail(track);
+  }
+  return trip;
+}
+
+std::vector<WAYPOINT_ITEM_INFO*> PointsOf(TRACK_ITEM_INFO* track) {
+  std::vector<WAYPOINT_ITEM_INFO*> out;
+  for (void* v : track->points) out.push_back(static_cast<WAYPOINT_ITEM_INFO*>(v));
+  return out;
+}
+
+std::vector<TRACK_ITEM_INFO*> TracksOf(const CPtrList& tracks) {
+  std::vector<TRACK_ITEM_INFO*> out;
+  for (void* v : tracks) out.push_back(static_cast<TRACK_ITEM_INFO*>(v));
+  return out;
+}
+
+void ExpectSameLevels(BLOG_ITEM_INFO& a, BLOG_ITEM_INFO& b, const std::string& what) {
+  EXPECT_EQ(a.optLevel, b.optLevel) << what;
+  const auto ta = TracksOf(a.tracks), tb = TracksOf(b.tracks);
+  ASSERT_EQ(ta.size(), tb.size()) << what;
+  for (size_t t = 0; t < ta.size(); ++t) {
+    const auto pa = PointsOf(ta[t]), pb = PointsOf(tb[t]);
+    ASSERT_EQ(pa.size(), pb.size()) << what;
+    for (size_t i = 0; i < pa.size(); ++i) {
+      ASSERT_EQ(pa[i]->type, pb[i]->type) << what << ", track " << t << ", point " << i;
+      ASSERT_EQ(pa[i]->flags[kKept], pb[i]->flags[kKept]) << what << ", track " << t << ", point " << i;
+      ASSERT_EQ(pa[i]->time, pb[i]->time) << what;
+    }
+  }
+}
+
+// The one-pass levels against a separate Smooth run for every level.
+TEST(OptimizeWaypoint, LevelsEqualTheLiteralMethod) {
+  const struct {
+    std::vector<TrackSpec> tracks;
+    GPS_APP_PROG_TYPE product;
+  } cases[] = {
+      {{{1, 3000}}, GPS_APP_TRIP},
+      {{{2, 1500}, {3, 400}, {4, 120}}, GPS_APP_TRIP},
+      {{{5, 2500}, {6, 1200}}, GPS_APP_SPORT},
+      {{{7, 60}, {8, 101}, {9, 102}, {10, 1}}, GPS_APP_TRACKER},  // a lone fix gets a twin
+      {{{11, 5000}}, GPS_APP_TRACKER},
+  };
+  for (const auto& c : cases) {
+    ProductScope product(c.product);
+    auto fast = MakeTrip(c.tracks), literal = MakeTrip(c.tracks);
+    int fastProgress = 0, literalProgress = 0;
+    bool keepGoing = true;
+    fast->OptimizeWaypoint(c.product, 1, &fastProgress, &keepGoing);
+    OptimizeTripLiterally(*literal, c.product, 1, &literalProgress, &keepGoing);
+    const std::string what = "seed " + std::to_string(c.tracks[0].seed);
+    ExpectSameLevels(*fast, *literal, what);
+    EXPECT_EQ(fastProgress, literalProgress) << what;
+    EXPECT_EQ(fastProgress, static_cast<int>(c.tracks.size()) * 10300) << what;
+  }
+}
+
+TEST(OptimizeWaypoint, ShortTracksAreNotRevisedOrSmoothed) {
+  const struct {
+    int points;
+    bool revised, smoothed;
+  } cases[] = {{50, false, false}, {51, true, false}, {101, true, false}, {102, true, true}};
+  for (const auto& c : cases) {
+    auto trip = std::make_unique<BLOG_ITEM_INFO>(GPS_APP_TRIP, L"OPT", 0);
+    auto* track = new TRACK_ITEM_INFO(trip.get());
+    trip->tracks.AddTail(track);
+    // A straight walk with one wild fix; without it 101 fixes would still be reduced.
+    for (int i = 0; i < c.points; ++i) {
+      auto* p = new WAYPOINT_ITEM_INFO(nullptr);
+      p->time = 1000 + 5 * i;
+      p->latitude = navmisc::testing::MetresNorth(i == 5 ? 3000 : 0);
+      p->longitude = navmisc::testing::MetresEast(50.0 * i);
+      p->speed = 36000;
+      track->points.AddTail(p);
+    }
+    trip->OptimizeWaypoint(GPS_APP_TRIP, 1, nullptr, nullptr);
+    int essential = 0, badFixes = 0;
+    for (auto* p : PointsOf(track)) {
+      essential += p->type == navmisc::kLevelNeverDropped;
+      badFixes += p->type == navmisc::kLevelBadFix;
+    }
+    EXPECT_EQ(badFixes, c.revised ? 1 : 0) << c.points;
+    // Smoothing hands every remaining point a level of 100 or below.
+    EXPECT_EQ(essential, c.smoothed ? 0 : c.points - badFixes) << c.points;
+  }
+}
+
+TEST(OptimizeWaypoint, OffKeepsTheLevelsAndRecomputesTheDisplayLevel) {
+  const struct {
+    int points, level;
+    GPS_APP_PROG_TYPE product;
+    int32_t displayLevel;
+  } cases[] = {
+      {1200, 50, GPS_APP_TRIP, 51},  // 1200 points at 50: fewer than 1000 only above 50
+      {1200, 50, GPS_APP_SPORT, 0},  // the other applications allow 11000
+      {900, 50, GPS_APP_TRIP, 0},
+      {1200, navmisc::kLevelStop, GPS_APP_TRIP, 0},
+      {1200, navmisc::kLevelNeverDropped, GPS_APP_TRIP, 101},
+  };
+  for (const auto& c : cases) {
+    auto trip = MakeTrip({{3, c.points}});
+    trip->optLevel = 77;
+    for (auto* p : PointsOf(static_cast<TRACK_ITEM_INFO*>(trip->tracks.GetHead()))) p->type = c.level;
+    int progress = 0;
+    trip->OptimizeWaypoint(c.product, 0, &progress, nullptr);
+    EXPECT_EQ(trip->optLevel, c.displayLevel) << c.points << " at " << c.level;
+    EXPECT_EQ(progress, 10300);
+    for (auto* p : PointsOf(static_cast<TRACK_ITEM_INFO*>(trip->tracks.GetHead()))) {
+      ASSERT_EQ(p->type, c.level);
+    }
+  }
+}
+
+TEST(OptimizeWaypoint, CancelDuringSmoothingStopsAtOnce) {
+  const std::vector<TrackSpec> specs = {{21, 2000}, {22, 500}, {23, 300}};
+  auto trip = MakeTrip(specs), literal = MakeTrip(specs);
+  for (BLOG_ITEM_INFO* t : {trip.get(), literal.get()}) {
+    t->optLevel = 42;
+    for (TRACK_ITEM_INFO* track : TracksOf(t->tracks)) {
+      for (auto* p : PointsOf(track)) p->type = 7;
+    }
+  }
+  int progress = 0, literalProgress = 0;
+  bool keepGoing = false;  // cleared before the work starts: it stops after the first step
+  trip->OptimizeWaypoint(GPS_APP_TRIP, 1, &progress, &keepGoing);
+  OptimizeTripLiterally(*literal, GPS_APP_TRIP, 1, &literalProgress, &keepGoing);
+  EXPECT_EQ(progress, 300);
+  EXPECT_EQ(literalProgress, 300);
+  EXPECT_EQ(trip->optLevel, 0);
+  ExpectSameLevels(*trip, *literal, "cancelled");
+  const auto tracks = TracksOf(trip->tracks);
+  int coarse = 0, open = 0;
+  for (auto* p : PointsOf(tracks[0])) {
+    coarse += p->type == 100;
+    open += p->type == navmisc::kLevelNeverDropped;
+  }
+  EXPECT_GT(coarse, 1);
+  EXPECT_GT(open, coarse);  // the finer levels were never handed out
+  for (TRACK_ITEM_INFO* later : {tracks[1], tracks[2]}) {
+    for (auto* p : PointsOf(later)) ASSERT_EQ(p->type, 7);
+  }
+}
+
+// Thinned tracks share the point records of the real ones. Under AddressSanitizer every misuse
+// below would show as a double free, a use after free or a leak.
+TEST(OptimizeTrack, ThinnedTracksShareButNeverFreePoints) {
+  navmisc::testutil::TempDir root;
+  navmisc::testutil::DataRootScope scope(root.path());
+  auto trip = MakeTrip({{31, 1500}, {32, 800}}, L"THIN");
+  ASSERT_TRUE(MakeDir(trip->GetResourcePath()));
+  trip->OptimizeWaypoint(GPS_APP_TRIP, 1, nullptr, nullptr);
+  trip->optRevise = true;
+  trip->optRedundance = false;  // stops stay in
+  trip->optLevel = 20;
+  const std::vector<TRACK_ITEM_INFO*> real = TracksOf(trip->tracks);
+
+  CPtrList old;
+  CreateOptimizeTrack(trip.get(), old);
+  EXPECT_EQ(TracksOf(old), real);
+  const std::vector<TRACK_ITEM_INFO*> thin = TracksOf(trip->tracks);
+  ASSERT_EQ(thin.size(), 2u);
+  for (size_t t = 0; t < thin.size(); ++t) {
+    EXPECT_FALSE(thin[t]->OwnsPoints());
+    EXPECT_EQ(thin[t]->id, real[t]->id);
+    std::vector<WAYPOINT_ITEM_INFO*> expected;
+    for (auto* p : PointsOf(real[t])) {
+      if (p->type == navmisc::kLevelStop || (p->type != navmisc::kLevelBadFix && p->type >= 20)) {
+        expected.push_back(p);
+      }
+    }
+    EXPECT_EQ(PointsOf(thin[t]), expected);
+    EXPECT_LT(expected.size(), static_cast<size_t>(real[t]->points.GetCount()));
+  }
+
+  // Thinning again, saving, reloading and optimising while thinned leave the shared points be.
+  CreateOptimizeTrack(trip.get(), old);
+  EXPECT_EQ(TracksOf(trip->tracks), thin);
+  EXPECT_EQ(old.GetCount(), 2);
+  trip->WriteAllWaypoint(1, nullptr, nullptr);
+  EXPECT_FALSE(FileExists(thin[0]->GetFilePathName()));
+  trip->ReadAllWaypoint(1);
+  trip->OptimizeWaypoint(GPS_APP_TRIP, 1, nullptr, nullptr);
+  EXPECT_EQ(TracksOf(trip->tracks), thin);
+
+  // A track made while thinned goes with the thinned ones; a real track put into the thinned
+  // trip comes back once.
+  auto* made = new TRACK_ITEM_INFO(trip.get());
+  made->points.AddTail(new WAYPOINT_ITEM_INFO(nullptr));
+  trip->tracks.AddTail(made);
+  trip->tracks.AddTail(real[1]);
+  CPtrList none;
+  RestoreOldTrack(trip.get(), none);
+  EXPECT_EQ(trip->tracks.GetCount(), 4);  // nothing to restore from
+  RestoreOldTrack(trip.get(), old);
+  old.RemoveAll();
+  EXPECT_EQ(TracksOf(trip->tracks), real);
+
+  // Saved and read back whole, with the levels.
+  trip->WriteAllWaypoint(1, nullptr, nullptr);
+  trip->WriteInfo(1, nullptr, nullptr);
+  BLOG_ITEM_INFO back(GPS_APP_TRIP, L"THIN", 0);
+  ASSERT_EQ(back.ReadInfo(), 1);
+  back.ReadAllWaypoint(1);
+  const auto backTracks = TracksOf(back.tracks);
+  ASSERT_EQ(backTracks.size(), 2u);
+  const auto saved = PointsOf(backTracks[0]), kept = PointsOf(real[0]);
+  ASSERT_EQ(saved.size(), kept.size());
+  for (size_t i = 0; i < saved.size(); ++i) ASSERT_EQ(saved[i]->type, kept[i]->type);
+
+  // A thinned trip freed without its restore: the real tracks still own every point.
+  CreateOptimizeTrack(trip.get(), old);
+  trip.reset();
+  navmisc::DeleteAll<TRACK_ITEM_INFO>(old);
+}
+
+}  // namespace

@@ -1,0 +1,160 @@
+// navmisc optimize, plot and place, run as a user runs them.
+#include <gtest/gtest.h>
+#include <sys/wait.h>
+
+#include <cstdio>
+#include <cstdlib>
+#include <string>
+
+#include "geo_reference.h"
+#include "navmisc/platform/files.h"
+#include "navmisc/platform/format.h"
+#include "navmisc/records/trip.h"
+#include "testutil.h"
+
+namespace {
+
+struct Result {
+  int code;
+  std::string output;  // standard output and error
+};
+
+Result RunTool(const std::string& args) {
+  const std::string command = std::string(NAVMISC_TOOL_PATH) + " " + args + " 2>&1";
+  FILE* pipe = popen(command.c_str(), "r");
+  Result r{-1, {}};
+  if (!pipe) return r;
+  char buf[4096];
+  for (size_t n; (n = std::fread(buf, 1, sizeof buf, pipe)) > 0;) r.output.append(buf, n);
+  const int status = pclose(pipe);
+  r.code = WIFEXITED(status) ? WEXITSTATUS(status) : -1;
+  return r;
+}
+
+std::vector<WAYPOINT_ITEM_INFO*> AllPoints(BLOG_ITEM_INFO& trip) {
+  std::vector<WAYPOINT_ITEM_INFO*> out;
+  for (void* t : trip.tracks) {
+    for (void* p : static_cast<TRACK_ITEM_INFO*>(t)->points) out.push_back(static_cast<WAYPOINT_ITEM_INFO*>(p));
+  }
+  return out;
+}
+
+// A command line, the exit code it must end with and a text its output must hold.
+struct Expectation {
+  std::string args;
+  int code;
+  std::string shows;
+};
+
+class GeoCommands : public ::testing::Test {
+ protected:
+  void SetUp() override {
+    BLOG_ITEM_INFO trip(GPS_APP_TRIP, L"GEOTRIP", 0);
+    ASSERT_TRUE(MakeDir(trip.GetResourcePath()));
+    trip.name = L"Noisy";
+    for (uint32_t seed : {41u, 42u}) {
+      auto* track = new TRACK_ITEM_INFO(&trip);
+      navmisc::testing::AppendNoisyTrack(track->points, seed, 1500);
+      trip.tracks.AddTail(track);
+    }
+    trip.WriteAllWaypoint(1, nullptr, nullptr);
+    trip.WriteInfo(1, nullptr, nullptr);
+  }
+
+  // The trip as the files hold it now.
+  std::unique_ptr<BLOG_ITEM_INFO> Load() {
+    auto trip = std::make_unique<BLOG_ITEM_INFO>(GPS_APP_TRIP, L"GEOTRIP", 0);
+    EXPECT_EQ(trip->ReadInfo(), 1);
+    trip->ReadAllWaypoint(1);
+    return trip;
+  }
+
+  std::string Tool(const std::string& args) { return "--data-root " + root.path().ToUtf8() + " " + args; }
+
+  void Check(const std::vector<Expectation>& cases, const std::string& prefix = "") {
+    for (const Expectation& c : cases) {
+      const Result r = RunTool(Tool(prefix + c.args));
+      EXPECT_EQ(r.code, c.code) << c.args << "\n" << r.output;
+      EXPECT_NE(r.output.find(c.shows), std::string::npos) << c.args << "\n" << r.output;
+    }
+  }
+
+  navmisc::testutil::TempDir root;
+  navmisc::testutil::DataRootScope scope{root.path()};
+};
+
+TEST_F(GeoCommands, OptimizeStoresTheLibrarysLevels) {
+  auto expected = Load();
+  expected->OptimizeWaypoint(GPS_APP_TRIP, 1, nullptr, nullptr);
+  const Result r = RunTool(Tool("optimize GEOTRIP"));
+  ASSERT_EQ(r.code, 0) << r.output;
+  EXPECT_NE(r.output.find("display level " + std::to_string(expected->optLevel)), std::string::npos) << r.output;
+  auto saved = Load();
+  EXPECT_EQ(saved->optLevel, expected->optLevel);
+  EXPECT_TRUE(saved->optOptimize);
+  const auto a = AllPoints(*saved), b = AllPoints(*expected);
+  ASSERT_EQ(a.size(), b.size());
+  int stops = 0;
+  for (size_t i = 0; i < a.size(); ++i) {
+    ASSERT_EQ(a[i]->type, b[i]->type) << i;
+    stops += a[i]->type == -1;
+  }
+  EXPECT_GT(stops, 0);
+
+  // --off keeps the levels and chooses the display level again.
+  const Result off = RunTool(Tool("optimize GEOTRIP --off"));
+  ASSERT_EQ(off.code, 0) << off.output;
+  auto reloaded = Load();
+  const auto again = AllPoints(*reloaded);
+  for (size_t i = 0; i < a.size(); ++i) ASSERT_EQ(again[i]->type, a[i]->type) << i;
+}
+
+TEST_F(GeoCommands, PlotWritesAValidDrawingOfEveryPoint) {
+  ASSERT_EQ(RunTool(Tool("optimize GEOTRIP")).code, 0);
+  const std::string svg = (root / L"trip.svg").ToUtf8();
+  const Result r = RunTool(Tool("plot GEOTRIP --size 500 -o " + svg));
+  ASSERT_EQ(r.code, 0) << r.output;
+  const std::string text = navmisc::testutil::ReadFileBytes(CString::FromUtf8(svg));
+  ASSERT_EQ(text.rfind("<?xml", 0), 0u);
+  size_t dots = 0;
+  for (size_t at = 0; (at = text.find("<circle cx", at)) != std::string::npos; ++at) ++dots;
+  EXPECT_EQ(dots, 3000u + 6u);  // every point, and the six dots of the key
+  for (const char* key : {"bad fix (-2)", "stop (-1)", "level 0", "never dropped", "#d62728", "#ff7f0e"}) {
+    EXPECT_NE(text.find(key), std::string::npos) << key;
+  }
+  if (std::system("command -v xmllint >/dev/null 2>&1") == 0) {
+    EXPECT_EQ(std::system(("xmllint --noout " + svg).c_str()), 0);
+  }
+}
+
+TEST_F(GeoCommands, PlaceAnswersByTimeOrPosition) {
+  auto trip = Load();
+  const WAYPOINT_ITEM_INFO* fix = AllPoints(*trip)[700];
+  const std::string lat = navmisc::FormatA("%.6f", fix->latitude);
+  const std::string lon = navmisc::FormatA("%.6f", fix->longitude);
+  Check({
+      {"--time " + std::to_string(fix->time), 0, "latitude   " + lat},
+      {"--lat " + lat + " --lon " + lon + " --tolerance 5", 0, "placed by position"},
+      {"--lat 10 --lon 10", 1, "no track of the trip passed within 50 m"},
+      {"--time 100", 1, "the trip has no track at 1970-01-01T00:01:40Z"},
+      {"", 2, "place needs --time or --lat and --lon"},
+      {"--lat 10", 2, "--lat and --lon go together"},
+      {"--lat 0 --lon 0", 2, "0/0 stands for no position"},
+      {"--time yesterday", 2, "is not a time"},
+  }, "place GEOTRIP ");
+}
+
+TEST_F(GeoCommands, ClearErrors) {
+  Check({
+      {"optimize NOPE", 1, "no trip 'NOPE'"},
+      {"optimize", 2, "optimize takes one trip id"},
+      {"plot GEOTRIP", 2, "plot needs -o FILE.svg"},
+      {"plot GEOTRIP -o /no/such/folder/x.svg", 1, "the folder /no/such/folder does not exist"},
+      {"plot GEOTRIP -o x.svg --size 3", 2, "--size must be a whole number"},
+      {"optimize --help", 0, "Usage: navmisc optimize TRIP"},
+      {"plot --help", 0, "Usage: navmisc plot TRIP"},
+      {"place --help", 0, "Usage: navmisc place TRIP"},
+  });
+}
+
+}  // namespace
