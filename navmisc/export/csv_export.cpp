@@ -37,12 +37,6 @@ void AppendTwo(std::string& out, int v) {
   AppendInt(out, v);
 }
 
-CString SplitFileName(const CString& path, int number) {
-  const CString name = FormatString(L"%s_%d.csv", PathFileTitle(path).c_str(), number);
-  const CString folder = PathFolder(path);
-  return folder.IsEmpty() ? name : PathJoin(folder, name);
-}
-
 // The trip's point filter: which points it treats as exceptions rather than essential.
 struct PointFilter {
   explicit PointFilter(const BLOG_ITEM_INFO* trip)
@@ -144,6 +138,10 @@ class CsvWriter {
 
 }  // namespace
 
+CString CsvSplitFileName(const wchar_t* path, int number) {
+  return PathJoin(PathFolder(path), FormatString(L"%s_%d.csv", PathFileTitle(path).c_str(), number));
+}
+
 int ExportCsv(CString path, CPtrList& tracks, CPtrList& photos, BLOG_ITEM_INFO* trip, bool metric) {
   return ExportCsv(path, tracks, photos, trip, metric, nullptr, nullptr);
 }
@@ -160,7 +158,7 @@ int ExportCsv(CString path, CPtrList& tracks, CPtrList& photos, BLOG_ITEM_INFO* 
 
   Progress progress{counter, keepGoing};
   CsvWriter csv(photos, trip, metric);
-  if (!csv.Open(split ? SplitFileName(path, number) : path, kFirstHeader)) return 0;
+  if (!csv.Open(split ? CsvSplitFileName(path, number) : path, kFirstHeader)) return 0;
   int lines = 0;
   for (const TRACK_ITEM_INFO* track : navmisc::Items<TRACK_ITEM_INFO>(tracks)) {
     if (!track) continue;
@@ -178,7 +176,7 @@ int ExportCsv(CString path, CPtrList& tracks, CPtrList& photos, BLOG_ITEM_INFO* 
       if (++lines == kPointsPerFile) {
         csv.Close();
         ++number;
-        if (!csv.Open(SplitFileName(path, number), kContinuationHeader)) return 0;
+        if (!csv.Open(CsvSplitFileName(path, number), kContinuationHeader)) return 0;
         lines = 0;
       }
       if (!progress.Step()) {

@@ -29,6 +29,10 @@ class BLOG_ITEM_INFO;
 // Returns 1 when written, 0 when a file cannot be opened.
 int ExportCsv(CString path, CPtrList& tracks, CPtrList& photos, BLOG_ITEM_INFO* trip, bool metric);
 
+// The name of numbered file `number` (from 1) of a split export to `path`:
+// "<folder>/<title>_<number>.csv".
+CString CsvSplitFileName(const wchar_t* path, int number);
+
 // The same with progress: `*counter` (may be null) goes up by one per track point. When
 // `*keepGoing` (may be null) turns false the export stops, deletes the files it wrote and
 // returns 0.
