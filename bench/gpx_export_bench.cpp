@@ -6,9 +6,12 @@
 // root DIR and prints its id, for bench/export_vs_gpsbabel.sh.
 #include <benchmark/benchmark.h>
 
+#include <cmath>
 #include <cstdio>
 #include <cstring>
 #include <ctime>
+#include <fstream>
+#include <iterator>
 #include <map>
 #include <memory>
 #include <random>
@@ -26,24 +29,24 @@ namespace {
 constexpr int kPoints = 1000000;
 constexpr int kPhotos = 100;
 
-// A walk of one point a second from 2023-11-14 22:13:20 UTC, so that it crosses days.
+// Laps of a 3 km loop, one point a second from 2023-11-14 22:13:20 UTC (so that the times
+// cross days), with a few metres of noise on every fix as a logger records it.
 void AddTrack(BLOG_ITEM_INFO& trip) {
   auto* track = new TRACK_ITEM_INFO(&trip);
   track->description = L"Bench walk \u00fcber Land";
   trip.tracks.AddTail(track);
-  std::mt19937_64 rng(7);
-  std::normal_distribution<double> step(0.0, 0.00002);
-  double lat = 25.0, lon = 121.5, alt = 100;
+  std::minstd_rand noise(11);
+  auto jitter = [&noise](double metres) { return (static_cast<double>(noise() % 2001) - 1000.0) / 1000.0 * metres; };
+  constexpr double kDegreesPerMetre = 1.0 / 111195.0;
+  constexpr double kRadius = 3000.0 / (2 * 3.141592653589793);  // metres
   for (int i = 0; i < kPoints; ++i) {
+    const double angle = i * 1.4 / kRadius;  // 1.4 m/s
     auto* p = new WAYPOINT_ITEM_INFO(nullptr);
-    lat += step(rng);
-    lon += step(rng);
-    alt += step(rng) * 1000;
     p->time = 1700000000 + i;
-    p->latitude = lat;
-    p->longitude = lon;
-    p->altitude = alt;
-    p->speed = static_cast<int32_t>(rng() % 50000);
+    p->latitude = 47.37 + (kRadius * std::sin(angle) + jitter(4)) * kDegreesPerMetre;
+    p->longitude = 8.54 + (kRadius * std::cos(angle) + jitter(4)) * kDegreesPerMetre / 0.6769;
+    p->altitude = 410 + 15 * std::sin(angle * 3) + jitter(2);
+    p->speed = static_cast<int32_t>(5040 + jitter(1500));
     track->points.AddTail(p);
   }
 }
@@ -131,14 +134,8 @@ void StdioGpx(BLOG_ITEM_INFO& trip, const std::string& path) {
 }
 
 std::string Slurp(const std::string& path) {
-  std::string out;
-  FILE* f = std::fopen(path.c_str(), "rb");
-  if (!f) return out;
-  char buf[1 << 16];
-  size_t n;
-  while ((n = std::fread(buf, 1, sizeof buf, f)) > 0) out.append(buf, n);
-  std::fclose(f);
-  return out;
+  std::ifstream in(path, std::ios::binary);
+  return std::string(std::istreambuf_iterator<char>(in), std::istreambuf_iterator<char>());
 }
 
 void BM_ExportGpx(benchmark::State& state) {

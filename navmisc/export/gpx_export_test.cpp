@@ -3,6 +3,7 @@
 #include <gtest/gtest.h>
 
 #include "navmisc/export/detail/test_support.h"
+#include "navmisc/platform/output_file.h"
 #include "testutil.h"
 
 namespace {
@@ -97,14 +98,40 @@ TEST(ExportGpx, NumbersIgnoreACommaDecimalLocale) {
   EXPECT_EQ(ReadFileBytes(dir / L"de.gpx"), kFullDocument);
 }
 
-TEST(ExportGpx, UnwritableTargetReturnsZero) {
+TEST(ExportGpx, UnwritableTargetReturnsZeroAndSaysWhy) {
   TempDir dir;
   Fixture f;
   navmisc::testutil::WriteFileBytes(dir / L"file", "x");
-  EXPECT_EQ(ExportGpx(dir / L"missing/out.gpx", f.tracks, f.items), 0);
-  EXPECT_EQ(ExportGpx(dir / L"file/out.gpx", f.tracks, f.items), 0);
-  EXPECT_EQ(ExportGpx(dir.path(), f.tracks, f.items), 0);  // a folder
+  const struct {
+    CString target;
+    const char* why;
+  } cases[] = {{dir / L"missing/out.gpx", "No such file or directory"},
+               {dir / L"file/out.gpx", "Not a directory"},
+               {dir.path(), "Is a directory"},
+               {CString(), "No such file or directory"}};
+  for (const auto& c : cases) {
+    EXPECT_EQ(ExportGpx(c.target, f.tracks, f.items), 0) << c.target.ToUtf8();
+    EXPECT_EQ(navmisc::LastOpenError(), c.why) << c.target.ToUtf8();
+  }
   EXPECT_EQ(ReadFileBytes(dir / L"file"), "x");
+  ASSERT_EQ(ExportGpx(dir / L"ok.gpx", f.tracks, f.items), 1);
+  EXPECT_EQ(navmisc::LastOpenError(), "");
+}
+
+TEST(ExportGpx, CountsProgressAndAStoppedExportLeavesNothing) {
+  TempDir dir;
+  Fixture f;
+  int counter = 0;
+  bool keepGoing = true;
+  ASSERT_EQ(ExportGpx(dir / L"all.gpx", f.tracks, f.items, &counter, &keepGoing), 1);
+  EXPECT_EQ(ReadFileBytes(dir / L"all.gpx"), kFullDocument);
+  EXPECT_EQ(counter, 4 + 7);  // every entry of the item list and every track point
+
+  keepGoing = false;
+  counter = 0;
+  EXPECT_EQ(ExportGpx(dir / L"all.gpx", f.tracks, f.items, &counter, &keepGoing), 0);
+  EXPECT_EQ(counter, 1);
+  EXPECT_FALSE(FileExists(dir / L"all.gpx"));
 }
 
 TEST(ExportGpx, LongTitlesAreCutAtWholeCharacters) {
