@@ -4,7 +4,6 @@
 #include <vector>
 
 #include "navmisc/export/detail/export_common.h"
-#include "navmisc/export/detail/kml_common.h"
 #include "navmisc/platform/datetime.h"
 #include "navmisc/platform/files.h"
 #include "navmisc/platform/format.h"
@@ -16,8 +15,13 @@
 #include "navmisc/records/track.h"
 #include "navmisc/records/trip.h"
 
-namespace navmisc::exportdetail {
+namespace {
 
+using namespace navmisc::exportdetail;
+using navmisc::AppendFixed;
+using navmisc::AppendInt;
+
+// Escapes item texts: "&", "<", ">", the double quote, and a pair of apostrophes (one entity).
 std::wstring KmlEscape(std::wstring_view text) {
   CString s{std::wstring(text)};
   // "&" goes first so that the entities made by the later rules are not escaped again. A single
@@ -30,6 +34,8 @@ std::wstring KmlEscape(std::wstring_view text) {
   return s.str();
 }
 
+// The date-time text of a photo's placemark (UTC, no "Z"): its time on the track, else (when
+// that is -1) the camera's time less the trip's time shift, else (both -1) empty.
 std::string KmlPhotoTimeText(const PHOTO_ITEM_INFO& photo) {
   if (photo.playbackTime != -1) return StdTimeText(photo.playbackTime);
   if (photo.originalTime != -1) {
@@ -40,6 +46,12 @@ std::string KmlPhotoTimeText(const PHOTO_ITEM_INFO& photo) {
   return {};
 }
 
+// The size (pixels) at which a photo of `width` x `height` pixels is shown in its balloon: the
+// long side 320, the other in proportion; 320 x 240 when the size is unknown.
+struct KmlPictureSize {
+  int width;
+  int height;
+};
 KmlPictureSize KmlDisplaySize(int width, int height) {
   constexpr int kBox = 320;
   if (width <= 0 || height <= 0) return {kBox, kBox * 3 / 4};
@@ -48,14 +60,6 @@ KmlPictureSize KmlDisplaySize(int width, int height) {
   }
   return {static_cast<int>((static_cast<long long>(width) * kBox + height / 2) / height), kBox};
 }
-
-}  // namespace navmisc::exportdetail
-
-namespace {
-
-using namespace navmisc::exportdetail;
-using navmisc::AppendFixed;
-using navmisc::AppendInt;
 
 constexpr std::string_view kStyleUrl =
     "#default_copy0+nicon=http://maps.google.com/mapfiles/kml/pal4/icon15.png"

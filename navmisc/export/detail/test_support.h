@@ -1,15 +1,12 @@
 // Record builders and file helpers shared by the exporter tests.
 #pragma once
 
-#include <cerrno>
 #include <clocale>
 #include <cstdio>
-#include <cstdlib>
 #include <memory>
 #include <string>
+#include <tuple>
 #include <vector>
-
-#include <sys/stat.h>
 
 #include "navmisc/platform/files.h"
 #include "navmisc/platform/lists.h"
@@ -34,13 +31,8 @@ inline std::unique_ptr<TRACK_ITEM_INFO> MakeTrack(const wchar_t* name, const std
   track->description = name;
   for (const Pt& p : pts) {
     auto* w = new WAYPOINT_ITEM_INFO;
-    w->latitude = p.lat;
-    w->longitude = p.lon;
-    w->altitude = p.alt;
-    w->time = p.time;
-    w->speed = p.speed;
-    w->course = p.course;
-    w->type = p.type;
+    std::tie(w->latitude, w->longitude, w->altitude, w->time) = std::tie(p.lat, p.lon, p.alt, p.time);
+    std::tie(w->speed, w->course, w->type) = std::tie(p.speed, p.course, p.type);
     track->points.AddTail(w);
   }
   return track;
@@ -49,13 +41,8 @@ inline std::unique_ptr<TRACK_ITEM_INFO> MakeTrack(const wchar_t* name, const std
 inline std::unique_ptr<PHOTO_ITEM_INFO> MakeItem(int type, const wchar_t* title, const wchar_t* desc,
                                                  double lat, double lon, double alt, int32_t time) {
   auto item = std::make_unique<PHOTO_ITEM_INFO>();
-  item->dataType = type;
-  item->title = title;
-  item->description = desc;
-  item->latitude = lat;
-  item->longitude = lon;
-  item->altitude = alt;
-  item->playbackTime = time;
+  std::tie(item->dataType, item->title, item->description) = std::tie(type, title, desc);
+  std::tie(item->latitude, item->longitude, item->altitude, item->playbackTime) = std::tie(lat, lon, alt, time);
   return item;
 }
 

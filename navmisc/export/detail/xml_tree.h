@@ -35,8 +35,6 @@ class XmlNode {
   void RenderStart(std::wstring& out) const;
   void RenderEnd(std::wstring& out) const;
 
-  const std::wstring& name() const { return name_; }
-  const std::vector<std::pair<std::wstring, std::wstring>>& attributes() const { return attributes_; }
   const std::vector<std::unique_ptr<XmlNode>>& children() const { return children_; }
 
  private:
