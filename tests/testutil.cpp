@@ -1,6 +1,9 @@
 #include "testutil.h"
 
 #include <stdlib.h>
+#include <sys/wait.h>
+
+#include <cstdio>
 
 #include <fstream>
 #include <sstream>
@@ -39,5 +42,29 @@ DataRootScope::DataRootScope(const wchar_t* root) : previous_(g_szAppDataPath) {
 }
 
 DataRootScope::~DataRootScope() { SetSharedText(g_szAppDataPath, previous_); }
+
+CommandResult RunCommand(const std::string& command) {
+  CommandResult r;
+  std::FILE* pipe = ::popen(command.c_str(), "r");
+  if (!pipe) return r;
+  char buf[4096];
+  for (size_t n; (n = std::fread(buf, 1, sizeof buf, pipe)) > 0;) r.out.append(buf, n);
+  const int status = ::pclose(pipe);
+  r.status = WIFEXITED(status) ? WEXITSTATUS(status) : -1;
+  return r;
+}
+
+bool HaveProgram(const char* name) {
+  return RunCommand(std::string("command -v ") + name + " >/dev/null 2>&1").status == 0;
+}
+
+std::string ShellQuote(const std::string& s) {
+  std::string q = "'";
+  for (char c : s) {
+    if (c == '\'') q += "'\\''";
+    else q += c;
+  }
+  return q + "'";
+}
 
 }  // namespace navmisc::testutil

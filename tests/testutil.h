@@ -36,4 +36,16 @@ class DataRootScope {
   CString previous_;
 };
 
+// Runs a shell command: its exit status (-1 when it did not end normally) and what it wrote on
+// standard output.
+struct CommandResult {
+  int status = -1;
+  std::string out;
+};
+CommandResult RunCommand(const std::string& command);
+// True when `name` is a program on PATH.
+bool HaveProgram(const char* name);
+// `s` as one single-quoted shell word.
+std::string ShellQuote(const std::string& s);
+
 }  // namespace navmisc::testutil

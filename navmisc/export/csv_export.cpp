@@ -1,22 +1,23 @@
 #include "navmisc/export/csv_export.h"
 
 #include <unordered_set>
+#include <vector>
 
 #include "navmisc/export/detail/export_common.h"
 #include "navmisc/geo/gps_helper.h"
 #include "navmisc/platform/datetime.h"
 #include "navmisc/platform/files.h"
+#include "navmisc/platform/format.h"
 #include "navmisc/records/photo.h"
 #include "navmisc/records/track.h"
 #include "navmisc/records/trip.h"
 
 namespace {
 
-using navmisc::exportdetail::AppendFixed;
-using navmisc::exportdetail::AppendInt;
-using navmisc::exportdetail::BufferedWriter;
-using navmisc::exportdetail::OpenForWriting;
-using navmisc::exportdetail::UniqueFile;
+using navmisc::AppendFixed;
+using navmisc::AppendInt;
+using navmisc::exportdetail::DocumentWriter;
+using navmisc::exportdetail::Progress;
 
 // Spreadsheets of the time held 65536 rows: one header and 65534 points leave room to spare.
 constexpr int kPointsPerFile = 65534;
@@ -36,12 +37,6 @@ void AppendTwo(std::string& out, int v) {
   AppendInt(out, v);
 }
 
-CString SplitFileName(const CString& path, int number) {
-  CString name = FormatString(L"%s_%d.csv", PathFileTitle(path).c_str(), number);
-  CString folder = PathFolder(path);
-  return folder.IsEmpty() ? name : PathJoin(folder, name);
-}
-
 // The trip's point filter: which points it treats as exceptions rather than essential.
 struct PointFilter {
   explicit PointFilter(const BLOG_ITEM_INFO* trip)
@@ -49,6 +44,7 @@ struct PointFilter {
         revised(trip && trip->optRevise),
         redundant(trip && trip->optRedundance),
         level(trip ? trip->optLevel : 0) {}
+  // `type` is the point's optimisation mark (a level, -1 redundant, -2 revised).
   bool IsException(int32_t type) const {
     return enabled && ((type == -2 && revised) || (type == -1 && redundant) || type < level);
   }
@@ -60,28 +56,30 @@ class CsvWriter {
  public:
   CsvWriter(CPtrList& photos, const BLOG_ITEM_INFO* trip, bool metric)
       : filter_(trip), shift_(trip ? trip->timeZoneShift : 0), metric_(metric) {
+    // A photo time below 1 means the photo has none.
     for (const PHOTO_ITEM_INFO* photo : navmisc::Items<PHOTO_ITEM_INFO>(photos)) {
       if (photo && photo->playbackTime >= 1) photoTimes_.insert(photo->playbackTime);
     }
   }
 
   bool Open(const CString& path, std::string_view header) {
-    writer_.reset();
-    file_ = OpenForWriting(path);
-    if (!file_) return false;
-    writer_ = std::make_unique<BufferedWriter>(file_.get());
-    writer_->Append(header);
+    writer_.Close();
+    if (!writer_.Open(path)) return false;
+    written_.push_back(path);
+    writer_.text() += header;
     return true;
   }
-  void Close() {
-    writer_.reset();
-    file_.reset();
+  void Close() { writer_.Close(); }
+  // Deletes every file written so far.
+  void RemoveAll() {
+    writer_.Remove();
+    for (const CString& file : written_) DeleteFileRetry(file);
   }
 
   // `first` and `last` tell the point's place in its track's list; `prev` is the track's
   // previous written point, or null.
   void WriteLine(const WAYPOINT_ITEM_INFO& p, const WAYPOINT_ITEM_INFO* prev, bool first, bool last) {
-    std::string& out = writer_->text();
+    std::string& out = writer_.text();
     int year, month, day, hour, minute, second;
     GetDateTimeInfo(static_cast<long>(p.time) + shift_, year, month, day, hour, minute, second);
     AppendTwo(out, year);
@@ -118,13 +116,14 @@ class CsvWriter {
     if (photoTimes_.count(p.time)) --type;
     AppendInt(out, type);
     out += ", ";
-    double metres =
+    // GetGpsDistance reads the first latitude for both ends: the east-west distance, kept so.
+    const double metres =
         prev ? GetGpsDistance(prev->latitude, prev->longitude, p.latitude, p.longitude) * 1000.0 : 0.0;
     AppendFixed(out, metric_ ? metres : metres * kMilesPerKilometre, 2);
     out += ", ";
     if (!filter_.IsException(p.type)) out += '1';
     out += '\r';
-    writer_->MaybeFlush();
+    writer_.MaybeFlush();
   }
 
  private:
@@ -133,13 +132,22 @@ class CsvWriter {
   bool metric_;
   std::unordered_set<int32_t> photoTimes_;
   CGPSHelper helper_;
-  UniqueFile file_;
-  std::unique_ptr<BufferedWriter> writer_;
+  DocumentWriter writer_;
+  std::vector<CString> written_;
 };
 
 }  // namespace
 
+CString CsvSplitFileName(const wchar_t* path, int number) {
+  return PathJoin(PathFolder(path), FormatString(L"%s_%d.csv", PathFileTitle(path).c_str(), number));
+}
+
 int ExportCsv(CString path, CPtrList& tracks, CPtrList& photos, BLOG_ITEM_INFO* trip, bool metric) {
+  return ExportCsv(path, tracks, photos, trip, metric, nullptr, nullptr);
+}
+
+int ExportCsv(CString path, CPtrList& tracks, CPtrList& photos, BLOG_ITEM_INFO* trip, bool metric,
+              int* counter, bool* keepGoing) {
   ClearTargetFile(path);
   long long total = 0;
   for (const TRACK_ITEM_INFO* track : navmisc::Items<TRACK_ITEM_INFO>(tracks)) {
@@ -148,8 +156,9 @@ int ExportCsv(CString path, CPtrList& tracks, CPtrList& photos, BLOG_ITEM_INFO* 
   const bool split = total >= kPointsPerFile;
   int number = 1;
 
+  Progress progress{counter, keepGoing};
   CsvWriter csv(photos, trip, metric);
-  if (!csv.Open(split ? SplitFileName(path, number) : path, kFirstHeader)) return 0;
+  if (!csv.Open(split ? CsvSplitFileName(path, number) : path, kFirstHeader)) return 0;
   int lines = 0;
   for (const TRACK_ITEM_INFO* track : navmisc::Items<TRACK_ITEM_INFO>(tracks)) {
     if (!track) continue;
@@ -167,10 +176,12 @@ int ExportCsv(CString path, CPtrList& tracks, CPtrList& photos, BLOG_ITEM_INFO* 
       if (++lines == kPointsPerFile) {
         csv.Close();
         ++number;
-        CString next = SplitFileName(path, number);
-        ClearTargetFile(next);
-        if (!csv.Open(next, kContinuationHeader)) return 0;
+        if (!csv.Open(CsvSplitFileName(path, number), kContinuationHeader)) return 0;
         lines = 0;
+      }
+      if (!progress.Step()) {
+        csv.RemoveAll();
+        return 0;
       }
     }
   }

@@ -1,18 +1,19 @@
 #include "navmisc/export/gpx_export.h"
 
 #include "navmisc/export/detail/export_common.h"
-#include "navmisc/platform/files.h"
+#include "navmisc/platform/format.h"
 #include "navmisc/records/photo.h"
 #include "navmisc/records/track.h"
 
 namespace {
 
-using navmisc::exportdetail::AppendFixed;
-using navmisc::exportdetail::BufferedWriter;
+using navmisc::AppendFixed;
+using navmisc::exportdetail::DocumentWriter;
+using navmisc::exportdetail::Progress;
 using navmisc::exportdetail::TimeTextZWriter;
 using navmisc::exportdetail::Utf8Field;
 
-// The readers' fixed-size text buffers, terminator included.
+// Texts go through fixed buffers of this many bytes, terminator included.
 constexpr size_t kTextBuffer = 2048;
 // Stored speeds are metres per hour; GPX wants metres per second.
 constexpr double kMetresPerHourToMetresPerSecond = 0.0002777777777777778;
@@ -41,57 +42,69 @@ void WriteWaypoint(std::string& out, const PHOTO_ITEM_INFO& item, TimeTextZWrite
   out += "</desc>\r\n<sym>Waypoint</sym>\r\n</wpt>";
 }
 
-void WriteTrack(BufferedWriter& w, const TRACK_ITEM_INFO& track, TimeTextZWriter& times) {
+// False when the caller stopped the export.
+bool WriteTrack(DocumentWriter& w, const TRACK_ITEM_INFO& track, TimeTextZWriter& times,
+                Progress& progress) {
   std::string& out = w.text();
   out += "\r\n<trk>\r\n<name>";
   out += Utf8Field(track.GetName().view(), kTextBuffer);
   // The document's colour is the same for every track, whatever its colour in the trip.
   out += "</name>\r\n<desc>Color:004000ff</desc>\r\n<trkseg>";
   for (const WAYPOINT_ITEM_INFO* p : navmisc::Items<WAYPOINT_ITEM_INFO>(track.points)) {
-    if (!p || p->time == -1) continue;
-    out += "\r\n<trkpt lat=\"";
-    AppendFixed(out, p->latitude, 6);
-    out += "\" lon=\"";
-    AppendFixed(out, p->longitude, 6);
-    out += "\">\r\n<ele>";
-    AppendFixed(out, p->altitude, 6);
-    out += "</ele>\r\n<time>";
-    times.Append(out, p->time);
-    out += "</time>\r\n<speed>";
-    AppendFixed(out, p->speed * kMetresPerHourToMetresPerSecond, 2);
-    out += "</speed>\r\n</trkpt>";
-    w.MaybeFlush();
+    if (p && p->time != -1) {
+      out += "\r\n<trkpt lat=\"";
+      AppendFixed(out, p->latitude, 6);
+      out += "\" lon=\"";
+      AppendFixed(out, p->longitude, 6);
+      out += "\">\r\n<ele>";
+      AppendFixed(out, p->altitude, 6);
+      out += "</ele>\r\n<time>";
+      times.Append(out, p->time);
+      out += "</time>\r\n<speed>";
+      AppendFixed(out, p->speed * kMetresPerHourToMetresPerSecond, 2);
+      out += "</speed>\r\n</trkpt>";
+      w.MaybeFlush();
+    }
+    if (!progress.Step()) return false;
   }
   out += "\r\n</trkseg>\r\n</trk>";
+  return true;
 }
 
 }  // namespace
 
 int ExportGpx(CString path, CPtrList& tracks, CPtrList& items) {
-  ClearTargetFile(path);
-  navmisc::exportdetail::UniqueFile file = navmisc::exportdetail::OpenForWriting(path);
-  if (!file) return 0;
+  return ExportGpx(path, tracks, items, nullptr, nullptr);
+}
 
+int ExportGpx(CString path, CPtrList& tracks, CPtrList& items, int* counter, bool* keepGoing) {
+  DocumentWriter w;
+  if (!w.Open(path)) return 0;
+  Progress progress{counter, keepGoing};
   TimeTextZWriter times;
-  {
-    BufferedWriter w(file.get());
-    std::string& out = w.text();
-    out += "<?xml version=\"1.0\" encoding=\"UTF-8\" standalone=\"yes\" ?>\r\n<gpx creator=\"Corvane ";
-    out += navmisc::exportdetail::kMakerAddress;
-    out += "/1.1\" version=\"1.0\" xmlns=\"http://www.topografix.com/GPX/1/0\""
-           " xmlns:xsi=\"http://www.w3.org/2001/XMLSchema-instance\""
-           " xsi:schemaLocation=\"http://www.topografix.com/GPX/1/0"
-           " http://www.topografix.com/GPX/1/0/gpx.xsd\">";
-    // Waypoints always precede tracks, whichever list the caller filled first.
-    for (const PHOTO_ITEM_INFO* item : navmisc::Items<PHOTO_ITEM_INFO>(items)) {
-      if (!item) continue;
-      WriteWaypoint(out, *item, times);
-      w.MaybeFlush();
+  std::string& out = w.text();
+  out += "<?xml version=\"1.0\" encoding=\"UTF-8\" standalone=\"yes\" ?>\r\n<gpx creator=\"Corvane ";
+  out += navmisc::exportdetail::kMakerAddress;
+  out += "/1.1\" version=\"1.0\" xmlns=\"http://www.topografix.com/GPX/1/0\""
+         " xmlns:xsi=\"http://www.w3.org/2001/XMLSchema-instance\""
+         " xsi:schemaLocation=\"http://www.topografix.com/GPX/1/0"
+         " http://www.topografix.com/GPX/1/0/gpx.xsd\">";
+  // Waypoints always precede tracks, whichever list the caller filled first.
+  for (const PHOTO_ITEM_INFO* item : navmisc::Items<PHOTO_ITEM_INFO>(items)) {
+    if (item) WriteWaypoint(out, *item, times);
+    w.MaybeFlush();
+    if (!progress.Step()) {
+      w.Remove();
+      return 0;
     }
-    for (const TRACK_ITEM_INFO* track : navmisc::Items<TRACK_ITEM_INFO>(tracks)) {
-      if (track) WriteTrack(w, *track, times);
-    }
-    out += "\r\n</gpx>";
   }
+  for (const TRACK_ITEM_INFO* track : navmisc::Items<TRACK_ITEM_INFO>(tracks)) {
+    if (track && !WriteTrack(w, *track, times, progress)) {
+      w.Remove();
+      return 0;
+    }
+  }
+  out += "\r\n</gpx>";
+  w.Close();
   return 1;
 }

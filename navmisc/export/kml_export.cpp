@@ -1,24 +1,27 @@
 #include "navmisc/export/kml_export.h"
 
-#include <zip.h>
-
-#include <clocale>
-#include <cstdlib>
-#include <ctime>
-#include <cwchar>
 #include <string>
 #include <vector>
 
 #include "navmisc/export/detail/export_common.h"
-#include "navmisc/export/detail/kml_common.h"
+#include "navmisc/platform/datetime.h"
 #include "navmisc/platform/files.h"
+#include "navmisc/platform/format.h"
+#include "navmisc/platform/temp_folder.h"
 #include "navmisc/platform/textconv.h"
+#include "navmisc/platform/user_locale.h"
+#include "navmisc/platform/zip_archive.h"
 #include "navmisc/records/photo.h"
 #include "navmisc/records/track.h"
 #include "navmisc/records/trip.h"
 
-namespace navmisc::exportdetail {
+namespace {
 
+using namespace navmisc::exportdetail;
+using navmisc::AppendFixed;
+using navmisc::AppendInt;
+
+// Escapes item texts: "&", "<", ">", the double quote, and a pair of apostrophes (one entity).
 std::wstring KmlEscape(std::wstring_view text) {
   CString s{std::wstring(text)};
   // "&" goes first so that the entities made by the later rules are not escaped again. A single
@@ -31,24 +34,24 @@ std::wstring KmlEscape(std::wstring_view text) {
   return s.str();
 }
 
-std::string KmlDocumentName(std::time_t now) {
-  std::tm local{};
-  localtime_r(&now, &local);
-  // The user's own date and time conventions (LC_TIME from the environment), not the
-  // process's current locale.
-  locale_t loc = newlocale(LC_TIME_MASK, "", static_cast<locale_t>(0));
-  if (!loc) loc = newlocale(LC_TIME_MASK, "C", static_cast<locale_t>(0));
-  wchar_t buf[256];
-  size_t n = 0;
-  if (loc) {
-    locale_t previous = uselocale(loc);
-    n = std::wcsftime(buf, sizeof buf / sizeof buf[0], L"%x %X", &local);
-    uselocale(previous);
-    freelocale(loc);
+// The date-time text of a photo's placemark (UTC, no "Z"): its time on the track, else (when
+// that is -1) the camera's time less the trip's time shift, else (both -1) empty.
+std::string KmlPhotoTimeText(const PHOTO_ITEM_INFO& photo) {
+  if (photo.playbackTime != -1) return StdTimeText(photo.playbackTime);
+  if (photo.originalTime != -1) {
+    // The camera's clock runs on the trip's local time.
+    const int64_t shift = photo.trip ? photo.trip->timeZoneShift : 0;
+    return StdTimeText(static_cast<int32_t>(photo.originalTime - shift));
   }
-  return Utf8Field(std::wstring_view(buf, n), 512);
+  return {};
 }
 
+// The size (pixels) at which a photo of `width` x `height` pixels is shown in its balloon: the
+// long side 320, the other in proportion; 320 x 240 when the size is unknown.
+struct KmlPictureSize {
+  int width;
+  int height;
+};
 KmlPictureSize KmlDisplaySize(int width, int height) {
   constexpr int kBox = 320;
   if (width <= 0 || height <= 0) return {kBox, kBox * 3 / 4};
@@ -58,19 +61,14 @@ KmlPictureSize KmlDisplaySize(int width, int height) {
   return {static_cast<int>((static_cast<long long>(width) * kBox + height / 2) / height), kBox};
 }
 
-}  // namespace navmisc::exportdetail
-
-namespace {
-
-using namespace navmisc::exportdetail;
-
 constexpr std::string_view kStyleUrl =
     "#default_copy0+nicon=http://maps.google.com/mapfiles/kml/pal4/icon15.png"
     "+hicon=http://maps.google.com/mapfiles/kml/pal4/icon7.png";
 constexpr std::string_view kMarkerIcon = "http://maps.google.com/mapfiles/kml/pal3/icon36.png";
 constexpr std::string_view kPhotoIcon = "http://maps.google.com/mapfiles/kml/pal4/icon38.png";
 
-// Text buffers of the original readers of these documents, terminator included.
+// Texts go through fixed buffers of these sizes in bytes, terminator included.
+constexpr size_t kDateBuffer = 512;
 constexpr size_t kTrackNameBuffer = 1024;
 constexpr size_t kItemTextBuffer = 20480;
 constexpr size_t kPathBuffer = 2048;
@@ -84,8 +82,8 @@ struct PackEntry {
 // Writes one document; lives for one export call.
 class KmlWriter {
  public:
-  KmlWriter(const CString& path, CPtrList& tracks, CPtrList& items, int photoSourceMode)
-      : path_(path), tracks_(tracks), items_(items), photoSourceMode_(photoSourceMode) {}
+  KmlWriter(CPtrList& tracks, CPtrList& items, int photoSourceMode, Progress progress)
+      : tracks_(tracks), items_(items), photoSourceMode_(photoSourceMode), progress_(progress) {}
 
   // Photos are then copied into `scratchFolder` and referred to by their bare copy names.
   void SetKmz(const CString& scratchFolder) {
@@ -94,37 +92,43 @@ class KmlWriter {
     pack_.clear();
   }
   std::vector<PackEntry>& pack() { return pack_; }
+  bool stopped() const { return stopped_; }
 
-  bool Write() {
-    if (path_.IsEmpty()) return false;
-    ClearTargetFile(path_);
-    file_ = OpenForWriting(path_);
-    if (!file_) return false;
-    {
-      BufferedWriter w(file_.get());
-      std::string& out = w.text();
-      out += "<?xml version=\"1.0\" encoding=\"UTF-8\"?><kml xmlns=\"http://earth.google.com/kml/2.1\">"
-             "<Folder><name>";
-      out += KmlDocumentName(std::time(nullptr));
-      out += "</name><open>1</open>";
-      for (const TRACK_ITEM_INFO* track : navmisc::Items<TRACK_ITEM_INFO>(tracks_)) {
-        if (track) WriteTrack(w, *track);
-      }
-      for (const PHOTO_ITEM_INFO* item : navmisc::Items<PHOTO_ITEM_INFO>(items_)) {
-        if (item) WriteItem(out, *item);
-        w.MaybeFlush();
-      }
-      out += "</Folder></kml>";
+  // False when the target cannot be opened or the caller stopped the export (nothing is left at
+  // the target then).
+  bool Write(const CString& path) {
+    if (path.IsEmpty()) return false;
+    DocumentWriter w;
+    if (!w.Open(path)) return false;
+    std::string& out = w.text();
+    out += "<?xml version=\"1.0\" encoding=\"UTF-8\"?><kml xmlns=\"http://earth.google.com/kml/2.1\">"
+           "<Folder><name>";
+    out += Utf8Field(UserDateTimeText(GetCurDateTime()).view(), kDateBuffer);
+    out += "</name><open>1</open>";
+    for (const TRACK_ITEM_INFO* track : navmisc::Items<TRACK_ITEM_INFO>(tracks_)) {
+      if (track && !WriteTrack(w, *track)) return Stop(w);
     }
-    file_.reset();
+    for (const PHOTO_ITEM_INFO* item : navmisc::Items<PHOTO_ITEM_INFO>(items_)) {
+      if (item) WriteItem(out, *item);
+      w.MaybeFlush();
+      if (!progress_.Step()) return Stop(w);
+    }
+    out += "</Folder></kml>";
+    w.Close();
     return true;
   }
 
  private:
-  void WriteTrack(BufferedWriter& w, const TRACK_ITEM_INFO& track) {
+  bool Stop(DocumentWriter& w) {
+    w.Remove();
+    stopped_ = true;
+    return false;
+  }
+
+  bool WriteTrack(DocumentWriter& w, const TRACK_ITEM_INFO& track) {
     std::string& out = w.text();
     // Track names go out raw, and the description repeats the name.
-    std::string name = Utf8Field(track.GetName().view(), kTrackNameBuffer);
+    const std::string name = Utf8Field(track.GetName().view(), kTrackNameBuffer);
     out += "<Placemark><name>";
     out += name;
     out += "</name><description>";
@@ -134,20 +138,23 @@ class KmlWriter {
     out += "</styleUrl><Style><LineStyle id=\"khLineStyle989\"><color>7f8000ff</color><width>4</width>"
            "</LineStyle></Style><LineString><tessellate>1</tessellate><coordinates>\r\n";
     for (const WAYPOINT_ITEM_INFO* p : navmisc::Items<WAYPOINT_ITEM_INFO>(track.points)) {
-      if (!p || p->time == -1) continue;
-      AppendFixed(out, p->longitude, 6);
-      out += ',';
-      AppendFixed(out, p->latitude, 6);
-      out += ",0 ";
-      w.MaybeFlush();
+      if (p && p->time != -1) {
+        AppendFixed(out, p->longitude, 6);
+        out += ',';
+        AppendFixed(out, p->latitude, 6);
+        out += ",0 ";
+        w.MaybeFlush();
+      }
+      if (!progress_.Step()) return false;
     }
     out += "</coordinates></LineString></Placemark>";
+    return true;
   }
 
   void WriteItem(std::string& out, const PHOTO_ITEM_INFO& item) {
     if (item.dataType == PHOTO_ITEM_INFO::kTypeMarker ||
         item.dataType == PHOTO_ITEM_INFO::kTypeLandmark) {
-      std::string title = Utf8Field(KmlEscape(item.title.view()), kItemTextBuffer);
+      const std::string title = Utf8Field(KmlEscape(item.title.view()), kItemTextBuffer);
       out += "\r\n<Placemark><name>";
       out += title;
       out += "</name><description><![CDATA[";
@@ -162,17 +169,17 @@ class KmlWriter {
       return;
     }
     if (item.dataType != PHOTO_ITEM_INFO::kTypePhoto) return;
-    CString photoPath = item.GetFilePathName();
+    const CString photoPath = item.GetFilePathName();
     if (photoPath.IsEmpty()) return;
 
-    std::string title = Utf8Field(KmlEscape(item.title.view()), kItemTextBuffer);
-    KmlPictureSize size = KmlDisplaySize(item.width, item.height);
+    const std::string title = Utf8Field(KmlEscape(item.title.view()), kItemTextBuffer);
+    const KmlPictureSize size = KmlDisplaySize(item.width, item.height);
     out += "\r\n<Placemark><name>";
     out += title;
     out += "</name><description><![CDATA[#";
     out += title;
     out += "<br><br><br>";
-    out += PhotoTimeText(item);
+    out += KmlPhotoTimeText(item);
     // The letters stay "N" and "E" in every hemisphere; the signed numbers carry the truth.
     out += "<br>N ";
     AppendFixed(out, item.latitude, 6);
@@ -199,23 +206,14 @@ class KmlWriter {
     out += ",0</coordinates></Point></Placemark>";
   }
 
-  // The photo's own time, else the camera's time brought to UTC by the trip's shift.
-  static std::string PhotoTimeText(const PHOTO_ITEM_INFO& item) {
-    if (item.playbackTime > 0) return StdTimeTextZ(item.playbackTime);
-    if (item.originalTime > 0) {
-      const int32_t shift = item.trip ? item.trip->timeZoneShift : 0;
-      return StdTimeTextZ(static_cast<int32_t>(static_cast<int64_t>(item.originalTime) - shift));
-    }
-    return {};
-  }
-
   std::string PictureSource(const PHOTO_ITEM_INFO& item, const CString& photoPath) {
     if (kmz_) {
       ++photoNumber_;
-      CString extension = PathExtension(photoPath);
-      CString name = extension.IsEmpty() ? FormatString(L"%d", photoNumber_)
-                                         : FormatString(L"%d.%s", photoNumber_, extension.c_str());
-      CString copy = PathJoin(scratch_, name);
+      const CString extension = PathExtension(photoPath);
+      const CString name = extension.IsEmpty()
+                               ? FormatString(L"%d", photoNumber_)
+                               : FormatString(L"%d.%s", photoNumber_, extension.c_str());
+      const CString copy = PathJoin(scratch_, name);
       // A copy that fails is still listed: packing it then fails and names the photo.
       CopyFile(photoPath, copy, false);
       pack_.push_back({copy, &item});
@@ -233,50 +231,26 @@ class KmlWriter {
     return "file:///" + Utf8Field(rest, kPathBuffer);
   }
 
-  CString path_;
-  UniqueFile file_;
   CPtrList& tracks_;
   CPtrList& items_;
-  bool kmz_ = false;
-  CString scratch_;
   int photoSourceMode_ = 0;
+  Progress progress_;
+  bool kmz_ = false;
+  bool stopped_ = false;
+  CString scratch_;
   int photoNumber_ = 0;
   std::vector<PackEntry> pack_;
 };
 
-// A scratch folder of this call's own, removed with everything in it when the object goes.
-class ScratchFolder {
- public:
-  ScratchFolder() {
-    const char* tmp = std::getenv("TMPDIR");
-    std::string base = (tmp && *tmp) ? tmp : "/tmp";
-    std::string templ = base + "/navmisc-kmz-XXXXXX";
-    if (!mkdtemp(templ.data())) return;
-    own_ = navmisc::FromUtf8Lossy(templ);
-    CString folder = PathJoin(own_, L"KMZ_Temp");
-    if (MakeDir(folder)) folder_ = folder;
-  }
-  ~ScratchFolder() {
-    if (!own_.IsEmpty()) RemoveDir(own_);
-  }
-  ScratchFolder(const ScratchFolder&) = delete;
-  ScratchFolder& operator=(const ScratchFolder&) = delete;
-  const CString& folder() const { return folder_; }  // empty when it could not be made
-
- private:
-  CString own_;
-  CString folder_;
-};
-
 int Fail(KmzExportFailure* failure, KmzExportFailure::Stage stage, const PackEntry* entry,
-         const wchar_t* message) {
+         const std::string& message) {
   if (failure) {
     failure->stage = stage;
     if (entry) {
       failure->file = entry->path;
       failure->photo = entry->photo;
     }
-    failure->message = message;
+    failure->message = CString::FromUtf8(message);
   }
   return 0;
 }
@@ -284,64 +258,57 @@ int Fail(KmzExportFailure* failure, KmzExportFailure::Stage stage, const PackEnt
 }  // namespace
 
 int ExportKml(CString path, CPtrList& tracks, CPtrList& items, int photoSourceMode) {
-  KmlWriter writer(path, tracks, items, photoSourceMode);
-  return writer.Write() ? 1 : 0;
+  return ExportKml(path, tracks, items, photoSourceMode, nullptr, nullptr);
+}
+
+int ExportKml(CString path, CPtrList& tracks, CPtrList& items, int photoSourceMode, int* counter,
+              bool* keepGoing) {
+  KmlWriter writer(tracks, items, photoSourceMode, Progress{counter, keepGoing});
+  return writer.Write(path) ? 1 : 0;
 }
 
 int ExportKmz(CString path, CPtrList& tracks, CPtrList& items) {
   return ExportKmz(path, tracks, items, nullptr);
 }
 
-int ExportKmz(CString path, CPtrList& tracks, CPtrList& items, KmzExportFailure* failure) {
+int ExportKmz(CString path, CPtrList& tracks, CPtrList& items, KmzExportFailure* failure,
+              int* counter, bool* keepGoing) {
   if (failure) *failure = KmzExportFailure{};
-  ScratchFolder scratch;
-  if (scratch.folder().IsEmpty()) {
+  navmisc::ScopedTempFolder scratch(L"KMZ_Temp");
+  if (scratch.path().IsEmpty()) {
     return Fail(failure, KmzExportFailure::kScratchFolder, nullptr,
-                L"cannot create a scratch folder under $TMPDIR");
+                "cannot create a scratch folder under $TMPDIR");
   }
-  KmlWriter writer(path, tracks, items, 0);
-  writer.SetKmz(scratch.folder());
-  if (!writer.Write()) {
-    return Fail(failure, KmzExportFailure::kDocument, nullptr, L"cannot write the document");
+  KmlWriter writer(tracks, items, 0, Progress{counter, keepGoing});
+  writer.SetKmz(scratch.path());
+  if (!writer.Write(path)) {
+    if (writer.stopped()) return Fail(failure, KmzExportFailure::kStopped, nullptr, "stopped");
+    return Fail(failure, KmzExportFailure::kDocument, nullptr,
+                path.IsEmpty() ? "no target path" : navmisc::LastOpenError());
   }
 
   // The document travels last, named after the target.
-  PackEntry document{PathJoin(scratch.folder(), PathFileTitle(path) + L".kml"), nullptr};
-  if (!CopyFile(path, document.path, false)) {
-    ClearTargetFile(path);
-    return Fail(failure, KmzExportFailure::kAddFile, &document, L"cannot copy the document");
-  }
+  PackEntry document{PathJoin(scratch.path(), PathFileTitle(path) + L".kml"), nullptr};
+  const bool copied = CopyFile(path, document.path, false);
   ClearTargetFile(path);
+  if (!copied) {
+    return Fail(failure, KmzExportFailure::kAddFile, &document, "cannot copy the written document");
+  }
   std::vector<PackEntry>& pack = writer.pack();
   pack.push_back(document);
 
-  int error = 0;
-  zip_t* archive = zip_open(navmisc::NativePath(path).c_str(), ZIP_CREATE | ZIP_TRUNCATE, &error);
-  if (!archive) {
-    return Fail(failure, KmzExportFailure::kArchive, nullptr, L"cannot create the archive");
-  }
+  navmisc::ZipArchiveWriter archive;
+  if (!archive.Create(path)) return Fail(failure, KmzExportFailure::kArchive, nullptr, archive.error());
   for (const PackEntry& entry : pack) {
-    // libzip reads the files only when the archive is closed; a file that cannot be read now is
-    // reported here, against its own name, rather than as a failed close.
-    std::string native = navmisc::NativePath(entry.path);
-    std::FILE* probe = std::fopen(native.c_str(), "rb");
-    if (!probe) {
-      zip_discard(archive);
-      return Fail(failure, KmzExportFailure::kAddFile, &entry, L"cannot read the file to pack");
-    }
-    std::fclose(probe);
-    zip_source_t* source = zip_source_file(archive, native.c_str(), 0, -1);
-    std::string name = navmisc::ToUtf8Lossy(PathFileName(entry.path).view());
-    if (!source || zip_file_add(archive, name.c_str(), source, ZIP_FL_ENC_UTF_8) < 0) {
-      if (source) zip_source_free(source);
-      zip_discard(archive);
-      return Fail(failure, KmzExportFailure::kAddFile, &entry, L"cannot add the file to the archive");
+    if (!archive.AddFile(entry.path, PathFileName(entry.path))) {
+      const std::string why = archive.error();
+      // The archive keeps what was added before the failure.
+      archive.Close();
+      return Fail(failure, KmzExportFailure::kAddFile, &entry, why);
     }
   }
-  if (zip_close(archive) != 0) {
-    zip_discard(archive);
-    ClearTargetFile(path);
-    return Fail(failure, KmzExportFailure::kCloseArchive, nullptr, L"cannot complete the archive");
+  if (!archive.Close()) {
+    return Fail(failure, KmzExportFailure::kCloseArchive, nullptr, archive.error());
   }
   return 1;
 }

@@ -1,6 +1,6 @@
 #include "navmisc/export/tcx_export.h"
 
-#include <vector>
+#include <string>
 
 #include "navmisc/export/detail/export_common.h"
 #include "navmisc/export/detail/xml_tree.h"
@@ -18,6 +18,8 @@ TcxLap* CTcxActivities::AddLap() {
 
 namespace {
 
+using navmisc::exportdetail::DocumentWriter;
+using navmisc::exportdetail::Progress;
 using navmisc::exportdetail::XmlDocument;
 using navmisc::exportdetail::XmlNode;
 
@@ -39,6 +41,21 @@ enum class Intensity { kActive, kResting };
 
 const wchar_t* IntensityText(Intensity i) { return i == Intensity::kActive ? L"Active" : L"Resting"; }
 
+const wchar_t* SportText(int32_t type) {
+  switch (type) {
+    case CTcxActivities::kBiking: return L"Biking";
+    case CTcxActivities::kRunning: return L"Running";
+    default: return L"Other";
+  }
+}
+
+// "%d" of the total time truncated toward zero; a value outside the integers gives the
+// processor's "integer indefinite" value, as the conversion instruction does.
+int WholeSeconds(double seconds) {
+  if (!(seconds > -2147483649.0 && seconds < 2147483648.0)) return INT32_MIN;
+  return static_cast<int>(seconds);
+}
+
 void AddHeartRate(XmlNode* parent, const wchar_t* name, int bpm) {
   XmlNode* node = parent->AddChild(name);
   node->AddAttribute(L"xsi:type", L"HeartRateInBeatsPerMinute_t");
@@ -50,9 +67,12 @@ bool PositionMissing(const WAYPOINT_ITEM_INFO& p) {
   return (p.latitude == 0.0 && p.longitude == 0.0) || (p.latitude == 45.0 && p.longitude == 45.0);
 }
 
-void AddTrackpoint(XmlNode* track, const WAYPOINT_ITEM_INFO& p) {
+bool IsTrackpoint(const WAYPOINT_ITEM_INFO* p) {
+  return p && p->time != -1 && (p->flags[WAYPOINT_ITEM_INFO::kFlagPresence] & 0x0F) != 0;
+}
+
+void FillTrackpoint(XmlNode* tp, const WAYPOINT_ITEM_INFO& p) {
   const uint8_t flags = p.flags[WAYPOINT_ITEM_INFO::kFlagPresence];
-  XmlNode* tp = track->AddChild(L"Trackpoint");
   // Unlike the lap's start, the point's time gets no "Z"; readers take it as UTC either way.
   tp->AddChild(L"Time")->SetText(TimeTToStdStringTime(p.time).str());
   if ((flags & kHasPosition) && !PositionMissing(p)) {
@@ -72,13 +92,13 @@ void AddTrackpoint(XmlNode* track, const WAYPOINT_ITEM_INFO& p) {
   }
 }
 
-void AddLap(XmlNode* activity, const TcxLap& lap) {
-  XmlNode* node = activity->AddChild(L"Lap");
+// The Lap element with its figures; its Track elements follow the figures.
+void FillLap(XmlNode* node, const TcxLap& lap) {
   if (lap.startTime > 0) {
     node->AddAttribute(L"StartTime",
                        navmisc::FromUtf8Lossy(navmisc::exportdetail::StdTimeTextZ(lap.startTime)));
   }
-  node->AddChild(L"TotalTimeSeconds")->SetText(static_cast<int>(lap.totalTimeSeconds));
+  node->AddChild(L"TotalTimeSeconds")->SetText(WholeSeconds(lap.totalTimeSeconds));
   node->AddChild(L"DistanceMeters")->SetText(lap.distanceMeters);
   if (lap.maximumSpeed > 0) node->AddChild(L"MaximumSpeed")->SetText(lap.maximumSpeed);
   if (lap.calories > 0) node->AddChild(L"Calories")->SetText(lap.calories);
@@ -86,48 +106,106 @@ void AddLap(XmlNode* activity, const TcxLap& lap) {
   if (lap.maximumHeartRate > 0) AddHeartRate(node, L"MaximumHeartRateBpm", lap.maximumHeartRate);
   node->AddChild(L"Intensity")->SetText(IntensityText(Intensity::kActive));
   node->AddChild(L"TriggerMethod")->SetText(L"Manual");
-  for (const TRACK_ITEM_INFO* track : navmisc::Items<TRACK_ITEM_INFO>(lap.tracks)) {
-    if (!track) continue;
-    XmlNode* trackNode = node->AddChild(L"Track");
-    for (const WAYPOINT_ITEM_INFO* p : navmisc::Items<WAYPOINT_ITEM_INFO>(track->points)) {
-      if (!p || p->time == -1) continue;
-      if ((p->flags[WAYPOINT_ITEM_INFO::kFlagPresence] & 0x0F) == 0) continue;
-      AddTrackpoint(trackNode, *p);
-    }
-  }
 }
 
-const wchar_t* SportText(int32_t type) {
-  switch (type) {
-    case CTcxActivities::kBiking: return L"Biking";
-    case CTcxActivities::kRunning: return L"Running";
-    default: return L"Other";
+// The document's wide text, converted to UTF-8 piece by piece on its way into the file. The
+// result is what converting the whole text at once gives: text that is not valid Unicode, or
+// whose UTF-8 form is longer than twice its length in characters (the size of the conversion
+// buffer), makes the whole conversion fail and the file end up empty.
+class Utf8Document {
+ public:
+  explicit Utf8Document(DocumentWriter& w) : w_(w) {}
+  std::wstring& piece() { return piece_; }
+  // Converts and writes what piece() holds.
+  void Put() {
+    chars_ += piece_.size();
+    if (ok_ && navmisc::WideToUtf8(piece_, utf8_)) {
+      bytes_ += utf8_.size();
+      w_.text() += utf8_;
+      w_.MaybeFlush();
+    } else {
+      ok_ = false;
+    }
+    piece_.clear();
   }
-}
+  bool ok() const { return ok_ && bytes_ <= 2 * chars_; }
+
+ private:
+  DocumentWriter& w_;
+  std::wstring piece_;
+  std::string utf8_;
+  size_t chars_ = 0;
+  size_t bytes_ = 0;
+  bool ok_ = true;
+};
 
 }  // namespace
 
 int ExportTcx(CString path, CTcxActivities& activity) {
+  return ExportTcx(path, activity, nullptr, nullptr);
+}
+
+int ExportTcx(CString path, CTcxActivities& activity, int* counter, bool* keepGoing) {
   if (activity.Id.IsEmpty() || activity.sportType < 0 || activity.sportType > 7) return 0;
 
+  // The document's frame; the laps are rendered one by one, and their Trackpoints one at a
+  // time, so that a long activity never has to be held as elements in memory.
   XmlDocument doc;
   XmlNode* root = doc.CreateNode(kRootTag);
-  root->AddChild(L"Folders");
-  XmlNode* act = root->AddChild(L"Activities")->AddChild(L"Activity");
+  XmlNode* folders = root->AddChild(L"Folders");
+  XmlNode* activities = root->AddChild(L"Activities");
+  XmlNode* act = activities->AddChild(L"Activity");
   act->AddAttribute(L"Sport", SportText(activity.sportType));
-  act->AddChild(L"Id")->SetText(activity.Id.str());
+  XmlNode* id = act->AddChild(L"Id");
+  id->SetText(activity.Id.str());
+
+  DocumentWriter w;
+  if (!w.Open(path)) return 0;
+  Progress progress{counter, keepGoing};
+  Utf8Document text(w);
+  std::wstring& piece = text.piece();
+  piece = kPrologue;
+  root->RenderStart(piece);
+  folders->Render(piece);
+  activities->RenderStart(piece);
+  act->RenderStart(piece);
+  id->Render(piece);
+  text.Put();
   for (const TcxLap* lap : navmisc::Items<TcxLap>(activity.laps)) {
-    if (lap) AddLap(act, *lap);
+    if (!lap) continue;
+    XmlNode lapNode(L"Lap");
+    FillLap(&lapNode, *lap);
+    lapNode.RenderStart(piece);
+    for (const auto& figure : lapNode.children()) figure->Render(piece);
+    for (const TRACK_ITEM_INFO* track : navmisc::Items<TRACK_ITEM_INFO>(lap->tracks)) {
+      if (!track) continue;
+      XmlNode trackNode(L"Track");
+      trackNode.RenderStart(piece);
+      for (const WAYPOINT_ITEM_INFO* p : navmisc::Items<WAYPOINT_ITEM_INFO>(track->points)) {
+        if (IsTrackpoint(p)) {
+          XmlNode tp(L"Trackpoint");
+          FillTrackpoint(&tp, *p);
+          tp.Render(piece);
+          text.Put();
+        }
+        if (!progress.Step()) {
+          w.Remove();
+          return 0;
+        }
+      }
+      trackNode.RenderEnd(piece);
+    }
+    lapNode.RenderEnd(piece);
   }
-
-  std::wstring text = doc.Render(kPrologue);
-  // The document is converted into a buffer of twice its length in characters: text that needs
-  // more than that (long runs of characters outside the Latin scripts) leaves the file empty.
-  std::vector<char> utf8(text.size() * 2 + 1);
-  int length = WCSToMBS(text.c_str(), utf8.data(), static_cast<int>(utf8.size()), true);
-
-  navmisc::exportdetail::UniqueFile file = navmisc::exportdetail::OpenForWriting(path);
-  if (!file) return 0;
-  if (length > 0) std::fwrite(utf8.data(), 1, static_cast<size_t>(length), file.get());
+  act->RenderEnd(piece);
+  activities->RenderEnd(piece);
+  root->RenderEnd(piece);
+  text.Put();
+  if (!text.ok()) {
+    // Nothing of a failed conversion reaches the file.
+    w.Remove();
+    if (!w.Open(path)) return 0;
+  }
+  w.Close();
   return 1;
 }

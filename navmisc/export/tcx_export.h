@@ -40,10 +40,17 @@ class CTcxActivities {
   CPtrList laps;          // TcxLap*, owned
 };
 
-// Writes `activity` as a TCX v2 document at `path`, replacing any file there. A Trackpoint is
-// written for every point that has a time and at least one presence flag. Text is not escaped:
-// an Id holding "&" or "<" is written raw.
+// Writes `activity` as a TCX v2 document at `path`, replacing any file there (a read-only one
+// too). A Trackpoint is written for every point that has a time and at least one presence flag.
+// Text is not escaped: an Id holding "&" or "<" is written raw. Lines end in LF, without
+// indentation. A document whose UTF-8 form would be longer than twice its length in characters
+// (an Id made of many characters outside the Latin scripts) leaves the file empty.
 //
-// Returns 1 when written; 0 when the activity is rejected (empty Id, sport type outside 0 to 7)
-// or the target cannot be opened, and then no file is touched.
+// Returns 1 when written; 0 when the activity is rejected (empty Id, sport type outside 0 to 7),
+// and then no file is touched, or when the target cannot be opened.
 int ExportTcx(CString path, CTcxActivities& activity);
+
+// The same with progress: `*counter` (may be null) goes up by one per track point of the laps.
+// When `*keepGoing` (may be null) turns false the export stops, deletes what it wrote and
+// returns 0.
+int ExportTcx(CString path, CTcxActivities& activity, int* counter, bool* keepGoing);

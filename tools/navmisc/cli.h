@@ -54,9 +54,12 @@ std::unique_ptr<BLOG_ITEM_INFO> OpenTrip(const std::string& id);
 bool RunWithProgress(const std::string& label, int total, int& counter, bool& keepGoing,
                      const std::function<void()>& work);
 
-// Writes `trip` (points loaded) in one of the export formats; fails with a message.
+// Writes `trip` (points loaded) in one of the export formats; fails with a message. `counter`
+// and `keepGoing` (may be null) follow and stop the export.
 int ExportTrip(BLOG_ITEM_INFO& trip, const std::string& format, const std::string& out, bool metric,
-               int sport);
+               int sport, int* counter = nullptr, bool* keepGoing = nullptr);
+// The demo's last step: every trip of the demo tree in every export format.
+void DemoExports(const std::string& root);
 
 // Subcommands.
 int CmdDemo(Args& args);

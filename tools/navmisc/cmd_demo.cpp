@@ -108,6 +108,7 @@ int CmdDemo(Args& args) {
   std::printf("  (tracker day: %ld cell fixes, %ld help points)\n", cells, help);
   std::printf("\nTry: navmisc --data-root %s trips\n", root.c_str());
   DemoGeometry();
+  DemoExports(root);
   return 0;
 }
 

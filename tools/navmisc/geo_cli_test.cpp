@@ -1,6 +1,5 @@
 // navmisc optimize, plot and place, run as a user runs them.
 #include <gtest/gtest.h>
-#include <sys/wait.h>
 
 #include <cstdio>
 #include <cstdlib>
@@ -14,21 +13,12 @@
 
 namespace {
 
-struct Result {
-  int code;
-  std::string output;  // standard output and error
-};
+using navmisc::testutil::CommandResult;
+using navmisc::testutil::HaveProgram;
 
-Result RunTool(const std::string& args) {
-  const std::string command = std::string(NAVMISC_TOOL_PATH) + " " + args + " 2>&1";
-  FILE* pipe = popen(command.c_str(), "r");
-  Result r{-1, {}};
-  if (!pipe) return r;
-  char buf[4096];
-  for (size_t n; (n = std::fread(buf, 1, sizeof buf, pipe)) > 0;) r.output.append(buf, n);
-  const int status = pclose(pipe);
-  r.code = WIFEXITED(status) ? WEXITSTATUS(status) : -1;
-  return r;
+// The program with `args`, standard error folded into the output.
+CommandResult RunTool(const std::string& args) {
+  return navmisc::testutil::RunCommand(std::string(NAVMISC_TOOL_PATH) + " " + args + " 2>&1");
 }
 
 std::vector<WAYPOINT_ITEM_INFO*> AllPoints(BLOG_ITEM_INFO& trip) {
@@ -42,7 +32,7 @@ std::vector<WAYPOINT_ITEM_INFO*> AllPoints(BLOG_ITEM_INFO& trip) {
 // A command line, the exit code it must end with and a text its output must hold.
 struct Expectation {
   std::string args;
-  int code;
+  int status;
   std::string shows;
 };
 
@@ -73,9 +63,9 @@ class GeoCommands : public ::testing::Test {
 
   void Check(const std::vector<Expectation>& cases, const std::string& prefix = "") {
     for (const Expectation& c : cases) {
-      const Result r = RunTool(Tool(prefix + c.args));
-      EXPECT_EQ(r.code, c.code) << c.args << "\n" << r.output;
-      EXPECT_NE(r.output.find(c.shows), std::string::npos) << c.args << "\n" << r.output;
+      const CommandResult r = RunTool(Tool(prefix + c.args));
+      EXPECT_EQ(r.status, c.status) << c.args << "\n" << r.out;
+      EXPECT_NE(r.out.find(c.shows), std::string::npos) << c.args << "\n" << r.out;
     }
   }
 
@@ -86,9 +76,9 @@ class GeoCommands : public ::testing::Test {
 TEST_F(GeoCommands, OptimizeStoresTheLibrarysLevels) {
   auto expected = Load();
   expected->OptimizeWaypoint(GPS_APP_TRIP, 1, nullptr, nullptr);
-  const Result r = RunTool(Tool("optimize GEOTRIP"));
-  ASSERT_EQ(r.code, 0) << r.output;
-  EXPECT_NE(r.output.find("display level " + std::to_string(expected->optLevel)), std::string::npos) << r.output;
+  const CommandResult r = RunTool(Tool("optimize GEOTRIP"));
+  ASSERT_EQ(r.status, 0) << r.out;
+  EXPECT_NE(r.out.find("display level " + std::to_string(expected->optLevel)), std::string::npos) << r.out;
   auto saved = Load();
   EXPECT_EQ(saved->optLevel, expected->optLevel);
   EXPECT_TRUE(saved->optOptimize);
@@ -102,18 +92,18 @@ TEST_F(GeoCommands, OptimizeStoresTheLibrarysLevels) {
   EXPECT_GT(stops, 0);
 
   // --off keeps the levels and chooses the display level again.
-  const Result off = RunTool(Tool("optimize GEOTRIP --off"));
-  ASSERT_EQ(off.code, 0) << off.output;
+  const CommandResult off = RunTool(Tool("optimize GEOTRIP --off"));
+  ASSERT_EQ(off.status, 0) << off.out;
   auto reloaded = Load();
   const auto again = AllPoints(*reloaded);
   for (size_t i = 0; i < a.size(); ++i) ASSERT_EQ(again[i]->type, a[i]->type) << i;
 }
 
 TEST_F(GeoCommands, PlotWritesAValidDrawingOfEveryPoint) {
-  ASSERT_EQ(RunTool(Tool("optimize GEOTRIP")).code, 0);
+  ASSERT_EQ(RunTool(Tool("optimize GEOTRIP")).status, 0);
   const std::string svg = (root / L"trip.svg").ToUtf8();
-  const Result r = RunTool(Tool("plot GEOTRIP --size 500 -o " + svg));
-  ASSERT_EQ(r.code, 0) << r.output;
+  const CommandResult r = RunTool(Tool("plot GEOTRIP --size 500 -o " + svg));
+  ASSERT_EQ(r.status, 0) << r.out;
   const std::string text = navmisc::testutil::ReadFileBytes(CString::FromUtf8(svg));
   ASSERT_EQ(text.rfind("<?xml", 0), 0u);
   size_t dots = 0;
@@ -122,7 +112,7 @@ TEST_F(GeoCommands, PlotWritesAValidDrawingOfEveryPoint) {
   for (const char* key : {"bad fix (-2)", "stop (-1)", "level 0", "never dropped", "#d62728", "#ff7f0e"}) {
     EXPECT_NE(text.find(key), std::string::npos) << key;
   }
-  if (std::system("command -v xmllint >/dev/null 2>&1") == 0) {
+  if (HaveProgram("xmllint")) {
     EXPECT_EQ(std::system(("xmllint --noout " + svg).c_str()), 0);
   }
 }

@@ -6,10 +6,30 @@
 
 namespace navmisc::exportdetail {
 
-UniqueFile OpenForWriting(const wchar_t* path) {
-  std::string native = NativePath(path);
-  if (native.empty()) return nullptr;
-  return UniqueFile(std::fopen(native.c_str(), "wb"));
+bool DocumentWriter::Open(const CString& path) {
+  Close();
+  text_.clear();
+  path_ = path;
+  ClearTargetFile(path);
+  return file_.Open(path);
+}
+
+void DocumentWriter::Flush() {
+  file_.Write(text_);
+  text_.clear();
+}
+
+void DocumentWriter::Close() {
+  if (!file_.IsOpen()) return;
+  Flush();
+  file_.Close();
+}
+
+void DocumentWriter::Remove() {
+  text_.clear();
+  if (!file_.IsOpen()) return;
+  file_.Close();
+  DeleteFileRetry(path_);
 }
 
 std::string Utf8Field(std::wstring_view text, size_t bufferSize) {

@@ -1,21 +1,18 @@
 // Record builders and file helpers shared by the exporter tests.
 #pragma once
 
-#include <cerrno>
 #include <clocale>
 #include <cstdio>
-#include <cstdlib>
 #include <memory>
 #include <string>
+#include <tuple>
 #include <vector>
-
-#include <sys/stat.h>
-#include <sys/wait.h>
 
 #include "navmisc/platform/files.h"
 #include "navmisc/platform/lists.h"
 #include "navmisc/records/photo.h"
 #include "navmisc/records/track.h"
+#include "testutil.h"
 
 namespace navmisc::exporttest {
 
@@ -34,13 +31,8 @@ inline std::unique_ptr<TRACK_ITEM_INFO> MakeTrack(const wchar_t* name, const std
   track->description = name;
   for (const Pt& p : pts) {
     auto* w = new WAYPOINT_ITEM_INFO;
-    w->latitude = p.lat;
-    w->longitude = p.lon;
-    w->altitude = p.alt;
-    w->time = p.time;
-    w->speed = p.speed;
-    w->course = p.course;
-    w->type = p.type;
+    std::tie(w->latitude, w->longitude, w->altitude, w->time) = std::tie(p.lat, p.lon, p.alt, p.time);
+    std::tie(w->speed, w->course, w->type) = std::tie(p.speed, p.course, p.type);
     track->points.AddTail(w);
   }
   return track;
@@ -49,14 +41,22 @@ inline std::unique_ptr<TRACK_ITEM_INFO> MakeTrack(const wchar_t* name, const std
 inline std::unique_ptr<PHOTO_ITEM_INFO> MakeItem(int type, const wchar_t* title, const wchar_t* desc,
                                                  double lat, double lon, double alt, int32_t time) {
   auto item = std::make_unique<PHOTO_ITEM_INFO>();
-  item->dataType = type;
-  item->title = title;
-  item->description = desc;
-  item->latitude = lat;
-  item->longitude = lon;
-  item->altitude = alt;
-  item->playbackTime = time;
+  std::tie(item->dataType, item->title, item->description) = std::tie(type, title, desc);
+  std::tie(item->latitude, item->longitude, item->altitude, item->playbackTime) = std::tie(lat, lon, alt, time);
   return item;
+}
+
+// Pulls the Folder name (the local date and time of the export) out of a KML document and puts
+// "@DATE@" in its place, so that the rest can be compared byte for byte.
+inline std::string MaskKmlDate(const std::string& doc, std::string* name = nullptr) {
+  const std::string open = "<Folder><name>";
+  const size_t start = doc.find(open);
+  if (start == std::string::npos) return doc;
+  const size_t from = start + open.size();
+  const size_t end = doc.find("</name>", from);
+  if (end == std::string::npos) return doc;
+  if (name) *name = doc.substr(from, end - from);
+  return doc.substr(0, from) + "@DATE@" + doc.substr(end);
 }
 
 // Switches the whole process to a locale that writes decimal commas for the object's lifetime;
@@ -92,25 +92,9 @@ inline std::string SchemaDir() {
   return {};
 }
 
-// Runs a shell command; its exit status and what it wrote on standard output.
-struct CommandResult {
-  int status = -1;
-  std::string out;
-};
-inline CommandResult RunCommand(const std::string& command) {
-  CommandResult r;
-  std::FILE* pipe = ::popen(command.c_str(), "r");
-  if (!pipe) return r;
-  char buf[4096];
-  size_t n;
-  while ((n = std::fread(buf, 1, sizeof buf, pipe)) > 0) r.out.append(buf, n);
-  int status = ::pclose(pipe);
-  r.status = WIFEXITED(status) ? WEXITSTATUS(status) : -1;
-  return r;
-}
-
-inline bool HaveProgram(const char* name) {
-  return RunCommand(std::string("command -v ") + name + " >/dev/null 2>&1").status == 0;
-}
+using navmisc::testutil::CommandResult;
+using navmisc::testutil::HaveProgram;
+using navmisc::testutil::RunCommand;
+using navmisc::testutil::ShellQuote;
 
 }  // namespace navmisc::exporttest

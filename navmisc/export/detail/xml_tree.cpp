@@ -26,6 +26,12 @@ void XmlNode::SetText(double value) {
 }
 
 void XmlNode::Render(std::wstring& out) const {
+  RenderStart(out);
+  for (const auto& child : children_) child->Render(out);
+  RenderEnd(out);
+}
+
+void XmlNode::RenderStart(std::wstring& out) const {
   out += L'<';
   out += name_;
   for (size_t i = 0; i < attributes_.size(); ++i) {
@@ -37,7 +43,9 @@ void XmlNode::Render(std::wstring& out) const {
   }
   out += L'>';
   if (text_) out += *text_;
-  for (const auto& child : children_) child->Render(out);
+}
+
+void XmlNode::RenderEnd(std::wstring& out) const {
   if (name_.empty() || name_.back() != L'/') {
     out += L"</";
     out += name_;

@@ -29,9 +29,12 @@ class XmlNode {
   // Appends "<name attrs>", the text, the children and "</name>\n" (no end tag when the name
   // ends with "/"). Nothing is escaped: the values are numbers, times and fixed words.
   virtual void Render(std::wstring& out) const;
+  // The two halves of Render around the children, for a caller that produces a long run of
+  // children one at a time instead of holding them all: "<name attrs>" and the text, then the
+  // end tag.
+  void RenderStart(std::wstring& out) const;
+  void RenderEnd(std::wstring& out) const;
 
-  const std::wstring& name() const { return name_; }
-  const std::vector<std::pair<std::wstring, std::wstring>>& attributes() const { return attributes_; }
   const std::vector<std::unique_ptr<XmlNode>>& children() const { return children_; }
 
  private:
