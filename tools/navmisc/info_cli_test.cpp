@@ -1,0 +1,93 @@
+// navmisc profile, templates and timezone, run as a user runs them.
+#include <gtest/gtest.h>
+
+#include <string>
+
+#include "navmisc/records/user_profile.h"
+#include "testutil.h"
+
+namespace {
+
+using navmisc::testutil::CommandResult;
+using navmisc::testutil::DataRootScope;
+using navmisc::testutil::RunCommand;
+using navmisc::testutil::ShellQuote;
+using navmisc::testutil::TempDir;
+
+// `ENV navmisc ARGS`, standard error joined to standard output.
+CommandResult Tool(const std::string& env, const std::string& args) {
+  return RunCommand(env + " " + ShellQuote(NAVMISC_TOOL_PATH) + " " + args + " 2>&1 </dev/null");
+}
+
+bool Shows(const CommandResult& r, const std::string& text) { return r.out.find(text) != std::string::npos; }
+
+TEST(InfoCommands, TimeZoneFollowsTheZoneDatabase) {
+  const struct {
+    const char* zone;
+    const char* offset;
+    const char* daylight;
+  } cases[] = {
+      {"Asia/Taipei", "28800 s", "Daylight saving: no"},
+      {"Europe/Berlin", "", "Daylight saving: yes"},  // offset depends on today's date
+      {"UTC", "Offset from UTC: 0 s", "Daylight saving: no"},
+      {"America/Sao_Paulo", "-10800 s", "Daylight saving: no"},  // gave up daylight saving in 2019
+  };
+  for (const auto& c : cases) {
+    const CommandResult r = Tool(std::string("TZ=") + c.zone, "timezone");
+    EXPECT_EQ(r.status, 0) << c.zone << "\n" << r.out;
+    EXPECT_TRUE(Shows(r, c.offset)) << c.zone << "\n" << r.out;
+    EXPECT_TRUE(Shows(r, c.daylight)) << c.zone << "\n" << r.out;
+  }
+  EXPECT_EQ(Tool("", "timezone extra").status, 2);
+}
+
+TEST(InfoCommands, ProfileShowsWhatTheLibraryWrote) {
+  TempDir root;
+  const std::string prefix = "--data-root " + ShellQuote(root.path().ToUtf8());
+
+  // A root nobody wrote to reads as the defaults, and has no weight history to ask about.
+  CommandResult r = Tool("", prefix + " profile --app sport");
+  EXPECT_EQ(r.status, 0) << r.out;
+  EXPECT_TRUE(Shows(r, "170 cm, 60 kg")) << r.out;
+  EXPECT_TRUE(Shows(r, "mode 1, style 2")) << r.out;
+  r = Tool("", prefix + " profile --app sport --on 05/01/2024");
+  EXPECT_EQ(r.status, 1) << r.out;
+  EXPECT_TRUE(Shows(r, "no weight history")) << r.out;
+
+  {
+    DataRootScope scope(root.path());
+    USER_MAP_INFO sport(GPS_APP_SPORT);
+    sport.name = L"Zoë";
+    sport.male = false;
+    sport.SetWeightHeight(1, 15, 2024, 58.5, 168);
+    sport.SetWeightHeight(6, 1, 2024, 61, 168);
+    ASSERT_TRUE(sport.WriteInfo());
+  }
+  r = Tool("", prefix + " profile --app sport --on 05/31/2024");
+  EXPECT_EQ(r.status, 0) << r.out;
+  EXPECT_TRUE(Shows(r, "Zoë (female)")) << r.out;
+  EXPECT_TRUE(Shows(r, "2 weight entries")) << r.out;
+  EXPECT_TRUE(Shows(r, "On 05/31/2024:   58.5 kg, 168 cm")) << r.out;
+  r = Tool("", prefix + " profile --app sport --on 06/01/2024");
+  EXPECT_TRUE(Shows(r, "61 kg, 168 cm")) << r.out;
+  // Another application's profile stays untouched.
+  EXPECT_FALSE(Shows(Tool("", prefix + " profile --app trip"), "Zoë"));
+
+  EXPECT_EQ(Tool("", prefix + " profile --app bike").status, 2);
+  EXPECT_EQ(Tool("", prefix + " profile --on 13/01/2024").status, 2);
+}
+
+TEST(InfoCommands, TemplatesComeFromTheCatalogueBesideTheProgram) {
+  CommandResult r = Tool("", "templates");
+  ASSERT_EQ(r.status, 0) << r.out;
+  EXPECT_TRUE(Shows(r, "Panorama")) << r.out;
+  EXPECT_TRUE(Shows(r, "style 102 (wide)")) << r.out;
+  EXPECT_TRUE(Shows(r, "/Templates/classic/thumb.png")) << r.out;
+  // A translated name where the catalogue has one, the default text where it has not.
+  r = Tool("", "templates --language fr");
+  ASSERT_EQ(r.status, 0) << r.out;
+  EXPECT_TRUE(Shows(r, "Journal classique")) << r.out;
+  EXPECT_TRUE(Shows(r, "Panorama")) << r.out;
+}
+
+}  // namespace
