@@ -190,12 +190,12 @@ TEST(Mapping, PlacementPrefersTimeThenPositionThenClears) {
 TEST(Mapping, PhotoAndTrackListsStayInOrder) {
   // Inserted in this order (name, placed, playback time, original time); equal keys go before
   // the photos already there.
-  const std::tuple<const char*, bool, int32_t, int32_t> specs[] = {
+  const std::tuple<const char*, bool, int32_t, int32_t> shapes[] = {
       {"P1", true, 100, 0}, {"U1", false, 0, 5}, {"P2", true, 50, 0}, {"N1", true, 0, 30},
       {"P3", true, 100, 0}, {"N2", true, 0, 10}, {"U2", false, 0, 1}, {"U3", false, 0, 5}};
   std::vector<std::unique_ptr<PHOTO_ITEM_INFO>> photos;
   CPtrList list;
-  for (const auto& [name, placed, playback, original] : specs) {
+  for (const auto& [name, placed, playback, original] : shapes) {
     photos.push_back(std::make_unique<PHOTO_ITEM_INFO>());
     PHOTO_ITEM_INFO& photo = *photos.back();
     photo.photoId = CString::FromUtf8(name);

@@ -18,15 +18,15 @@ using navmisc::testing::ProductScope;
 using navmisc::testing::OptimizeTripLiterally;
 constexpr int kKept = WAYPOINT_ITEM_INFO::kFlagKept;
 
-struct TrackSpec {
+struct TrackShape {
   uint32_t seed;
   int points;
 };
 
-std::unique_ptr<BLOG_ITEM_INFO> MakeTrip(const std::vector<TrackSpec>& specs,
+std::unique_ptr<BLOG_ITEM_INFO> MakeTrip(const std::vector<TrackShape>& shapes,
                                          const wchar_t* folder = L"OPT") {
   auto trip = std::make_unique<BLOG_ITEM_INFO>(GPS_APP_TRIP, folder, 0);
-  for (const TrackSpec& s : specs) {
+  for (const TrackShape& s : shapes) {
     auto* track = new TRACK_ITEM_INFO(trip.get());
     navmisc::testing::AppendNoisyTrack(track->points, s.seed, s.points);
     trip->tracks.AddTail(track);
@@ -64,7 +64,7 @@ void ExpectSameLevels(BLOG_ITEM_INFO& a, BLOG_ITEM_INFO& b, const std::string& w
 // The one-pass levels against a separate Smooth run for every level.
 TEST(OptimizeWaypoint, LevelsEqualTheLiteralMethod) {
   const struct {
-    std::vector<TrackSpec> tracks;
+    std::vector<TrackShape> tracks;
     GPS_APP_PROG_TYPE product;
   } cases[] = {
       {{{1, 3000}}, GPS_APP_TRIP},
@@ -144,8 +144,8 @@ TEST(OptimizeWaypoint, OffKeepsTheLevelsAndRecomputesTheDisplayLevel) {
 }
 
 TEST(OptimizeWaypoint, CancelDuringSmoothingStopsAtOnce) {
-  const std::vector<TrackSpec> specs = {{21, 2000}, {22, 500}, {23, 300}};
-  auto trip = MakeTrip(specs), literal = MakeTrip(specs);
+  const std::vector<TrackShape> shapes = {{21, 2000}, {22, 500}, {23, 300}};
+  auto trip = MakeTrip(shapes), literal = MakeTrip(shapes);
   for (BLOG_ITEM_INFO* t : {trip.get(), literal.get()}) {
     t->optLevel = 42;
     for (TRACK_ITEM_INFO* track : TracksOf(t->tracks)) {
