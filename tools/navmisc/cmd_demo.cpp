@@ -106,9 +106,9 @@ int CmdDemo(Args& args) {
     help += t->helpPoints.GetCount();
   }
   std::printf("  (tracker day: %ld cell fixes, %ld help points)\n", cells, help);
-  std::printf("\nTry: navmisc --data-root %s trips\n", root.c_str());
   DemoGeometry();
   DemoExports(root);
+  std::printf("\nTry: navmisc --data-root %s trips\n", root.c_str());
   return 0;
 }
 
