@@ -4,41 +4,27 @@
 
 #include <memory>
 #include <regex>
+#include <string>
+#include <tuple>
 
 #include "navmisc/platform/atomic_file.h"
 #include "navmisc/platform/files.h"
 #include "navmisc/platform/resources.h"
-#include "navmisc/platform/settings.h"
-#include "navmisc/records/user_profile.h"
-#include "testutil.h"
+#include "record_fixture.h"
 
-using navmisc::testutil::DataRootScope;
+using navmisc::testutil::NewPoint;
 using navmisc::testutil::ReadFileBytes;
-using navmisc::testutil::TempDir;
 using navmisc::testutil::WriteFileBytes;
 
 namespace {
 
-class TripRecord : public ::testing::Test {
+class TripRecord : public navmisc::testutil::RecordTest {
  protected:
-  void SetUp() override {
-    for (auto* p : {&g_TripMapInfo, &g_SportMapInfo, &g_TrackerMapInfo, &g_WhereMapInfo}) p->Reset();
+  TripRecord() {
     WriteFileBytes(root_ / L"strings.ini", "[STRINGS]\n9616=Journey\n");
     navmisc::SetResourceFile(root_ / L"strings.ini");
   }
-  void TearDown() override {
-    for (auto* p : {&g_TripMapInfo, &g_SportMapInfo, &g_TrackerMapInfo, &g_WhereMapInfo}) p->Reset();
-    navmisc::SetResourceFile(L"");
-    navmisc::testing::FailAtomicWritesAfter(-1);
-  }
-  static WAYPOINT_ITEM_INFO* Point(int32_t time, double lat, double lon, int32_t type = 0) {
-    auto* p = new WAYPOINT_ITEM_INFO(nullptr);
-    p->time = time;
-    p->latitude = lat;
-    p->longitude = lon;
-    p->type = type;
-    return p;
-  }
+  ~TripRecord() override { navmisc::SetResourceFile(L""); }
   // A trip with two tracks, a runner and a photo on the second track, saved.
   std::unique_ptr<BLOG_ITEM_INFO> SavedTrip() {
     auto trip = std::make_unique<BLOG_ITEM_INFO>(GPS_APP_TRIP, nullptr, 3);
@@ -46,7 +32,8 @@ class TripRecord : public ::testing::Test {
       auto* track = new TRACK_ITEM_INFO(trip.get());
       track->description = t ? L"Back" : L"Out";
       track->runner = L"R1";
-      for (int i = 0; i < 3; ++i) track->points.AddTail(Point(1000 + 100 * t + i, 25 + i * 0.001, 121));
+      for (int i = 0; i < 3; ++i)
+        track->points.AddTail(NewPoint(1000 + 100 * t + i, 25 + i * 0.001, 121));
       trip->tracks.AddTail(track);
     }
     auto* runner = new RUNNER_ITEM_INFO;
@@ -69,9 +56,6 @@ class TripRecord : public ::testing::Test {
     trip->WriteAllWaypoint(1, nullptr, nullptr);
     return trip;
   }
-
-  TempDir root_;
-  DataRootScope scope_{root_.path()};
 };
 
 TEST_F(TripRecord, NewTripGetsAnIdFolderNameAndDefaults) {
@@ -83,12 +67,10 @@ TEST_F(TripRecord, NewTripGetsAnIdFolderNameAndDefaults) {
   EXPECT_EQ(trip.GetResourcePath(), PathJoin(PathJoin(root_.path(), L"Resource"), trip.tripId));
   EXPECT_TRUE(std::regex_match(trip.name.ToUtf8(), std::regex("Journey_[0-9]{14}"))) << trip.name.ToUtf8();
   EXPECT_EQ(trip.fileName, trip.name);
-  EXPECT_TRUE(trip.optOptimize && trip.optRevise && trip.optRedundance);
-  EXPECT_EQ(trip.displayType, 2);
-  EXPECT_EQ(trip.playbackSpeed, 60);
-  EXPECT_EQ(trip.tempMode, 4);
-  EXPECT_EQ(trip.tempStyle, 7);
-  EXPECT_EQ(trip.zoom, 10);
+  // Mode and style come from the application's profile.
+  EXPECT_EQ(std::tuple(trip.optOptimize, trip.optRevise, trip.optRedundance, trip.displayType,
+                       trip.playbackSpeed, int{trip.tempMode}, int{trip.tempStyle}, int{trip.zoom}),
+            std::tuple(true, true, true, 2, 60, 4, 7, 10));
   EXPECT_FALSE(trip.languageId.IsEmpty());
 
   BLOG_ITEM_INFO where(GPS_APP_WHEREAMI, nullptr, 0);
@@ -128,10 +110,19 @@ TEST_F(TripRecord, SettingsFileRoundTripAndCounters) {
 
   // The photo's height key is written in lower case and read back all the same.
   const std::string text = ReadFileBytes(trip->GetBlogItemProfilePathName());
-  EXPECT_NE(text.find("dimension_h0="), std::string::npos);
-  EXPECT_NE(text.find("[SECTION_PH(0)]"), std::string::npos);
-  EXPECT_NE(text.find("[SECTION_TK(1)]"), std::string::npos);
-  EXPECT_NE(text.find("[SECTION_RN(0)]"), std::string::npos);
+  for (const char* part : {"dimension_h0=", "[SECTION_PH(0)]", "[SECTION_TK(1)]", "[SECTION_RN(0)]"})
+    EXPECT_NE(text.find(part), std::string::npos) << part;
+  // The trip's own keys, in the order written.
+  const std::string head = text.substr(0, text.find("\n\n"));
+  std::string keys;
+  for (size_t at = head.find('\n'); at != std::string::npos; at = head.find('\n', at + 1))
+    keys += head.substr(at + 1, head.find('=', at) - at - 1) + " ";
+  EXPECT_EQ(keys,
+            "trip_item_id name file_name description cover_page_id language_id create_time version "
+            "opt_optimize opt_revise opt_redundance opt_level time_zone day_light time_zone_shift "
+            "display_type playback_speed temp_mode temp_style sub_sample correction zoom net_dirty "
+            "public server_id net_url tags runner_item_info_count track_item_info_count "
+            "photo_item_info_count ");
 }
 
 TEST_F(TripRecord, ReaderDefaultsDifferFromANewTrip) {
@@ -144,31 +135,25 @@ TEST_F(TripRecord, ReaderDefaultsDifferFromANewTrip) {
                  "1,0.0,0.0,0,0,0,-1,0,0\r\n2,1.0,1.0,0,0,-2,-1,0,0\r\n3,1.0,1.1,0,0,-1,-1,0,0\r\n"
                  "4,1.0,1.2,0,0,5,-1,0,0\r\n");
   ASSERT_EQ(trip.ReadInfo(), 1);
-  EXPECT_EQ(trip.fileName, L"Walk");
-  EXPECT_FALSE(trip.optOptimize);
-  EXPECT_EQ(trip.displayType, 0);
-  EXPECT_FALSE(trip.netDirty);
-  EXPECT_FALSE(trip.netPublic);
   auto* track = static_cast<TRACK_ITEM_INFO*>(trip.tracks.GetHead());
-  EXPECT_EQ(track->color, 16711935u);
-  EXPECT_EQ(track->transparency, 10);
+  EXPECT_EQ(std::tuple(trip.fileName.str(), trip.optOptimize, trip.optRevise, trip.displayType,
+                       trip.netDirty, trip.netPublic, track->color, track->transparency),
+            std::tuple(L"Walk", false, false, 0, false, false, 16711935u, 10));
 
-  long total = 0, kept = 0;
-  EXPECT_EQ(trip.GetTrackInfo(total, kept), 1);
-  EXPECT_EQ(total, 3) << "the point at 0/0 is not counted";
-  EXPECT_EQ(kept, 3) << "optimisation off keeps everything";
-  trip.optOptimize = true;
-  trip.optRevise = true;
-  trip.optRedundance = true;
-  trip.optLevel = 1;
-  trip.GetTrackInfo(total, kept);
-  EXPECT_EQ(kept, 1);
-  trip.optRevise = false;
-  trip.GetTrackInfo(total, kept);
-  EXPECT_EQ(kept, 2);
-  trip.optRedundance = false;
-  trip.GetTrackInfo(total, kept);
-  EXPECT_EQ(kept, 3);
+  // The point at 0/0 is never counted; levels -2 and -1 and 5 make the rest.
+  const struct {
+    bool optimise, revise, redundance;
+    long kept;
+  } cases[] = {{false, true, true, 3}, {true, true, true, 1}, {true, false, true, 2},
+               {true, false, false, 3}, {true, true, false, 2}};
+  for (const auto& c : cases) {
+    std::tie(trip.optOptimize, trip.optRevise, trip.optRedundance, trip.optLevel) =
+        std::tuple(c.optimise, c.revise, c.redundance, 1);
+    long total = 0, kept = 0;
+    EXPECT_EQ(trip.GetTrackInfo(total, kept), 1);
+    EXPECT_EQ(total, 3);
+    EXPECT_EQ(kept, c.kept) << c.optimise << c.revise << c.redundance;
+  }
 
   // Without tracks: the extreme times.
   BLOG_ITEM_INFO empty(GPS_APP_TRIP, L"EMPTY", 0);
