@@ -98,23 +98,17 @@ TEST(WaypointRecord, EqualityComparesTheTrackFieldsOnly) {
 
 TEST(SampleRecords, DefaultsMarkAnEmptyRecordAndCopiesAreWhole) {
   HEARTRATE_ITEM_INFO hr(nullptr);
-  EXPECT_EQ(hr.time, -1);
-  EXPECT_EQ(hr.UsedCount(), 0);
+  EXPECT_EQ(std::tuple(hr.time, hr.UsedCount()), std::tuple(-1, 0));
   hr.values[0] = 60;
   hr.values[1] = 61;
   HEARTRATE_ITEM_INFO hrCopy(&hr);
-  EXPECT_EQ(hrCopy.UsedCount(), 2);
-  EXPECT_EQ(hrCopy.values[1], 61);
-
-  CYCLING_CADENCE_RPM_ITEM_INFO cs(nullptr);
+  EXPECT_EQ(std::tuple(hrCopy.UsedCount(), int{hrCopy.values[1]}), std::tuple(2, 61));
+  const CYCLING_CADENCE_RPM_ITEM_INFO cs(nullptr);
   for (uint8_t v : cs.values) EXPECT_EQ(v, 255);
-
   WHEEL_SPEED_ITEM_INFO ws(nullptr);
-  EXPECT_EQ(ws.UsedCount(), 0);
   for (double v : ws.values) EXPECT_EQ(v, -1.0);
   ws.values[0] = 3.5;
-  WHEEL_SPEED_ITEM_INFO wsCopy(&ws);
-  EXPECT_EQ(wsCopy.UsedCount(), 1);
+  EXPECT_EQ(WHEEL_SPEED_ITEM_INFO(&ws).UsedCount(), 1);
 }
 
 TEST(PhotoRecord, UrlDefaultsAndNewIds) {

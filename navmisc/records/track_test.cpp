@@ -2,6 +2,7 @@
 
 #include <gtest/gtest.h>
 
+#include <cmath>
 #include <cstdio>
 #include <cstring>
 #include <memory>
@@ -106,43 +107,38 @@ TEST_F(TrackFiles, CorruptLinesGiveDefaultFieldsAndLineEndsMayBeLf) {
                      longLine + "\n"  // read in pieces of 255 characters
                  "300,+1e2,-0x1p1,inf");
   track.ReadAllWaypoint(1);
-  ASSERT_EQ(track.points.GetCount(), 7);
+  // time, latitude, longitude, altitude, speed, type, course, extra values A and B
+  using Fields = std::tuple<int32_t, double, double, double, int32_t, int32_t, int32_t, int32_t,
+                            int32_t>;
+  const Fields expected[] = {
+      {100, 1.5, 2.5, 3.5, 4, 5, 6, 7, 8},
+      {200, 1.5, 0, 0, 0, 0, -1, 0, 0},
+      {-1, 0, 0, 0, 0, 0, -1, 0, 0},
+      {-1, 0, 0, 0, 0, 0, -1, 0, 0},
+      {-1, 0, 0, 0, 0, 0, -1, 0, 0},  // 255 digits overflow like the C reader
+      {-1, 0, 0, 0, 0, 0, -1, 0, 0},  // and so do the 45 left over
+      {300, 100, -2, INFINITY, 0, 0, -1, 0, 0},
+  };
+  ASSERT_EQ(track.points.GetCount(), static_cast<int>(std::size(expected)));
   POSITION pos = track.points.GetHeadPosition();
-  auto next = [&] { return static_cast<WAYPOINT_ITEM_INFO*>(track.points.GetNext(pos)); };
-  auto* a = next();
-  EXPECT_EQ(a->time, 100);
-  EXPECT_EQ(a->extraB, 8);
-  auto* b = next();
-  EXPECT_EQ(b->time, 200);
-  EXPECT_EQ(b->latitude, 1.5);
-  EXPECT_EQ(b->longitude, 0.0);
-  EXPECT_EQ(b->speed, 0);
-  EXPECT_EQ(b->course, -1);
-  auto* c = next();
-  EXPECT_EQ(c->time, -1);
-  EXPECT_EQ(next()->time, -1);
-  EXPECT_EQ(next()->time, -1) << "a run of 255 digits overflows like the C reader";
-  next();
-  auto* last = next();
-  EXPECT_EQ(last->time, 300);
-  EXPECT_EQ(last->latitude, 100.0);
-  EXPECT_EQ(last->longitude, -2.0);
-  EXPECT_TRUE(std::isinf(last->altitude));
+  for (const Fields& want : expected) {
+    const auto* p = static_cast<WAYPOINT_ITEM_INFO*>(track.points.GetNext(pos));
+    EXPECT_EQ(Fields(p->time, p->latitude, p->longitude, p->altitude, p->speed, p->type, p->course,
+                     p->extraA, p->extraB),
+              want);
+  }
 
   // Side files of a short line leave the missing values at their defaults.
   WriteFileBytes(track.GetHeartRateFilePathName(), "7,80\n,\n");
   track.ReadAllWaypoint(1);
   ASSERT_EQ(track.heartRates.GetCount(), 2);
   auto* hr = static_cast<HEARTRATE_ITEM_INFO*>(track.heartRates.GetHead());
-  EXPECT_EQ(hr->time, 7);
-  EXPECT_EQ(hr->values[0], 80);
-  EXPECT_EQ(hr->values[1], 255);
+  EXPECT_EQ(std::tuple(hr->time, int{hr->values[0]}, int{hr->values[1]}), std::tuple(7, 80, 255));
 }
 
 TEST_F(TrackFiles, LoadingRulesOfTheApplicationType) {
-  g_TrackerMapInfo.timeZoneShiftOn = true;
-  g_TrackerMapInfo.timeZoneShift = 3600;
-  g_TrackerMapInfo.dayLight = true;
+  std::tie(g_TrackerMapInfo.timeZoneShiftOn, g_TrackerMapInfo.timeZoneShift,
+           g_TrackerMapInfo.dayLight) = std::tuple(true, 3600, true);
 
   auto tracker = MakeTrip(GPS_APP_TRACKER);
   TRACK_ITEM_INFO t(tracker.get());
