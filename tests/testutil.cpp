@@ -52,15 +52,13 @@ ProgPathScope::ProgPathScope(const wchar_t* folder) : previous_(g_szExecProgPath
 ProgPathScope::~ProgPathScope() { SetSharedText(g_szExecProgPath, previous_); }
 
 TzScope::TzScope(const char* tz) {
-  const char* old = getenv("TZ");
-  had_ = old != nullptr;
-  if (had_) old_ = old;
+  if (const char* old = getenv("TZ")) old_ = old;
   setenv("TZ", tz, 1);
   tzset();
 }
 
 TzScope::~TzScope() {
-  if (had_) setenv("TZ", old_.c_str(), 1);
+  if (old_) setenv("TZ", old_->c_str(), 1);
   else unsetenv("TZ");
   tzset();
 }

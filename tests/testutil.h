@@ -3,6 +3,7 @@
 
 #include <gtest/gtest.h>
 
+#include <optional>
 #include <ostream>
 #include <string>
 
@@ -58,12 +59,9 @@ class TzScope {
  public:
   explicit TzScope(const char* tz);
   ~TzScope();
-  TzScope(const TzScope&) = delete;
-  TzScope& operator=(const TzScope&) = delete;
 
  private:
-  bool had_ = false;
-  std::string old_;
+  std::optional<std::string> old_;
 };
 
 // Switches every locale category to `name` for the lifetime of the object; ok() is false when
@@ -72,8 +70,6 @@ class LocaleScope {
  public:
   explicit LocaleScope(const char* name);
   ~LocaleScope();
-  LocaleScope(const LocaleScope&) = delete;
-  LocaleScope& operator=(const LocaleScope&) = delete;
   bool ok() const { return ok_; }
 
  private:
