@@ -22,7 +22,8 @@ class RecordTest : public ::testing::Test {
     navmisc::testing::FailAtomicWritesAfter(-1);
   }
   static void ResetProfiles() {
-    for (auto* p : {&g_TripMapInfo, &g_SportMapInfo, &g_TrackerMapInfo, &g_WhereMapInfo}) p->Reset();
+    for (auto* p : {&g_TripMapInfo, &g_SportMapInfo, &g_TrackerMapInfo, &g_WhereMapInfo})
+      p->Reset();
   }
 
   TempDir root_;

@@ -10,7 +10,9 @@
 #include "navmisc/platform/cstring.h"
 
 // Failure messages show a CString as its text.
-inline void PrintTo(const CString& s, std::ostream* os) { *os << ::testing::PrintToString(s.str()); }
+inline void PrintTo(const CString& s, std::ostream* os) {
+  *os << ::testing::PrintToString(s.str());
+}
 
 namespace navmisc::testutil {
 

@@ -35,7 +35,8 @@ std::vector<std::string> FolderEntries(const CString& folder) {
 // The permission bits of a file, -1 when it cannot be examined.
 int Mode(const CString& path) {
   struct stat st;
-  return stat(navmisc::NativePath(path).c_str(), &st) == 0 ? static_cast<int>(st.st_mode & 0777) : -1;
+  if (stat(navmisc::NativePath(path).c_str(), &st) != 0) return -1;
+  return static_cast<int>(st.st_mode & 0777);
 }
 
 // Opens `bytes` written to a file for reading.

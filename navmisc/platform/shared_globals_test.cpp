@@ -45,7 +45,8 @@ TEST(SharedGlobalsChild, DISABLED_Role) {
               std::tuple(0, L'\0', 0, 0));
     navmisc::SetSharedText(g_szAppDataPath, L"/home/user/.local/share/navmisc");
     std::tie(g_nProductId, g_devConfig.nInterval, g_devConfig11.NAVI[28799], g_dDeviceVersion,
-             g_bDeviceConnected, g_nScanProgress) = std::tuple(GPS_APP_SPORT, 5, 0xAB, 1.25, true, 77);
+             g_bDeviceConnected, g_nScanProgress) =
+        std::tuple(GPS_APP_SPORT, 5, 0xAB, 1.25, true, 77);
   } else if (role == "mark") {
     ASSERT_EQ(origin, SharedBlockOrigin::kNamedObject);
     g_devConfig11.NAVI[std::atoi(std::getenv("NAVMISC_TEST_SHM_INDEX"))] = 1;

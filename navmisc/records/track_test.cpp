@@ -163,8 +163,7 @@ TEST_F(TrackFiles, LoadingRulesOfTheApplicationType) {
   other.ReadAllWaypoint(0);
   EXPECT_TRUE(other.cellFixes.IsEmpty());
   EXPECT_EQ(static_cast<WAYPOINT_ITEM_INFO*>(other.points.GetHead())->time, 5) << "no shift outside its profile";
-  auto* fix = new BASE_ITEM_INFO(nullptr);
-  other.cellFixes.AddTail(fix);
+  other.cellFixes.AddTail(new BASE_ITEM_INFO(nullptr));
   other.WriteAllWaypoint(1, nullptr, nullptr);
   EXPECT_EQ(ReadFileBytes(other.GetCellIDFilePathName()), "keep me\r\n");
 
@@ -185,8 +184,7 @@ TEST_F(TrackFiles, StoppedWritesShortenAndFailedWritesKeepTheOldFile) {
   const std::string full = ReadFileBytes(track.GetFilePathName());
 
   // A disk that fills up mid-write leaves the previous file as it was.
-  auto* extra = NewPoint(99, 3.0, 4.0);
-  track.points.AddTail(extra);
+  track.points.AddTail(NewPoint(99, 3.0, 4.0));
   navmisc::testing::FailAtomicWritesAfter(10);
   track.WriteAllWaypoint(1, nullptr, nullptr);
   navmisc::testing::FailAtomicWritesAfter(-1);

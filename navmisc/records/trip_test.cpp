@@ -98,7 +98,8 @@ TEST_F(TripRecord, SettingsFileRoundTripAndCounters) {
   EXPECT_EQ(back.GetUTCEndTime(), 1102);
 
   // The photo's height key is written in lower case and read back all the same.
-  for (const char* part : {"dimension_h0=", "[SECTION_PH(0)]", "[SECTION_TK(1)]", "[SECTION_RN(0)]"})
+  for (const char* part :
+       {"dimension_h0=", "[SECTION_PH(0)]", "[SECTION_TK(1)]", "[SECTION_RN(0)]"})
     EXPECT_NE(text.find(part), std::string::npos) << part;
   // The trip's own keys, in the order written.
   const std::string head = text.substr(0, text.find("\n\n"));

@@ -51,7 +51,8 @@ TEST_F(Profile, MissingFilesReadAsDefaults) {
   EXPECT_EQ(std::tuple(p.localize.str(), p.height, p.weight, p.male, p.metric, p.tutorial,
                        p.verEnableCheck, p.verCheckPeriodTime, p.tempMode, p.tempStyle,
                        p.autoLaunch, p.geotagCallEditor, p.timeZoneShiftOn),
-            std::tuple(L"ENG", 170.0, 60.0, true, true, true, true, 604800, 1, 2, true, true, false));
+            std::tuple(L"ENG", 170.0, 60.0, true, true, true, true, 604800, 1, 2, true, true,
+                       false));
   EXPECT_TRUE(p.weightHeights.IsEmpty());
   EXPECT_EQ(p.GetProfilePathName(),
             PathJoin(PathJoin(root_.path(), L"Resource"), L"USER_MAP_INFO.INI"));
