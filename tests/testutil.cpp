@@ -2,7 +2,9 @@
 
 #include <stdlib.h>
 #include <sys/wait.h>
+#include <time.h>
 
+#include <clocale>
 #include <cstdio>
 
 #include <fstream>
@@ -42,6 +44,30 @@ DataRootScope::DataRootScope(const wchar_t* root) : previous_(g_szAppDataPath) {
 }
 
 DataRootScope::~DataRootScope() { SetSharedText(g_szAppDataPath, previous_); }
+
+ProgPathScope::ProgPathScope(const wchar_t* folder) : previous_(g_szExecProgPath) {
+  SetSharedText(g_szExecProgPath, folder);
+}
+
+ProgPathScope::~ProgPathScope() { SetSharedText(g_szExecProgPath, previous_); }
+
+TzScope::TzScope(const char* tz) {
+  if (const char* old = getenv("TZ")) old_ = old;
+  setenv("TZ", tz, 1);
+  tzset();
+}
+
+TzScope::~TzScope() {
+  if (old_) setenv("TZ", old_->c_str(), 1);
+  else unsetenv("TZ");
+  tzset();
+}
+
+LocaleScope::LocaleScope(const char* name) : old_(std::setlocale(LC_ALL, nullptr)) {
+  ok_ = std::setlocale(LC_ALL, name) != nullptr;
+}
+
+LocaleScope::~LocaleScope() { std::setlocale(LC_ALL, old_.c_str()); }
 
 CommandResult RunCommand(const std::string& command) {
   CommandResult r;

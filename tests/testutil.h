@@ -1,9 +1,18 @@
 // Helpers shared by the tests.
 #pragma once
 
+#include <gtest/gtest.h>
+
+#include <optional>
+#include <ostream>
 #include <string>
 
 #include "navmisc/platform/cstring.h"
+
+// Failure messages show a CString as its text.
+inline void PrintTo(const CString& s, std::ostream* os) {
+  *os << ::testing::PrintToString(s.str());
+}
 
 namespace navmisc::testutil {
 
@@ -34,6 +43,40 @@ class DataRootScope {
 
  private:
   CString previous_;
+};
+
+// Points the program folder (where the strings file and the templates are looked for) at
+// `folder` for the lifetime of the object.
+class ProgPathScope {
+ public:
+  explicit ProgPathScope(const wchar_t* folder);
+  ~ProgPathScope();
+
+ private:
+  CString previous_;
+};
+
+// Sets TZ (and tzset) for the lifetime of the object, then puts back what was there.
+class TzScope {
+ public:
+  explicit TzScope(const char* tz);
+  ~TzScope();
+
+ private:
+  std::optional<std::string> old_;
+};
+
+// Switches every locale category to `name` for the lifetime of the object; ok() is false when
+// that locale is not installed (the locale then stays as it was).
+class LocaleScope {
+ public:
+  explicit LocaleScope(const char* name);
+  ~LocaleScope();
+  bool ok() const { return ok_; }
+
+ private:
+  std::string old_;
+  bool ok_ = false;
 };
 
 // Runs a shell command: its exit status (-1 when it did not end normally) and what it wrote on

@@ -5,6 +5,7 @@
 
 #include <chrono>
 #include <string>
+#include <tuple>
 #include <vector>
 
 #include <gtest/gtest.h>
@@ -90,14 +91,14 @@ TEST(GetContent, Patterns) {
     WriteFileBytes(tmp / name, "");
   ASSERT_TRUE(MakeDir(tmp / L"folder.txt"));
 
+  const std::vector<std::wstring> all = {L".hidden",    L"a.TXT",  L"b.txt",    L"c.txt.bak",
+                                         L"folder.txt", L"noext",  L"x[1].jpg", L"é.gpx"};
   struct Case {
     const wchar_t* pattern;
     std::vector<std::wstring> expected;
   } cases[] = {
-      {L"*.*", {L".hidden", L"a.TXT", L"b.txt", L"c.txt.bak", L"folder.txt", L"noext",
-                L"x[1].jpg", L"é.gpx"}},
-      {L"*", {L".hidden", L"a.TXT", L"b.txt", L"c.txt.bak", L"folder.txt", L"noext", L"x[1].jpg",
-              L"é.gpx"}},
+      {L"*.*", all},
+      {L"*", all},
       {L"*.txt", {L"a.TXT", L"b.txt", L"folder.txt"}},
       {L"?.txt", {L"a.TXT", L"b.txt"}},
       {L"?.gpx", {L"é.gpx"}},
@@ -137,23 +138,24 @@ TEST(Files, MakeDirCopyDeleteAndStatus) {
   ASSERT_EQ(::stat(NativePath(tmp / L"copy").c_str(), &st), 0);
   EXPECT_EQ(st.st_mode & 0777, 0640u);
   WriteFileBytes(tmp / L"other", "longer content");
-  EXPECT_FALSE(CopyFile(tmp / L"other", tmp / L"copy", true));
-  EXPECT_EQ(ReadFileBytes(tmp / L"copy"), "abc");
-  EXPECT_TRUE(CopyFile(tmp / L"other", tmp / L"copy", false));
-  EXPECT_EQ(ReadFileBytes(tmp / L"copy"), "longer content");
-  EXPECT_FALSE(CopyFile(tmp / L"copy", tmp / L"copy", false));  // onto itself: untouched
-  EXPECT_EQ(ReadFileBytes(tmp / L"copy"), "longer content");
+  // from, failing if the target exists, result, the target's content afterwards
+  for (const auto& [from, failIfExists, ok, content] :
+       {std::tuple{L"other", true, false, "abc"}, {L"other", false, true, "longer content"},
+        {L"copy", false, false, "longer content"}}) {  // onto itself: untouched
+    EXPECT_EQ(CopyFile(tmp / from, tmp / L"copy", failIfExists), ok) << from << failIfExists;
+    EXPECT_EQ(ReadFileBytes(tmp / L"copy"), content) << from << failIfExists;
+  }
   EXPECT_FALSE(CopyFile(tmp / L"missing", tmp / L"copy2", false));
   EXPECT_FALSE(FileExists(tmp / L"copy2"));
 
-  EXPECT_EQ(PathStatus(tmp / L"file"), 0);
-  EXPECT_EQ(PathStatus(tmp / L"missing"), 2);
-  EXPECT_EQ(PathStatus(tmp / L"file/child"), 3);
+  // Status 0: something is there (a dangling link too); 2: nothing; 3: no such folder.
   Symlink(tmp / L"missing", tmp / L"dangling");
-  EXPECT_EQ(PathStatus(tmp / L"dangling"), 0);
-  EXPECT_FALSE(FileExists(tmp / L"dangling"));
-  EXPECT_TRUE(FileExists(tmp / L"x"));
-  EXPECT_FALSE(IsDirectory(tmp / L"file"));
+  for (const auto& [name, status, exists, folder] :
+       {std::tuple{L"file", 0, true, false}, {L"x", 0, true, true}, {L"dangling", 0, false, false},
+        {L"missing", 2, false, false}, {L"file/child", 3, false, false}}) {
+    EXPECT_EQ(std::tuple(PathStatus(tmp / name), FileExists(tmp / name), IsDirectory(tmp / name)),
+              std::tuple(status, exists, folder)) << name;
+  }
 
   EXPECT_TRUE(DeleteFile(tmp / L"copy"));
   EXPECT_FALSE(DeleteFile(tmp / L"copy"));
@@ -219,11 +221,9 @@ TEST(Paths, TextHelpers) {
     EXPECT_EQ(PathFileTitle(c.path), c.title) << c.path;
     EXPECT_EQ(PathExtension(c.path), c.ext) << c.path;
   }
-  EXPECT_EQ(PathJoin(L"a", L"b"), L"a/b");
-  EXPECT_EQ(PathJoin(L"a/", L"b"), L"a/b");
-  EXPECT_EQ(PathJoin(L"a/", L"/b"), L"a/b");
-  EXPECT_EQ(PathJoin(L"", L"b"), L"b");
-  EXPECT_EQ(PathJoin(L"a", L""), L"a");
+  for (const auto& [a, b, joined] : {std::tuple{L"a", L"b", L"a/b"}, {L"a/", L"b", L"a/b"},
+                                     {L"a/", L"/b", L"a/b"}, {L"", L"b", L"b"}, {L"a", L"", L"a"}})
+    EXPECT_EQ(PathJoin(a, b), joined) << a << " + " << b;
 }
 
 TEST(Paths, IsPlainPathComponent) {

@@ -3,25 +3,13 @@
 #include <gtest/gtest.h>
 
 #include "navmisc/platform/files.h"
-#include "navmisc/platform/shared_globals.h"
 #include "testutil.h"
 
 namespace {
 
+using navmisc::testutil::ProgPathScope;
 using navmisc::testutil::TempDir;
 using navmisc::testutil::WriteFileBytes;
-
-// Points the program folder at `path` for the lifetime of the object.
-class ProgPathScope {
- public:
-  explicit ProgPathScope(const wchar_t* path) : previous_(g_szExecProgPath) {
-    navmisc::SetSharedText(g_szExecProgPath, path);
-  }
-  ~ProgPathScope() { navmisc::SetSharedText(g_szExecProgPath, previous_); }
-
- private:
-  CString previous_;
-};
 
 TEST(LoadResString, ReadsTextsByNumber) {
   TempDir tmp;

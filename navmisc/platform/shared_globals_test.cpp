@@ -1,7 +1,6 @@
 #include "navmisc/platform/shared_globals.h"
 
 #include <fcntl.h>
-#include <spawn.h>
 #include <sys/mman.h>
 #include <sys/stat.h>
 #include <sys/wait.h>
@@ -10,22 +9,25 @@
 #include <cstdlib>
 #include <cstring>
 #include <cwchar>
+#include <filesystem>
 #include <memory>
 #include <string>
-#include <vector>
+#include <tuple>
 
 #include <gtest/gtest.h>
 
 #include "navmisc/platform/detail/shared_block.h"
 #include "navmisc/platform/shared_memory.h"
-
-extern char** environ;
+#include "testutil.h"
 
 namespace {
 
 using navmisc::SharedMemory;
 using navmisc::detail::SharedBlockData;
 using navmisc::detail::SharedBlockOrigin;
+using navmisc::testutil::CommandResult;
+using navmisc::testutil::RunCommand;
+using navmisc::testutil::ShellQuote;
 
 // ---- the child side: runs only when started by the tests below -------------------------------
 
@@ -38,17 +40,13 @@ TEST(SharedGlobalsChild, DISABLED_Role) {
   if (role == "write") {
     ASSERT_EQ(origin, SharedBlockOrigin::kNamedObject);
     // A new object starts zeroed.
-    EXPECT_EQ(g_nProductId, 0);
-    EXPECT_EQ(g_szAppDataPath[0], L'\0');
-    EXPECT_EQ(g_devConfig.nCmdType, 0);
-    EXPECT_EQ(g_devConfig.bAccOn, 0);
-    g_nProductId = GPS_APP_SPORT;
+    EXPECT_EQ(std::tuple(int{g_nProductId}, g_szAppDataPath[0], g_devConfig.nCmdType,
+                         int{g_devConfig.bAccOn}),
+              std::tuple(0, L'\0', 0, 0));
     navmisc::SetSharedText(g_szAppDataPath, L"/home/user/.local/share/navmisc");
-    g_devConfig.nInterval = 5;
-    g_devConfig11.NAVI[28799] = 0xAB;
-    g_dDeviceVersion = 1.25;
-    g_bDeviceConnected = true;
-    g_nScanProgress = 77;
+    std::tie(g_nProductId, g_devConfig.nInterval, g_devConfig11.NAVI[28799], g_dDeviceVersion,
+             g_bDeviceConnected, g_nScanProgress) =
+        std::tuple(GPS_APP_SPORT, 5, 0xAB, 1.25, true, 77);
   } else if (role == "mark") {
     ASSERT_EQ(origin, SharedBlockOrigin::kNamedObject);
     g_devConfig11.NAVI[std::atoi(std::getenv("NAVMISC_TEST_SHM_INDEX"))] = 1;
@@ -69,37 +67,17 @@ std::string UniqueName(const char* what) {
          std::to_string(++counter);
 }
 
-// Starts this test program again, running only the child test with the given environment.
-pid_t StartChild(const std::string& shm_name, const std::string& role, int index = 0) {
-  std::vector<std::string> env;
-  for (char** e = environ; *e; ++e) {
-    if (std::strncmp(*e, "NAVMISC_SHM_NAME=", 17) != 0 &&
-        std::strncmp(*e, "NAVMISC_TEST_SHM_", 17) != 0)
-      env.emplace_back(*e);
-  }
-  env.push_back("NAVMISC_SHM_NAME=" + shm_name);
-  env.push_back("NAVMISC_TEST_SHM_ROLE=" + role);
-  env.push_back("NAVMISC_TEST_SHM_INDEX=" + std::to_string(index));
-  std::vector<char*> envp;
-  for (std::string& s : env) envp.push_back(s.data());
-  envp.push_back(nullptr);
-  std::string exe = "/proc/self/exe";
-  std::string filter = "--gtest_filter=SharedGlobalsChild.DISABLED_Role";
-  std::string disabled = "--gtest_also_run_disabled_tests";
-  char* argv[] = {exe.data(), filter.data(), disabled.data(), nullptr};
-  pid_t pid = -1;
-  if (::posix_spawn(&pid, exe.c_str(), nullptr, nullptr, argv, envp.data()) != 0) return -1;
-  return pid;
-}
-
-int WaitChild(pid_t pid) {
-  int status = 0;
-  if (pid <= 0 || ::waitpid(pid, &status, 0) != pid) return -1;
-  return WIFEXITED(status) ? WEXITSTATUS(status) : 128 + WTERMSIG(status);
-}
-
-int RunChild(const std::string& shm_name, const std::string& role) {
-  return WaitChild(StartChild(shm_name, role));
+// Runs this test program again in `count` processes started together, each running only the
+// child test, with `role`, the object's name and its own index in its environment. Status 0 when
+// every child passed; the output is theirs.
+CommandResult RunChildren(const std::string& shm_name, const std::string& role, int count = 1) {
+  const std::string child =
+      "NAVMISC_SHM_NAME=" + ShellQuote(shm_name) + " NAVMISC_TEST_SHM_ROLE=" + role +
+      " NAVMISC_TEST_SHM_INDEX=$i " + ShellQuote(std::filesystem::read_symlink("/proc/self/exe")) +
+      " --gtest_filter=SharedGlobalsChild.DISABLED_Role --gtest_also_run_disabled_tests";
+  return RunCommand("i=0; pids=; while [ $i -lt " + std::to_string(count) + " ]; do " + child +
+                    " & pids=\"$pids $!\"; i=$((i + 1)); done; failed=0;"
+                    " for p in $pids; do wait $p || failed=1; done; exit $failed");
 }
 
 // Removes the object when the test ends, however it ends.
@@ -111,7 +89,8 @@ struct Unlinker {
 TEST(SharedGlobals, SeenByOtherProcesses) {
   const std::string name = UniqueName("share");
   Unlinker unlink{name};
-  ASSERT_EQ(RunChild(name, "write"), 0);
+  const CommandResult child = RunChildren(name, "write");
+  ASSERT_EQ(child.status, 0) << child.out;
 
   // The object outlives the writer, readable only by its owner, and holds what it wrote.
   int fd = ::shm_open(name.c_str(), O_RDONLY, 0);
@@ -119,24 +98,21 @@ TEST(SharedGlobals, SeenByOtherProcesses) {
   struct stat st;
   ASSERT_EQ(::fstat(fd, &st), 0);
   ::close(fd);
-  EXPECT_EQ(st.st_mode & 0777, 0600u);
-  EXPECT_EQ(st.st_uid, ::geteuid());
-  EXPECT_EQ(static_cast<size_t>(st.st_size), sizeof(SharedBlockData));
+  EXPECT_EQ(std::tuple(st.st_mode & 0777, st.st_uid, static_cast<size_t>(st.st_size)),
+            std::tuple(0600u, ::geteuid(), sizeof(SharedBlockData)));
 
   std::error_code ec;
   SharedMemory mem = SharedMemory::OpenExisting(name, ec);
   ASSERT_TRUE(mem) << ec.message();
   const auto& block = *static_cast<const SharedBlockData*>(mem.data());
-  EXPECT_EQ(block.state, navmisc::detail::kSharedBlockReady);
-  EXPECT_EQ(block.magic, navmisc::detail::kSharedBlockMagic);
-  EXPECT_EQ(block.layoutVersion, navmisc::detail::kSharedLayoutVersion);
-  EXPECT_EQ(block.nProductId, GPS_APP_SPORT);
-  EXPECT_EQ(block.nScanProgress, 77);
+  using namespace navmisc::detail;
+  EXPECT_EQ(std::tuple(block.state, block.magic, block.layoutVersion),
+            std::tuple(kSharedBlockReady, kSharedBlockMagic, kSharedLayoutVersion));
+  EXPECT_EQ(std::tuple(int{block.nProductId}, block.nScanProgress, block.devConfig.nInterval,
+                       int{block.devConfig11.NAVI[28799]}, block.dDeviceVersion,
+                       block.bDeviceConnected),
+            std::tuple(int{GPS_APP_SPORT}, 77, 5, 0xAB, 1.25, true));
   EXPECT_STREQ(block.szAppDataPath, L"/home/user/.local/share/navmisc");
-  EXPECT_EQ(block.devConfig.nInterval, 5);
-  EXPECT_EQ(block.devConfig11.NAVI[28799], 0xAB);
-  EXPECT_EQ(block.dDeviceVersion, 1.25);
-  EXPECT_TRUE(block.bDeviceConnected);
 }
 
 TEST(SharedGlobals, ProcessesStartingTogetherInitialiseOnce) {
@@ -144,9 +120,8 @@ TEST(SharedGlobals, ProcessesStartingTogetherInitialiseOnce) {
   const std::string name = UniqueName("race");
   Unlinker unlink{name};
   constexpr int kChildren = 8;
-  pid_t pids[kChildren];
-  for (int i = 0; i < kChildren; ++i) pids[i] = StartChild(name, "mark", i);
-  for (int i = 0; i < kChildren; ++i) EXPECT_EQ(WaitChild(pids[i]), 0) << "child " << i;
+  const CommandResult children = RunChildren(name, "mark", kChildren);
+  EXPECT_EQ(children.status, 0) << children.out;
   std::error_code ec;
   SharedMemory mem = SharedMemory::OpenExisting(name, ec);
   ASSERT_TRUE(mem) << ec.message();
@@ -165,7 +140,8 @@ TEST(SharedGlobals, ForeignObjectIsLeftAlone) {
   std::error_code ec;
   EXPECT_FALSE(SharedMemory::OpenOrCreate(name, sizeof(SharedBlockData), ec));
   EXPECT_EQ(ec, std::errc::invalid_argument);
-  EXPECT_EQ(RunChild(name, "fallback"), 0);
+  const CommandResult child = RunChildren(name, "fallback");
+  EXPECT_EQ(child.status, 0) << child.out;
   char bytes[13] = {};
   ASSERT_EQ(::pread(fd, bytes, 12, 0), 12);
   EXPECT_STREQ(bytes, "foreign data");
@@ -230,7 +206,9 @@ TEST(SharedGlobals, PrivateBlockIsSharedWithForkedChildren) {
     g_nCountOfProgress = 4242;
     ::_exit(0);
   }
-  EXPECT_EQ(WaitChild(pid), 0);
+  int status = 0;
+  ASSERT_EQ(::waitpid(pid, &status, 0), pid);
+  EXPECT_TRUE(WIFEXITED(status) && WEXITSTATUS(status) == 0);
   EXPECT_EQ(g_nCountOfProgress, 4242);
   g_nCountOfProgress = 0;
 }
@@ -259,15 +237,12 @@ TEST(CommandBlocks, DeviceDefaults) {
   auto block = std::make_unique<CDataControlCmdBlkKVDevice>();
   std::memset(static_cast<void*>(block.get()), 0xFF, sizeof *block);
   InitDeviceBlockDefaults(*block);
-  EXPECT_EQ(block->nCmdType, 1);
-  EXPECT_EQ(block->bMotionDetect, 1);
-  EXPECT_EQ(block->bAccOn, 1);
-  block->nCmdType = 0;
-  block->bMotionDetect = 0;
-  block->bAccOn = 0;
+  // Three fields are on, every other byte is zero.
+  EXPECT_EQ(std::tuple(block->nCmdType, int{block->bMotionDetect}, int{block->bAccOn}),
+            std::tuple(1, 1, 1));
+  std::tie(block->nCmdType, block->bMotionDetect, block->bAccOn) = std::tuple(0, 0, 0);
   const auto* bytes = reinterpret_cast<const unsigned char*>(block.get());
   for (size_t i = 0; i < sizeof *block; ++i) ASSERT_EQ(bytes[i], 0) << "byte " << i;
-
 }
 
 }  // namespace

@@ -3,108 +3,69 @@
 #include <gtest/gtest.h>
 
 #include <regex>
+#include <string>
+#include <tuple>
+#include <vector>
 
 #include "navmisc/records/photo.h"
 
 namespace {
 
+// A point with every field away from its default, working values included.
 WAYPOINT_ITEM_INFO FilledPoint() {
   WAYPOINT_ITEM_INFO p(nullptr);
-  p.time = 1000;
-  p.longitude = 121.5;
-  p.latitude = 25.04;
-  p.name = L"n";
-  p.attr1 = 1;
-  p.attr2 = 2;
-  p.reserve = 3.5;
-  p.smallAttr = 4;
-  p.lastAttr = 77;
-  p.type = 12;
-  p.altitude = 10.25;
-  p.speed = 3600;
-  p.course = 90;
-  p.extraA = 5;
-  p.extraB = 6;
+  std::tie(p.time, p.longitude, p.latitude, p.name, p.attr1, p.attr2, p.reserve, p.smallAttr) =
+      std::tuple(1000, 121.5, 25.04, L"n", 1, 2, 3.5, 4);
+  std::tie(p.lastAttr, p.type, p.altitude, p.speed, p.course, p.extraA, p.extraB) =
+      std::tuple(77, 12, 10.25, 3600, 90, 5, 6);
   p.flags[0] = 1;
   p.flags[3] = 9;
-  p.workDistance = 1.5;
-  p.workSpeed = 2.5;
-  p.workHeartRate = 120;
-  p.workCadence = 80;
+  std::tie(p.workDistance, p.workSpeed, p.workHeartRate, p.workCadence) =
+      std::tuple(1.5, 2.5, 120, 80);
   return p;
 }
 
-void ExpectSameStoredFields(const WAYPOINT_ITEM_INFO& a, const WAYPOINT_ITEM_INFO& b) {
-  EXPECT_EQ(a.time, b.time);
-  EXPECT_EQ(a.longitude, b.longitude);
-  EXPECT_EQ(a.latitude, b.latitude);
-  EXPECT_EQ(a.name, b.name);
-  EXPECT_EQ(a.attr1, b.attr1);
-  EXPECT_EQ(a.attr2, b.attr2);
-  EXPECT_EQ(a.reserve, b.reserve);
-  EXPECT_EQ(a.smallAttr, b.smallAttr);
-  EXPECT_EQ(a.type, b.type);
-  EXPECT_EQ(a.altitude, b.altitude);
-  EXPECT_EQ(a.speed, b.speed);
-  EXPECT_EQ(a.course, b.course);
-  EXPECT_EQ(a.extraA, b.extraA);
-  EXPECT_EQ(a.extraB, b.extraB);
-  for (int i = 0; i < 4; ++i) EXPECT_EQ(a.flags[i], b.flags[i]);
+// Every field a copy carries (all but the last attribute and the working values), comparable
+// and printable in one piece.
+auto Stored(const WAYPOINT_ITEM_INFO& p) {
+  return std::tuple(p.time, p.longitude, p.latitude, p.name.str(), p.attr1, p.attr2, p.reserve,
+                    int{p.smallAttr}, p.type, p.altitude, p.speed, p.course, p.extraA, p.extraB,
+                    std::vector<int>(std::begin(p.flags), std::end(p.flags)));
+}
+auto Working(const WAYPOINT_ITEM_INFO& p) {
+  return std::tuple(p.workDistance, p.workSpeed, p.workHeartRate, p.workCadence);
 }
 
-void ExpectWorkingValuesZero(const WAYPOINT_ITEM_INFO& p) {
-  EXPECT_EQ(p.workDistance, 0.0);
-  EXPECT_EQ(p.workSpeed, 0.0);
-  EXPECT_EQ(p.workHeartRate, 0);
-  EXPECT_EQ(p.workCadence, 0);
-}
+TEST(WaypointRecord, DefaultsAndCopyRules) {
+  const WAYPOINT_ITEM_INFO fresh(nullptr);
+  EXPECT_EQ(Stored(fresh), std::tuple(-1, 0.0, 0.0, std::wstring(), 0, 0, -2.0, 0, 0, 0.0, 0, -1,
+                                      0, 0, std::vector<int>(4, 0)));
+  EXPECT_EQ(Working(fresh), std::tuple(0.0, 0.0, 0, 0));
+  EXPECT_EQ(fresh.lastAttr, 0u);
+  EXPECT_EQ(BASE_ITEM_INFO(nullptr).reserve, 0.0) << "only a waypoint starts at -2.0";
 
-TEST(WaypointRecord, DefaultsFromNullPointer) {
-  WAYPOINT_ITEM_INFO p(nullptr);
-  EXPECT_EQ(p.time, -1);
-  EXPECT_EQ(p.course, -1);
-  EXPECT_EQ(p.reserve, -2.0);
-  EXPECT_EQ(p.latitude, 0.0);
-  EXPECT_EQ(p.longitude, 0.0);
-  EXPECT_EQ(p.altitude, 0.0);
-  EXPECT_EQ(p.speed, 0);
-  EXPECT_EQ(p.type, 0);
-  EXPECT_EQ(p.extraA, 0);
-  EXPECT_EQ(p.extraB, 0);
-  EXPECT_TRUE(p.name.IsEmpty());
-  BASE_ITEM_INFO base(nullptr);
-  EXPECT_EQ(base.time, -1);
-  EXPECT_EQ(base.reserve, 0.0);  // only a waypoint starts at -2.0
-}
-
-TEST(WaypointRecord, CopiesKeepStoredFieldsAndDropWorkingValues) {
+  // The pointer constructor leaves the last attribute out; every copy drops the working values,
+  // assignment included, whatever the target held before.
   const WAYPOINT_ITEM_INFO src = FilledPoint();
-
-  WAYPOINT_ITEM_INFO byPointer(&src);
-  ExpectSameStoredFields(byPointer, src);
-  ExpectWorkingValuesZero(byPointer);
-  EXPECT_EQ(byPointer.lastAttr, 0u) << "the pointer constructor does not carry the last attribute";
-
-  WAYPOINT_ITEM_INFO byCopy(src);
-  ExpectSameStoredFields(byCopy, src);
-  ExpectWorkingValuesZero(byCopy);
-  EXPECT_EQ(byCopy.lastAttr, 77u);
-
-  WAYPOINT_ITEM_INFO assigned = FilledPoint();
-  assigned.workDistance = 9;
+  WAYPOINT_ITEM_INFO byPointer(&src), byCopy(src), assigned = FilledPoint();
   assigned = src;
-  ExpectSameStoredFields(assigned, src);
-  ExpectWorkingValuesZero(assigned);
-  EXPECT_EQ(assigned.lastAttr, 77u);
+  const std::tuple<const char*, const WAYPOINT_ITEM_INFO*, uint32_t> copies[] = {
+      {"pointer", &byPointer, 0u}, {"copy", &byCopy, 77u}, {"assignment", &assigned, 77u}};
+  for (const auto& [how, copy, lastAttr] : copies) {
+    EXPECT_EQ(Stored(*copy), Stored(src)) << how;
+    EXPECT_EQ(Working(*copy), Working(fresh)) << how;
+    EXPECT_EQ(copy->lastAttr, lastAttr) << how;
+  }
 
   BASE_ITEM_INFO baseSrc(nullptr);
   baseSrc.lastAttr = 5;
   baseSrc.name = L"cell";
-  BASE_ITEM_INFO basePtr(&baseSrc);
+  BASE_ITEM_INFO basePtr(&baseSrc), baseCopy(baseSrc), baseAssigned;
+  baseAssigned = baseSrc;
   EXPECT_EQ(basePtr.name, L"cell");
   EXPECT_EQ(basePtr.lastAttr, 0u);
-  BASE_ITEM_INFO baseCopy(baseSrc);
   EXPECT_EQ(baseCopy.lastAttr, 5u);
+  EXPECT_EQ(baseAssigned.lastAttr, 5u);
 }
 
 TEST(WaypointRecord, EqualityComparesTheTrackFieldsOnly) {
@@ -137,31 +98,23 @@ TEST(WaypointRecord, EqualityComparesTheTrackFieldsOnly) {
 
 TEST(SampleRecords, DefaultsMarkAnEmptyRecordAndCopiesAreWhole) {
   HEARTRATE_ITEM_INFO hr(nullptr);
-  EXPECT_EQ(hr.time, -1);
-  EXPECT_EQ(hr.UsedCount(), 0);
+  EXPECT_EQ(std::tuple(hr.time, hr.UsedCount()), std::tuple(-1, 0));
   hr.values[0] = 60;
   hr.values[1] = 61;
   HEARTRATE_ITEM_INFO hrCopy(&hr);
-  EXPECT_EQ(hrCopy.UsedCount(), 2);
-  EXPECT_EQ(hrCopy.values[1], 61);
-
-  CYCLING_CADENCE_RPM_ITEM_INFO cs(nullptr);
+  EXPECT_EQ(std::tuple(hrCopy.UsedCount(), int{hrCopy.values[1]}), std::tuple(2, 61));
+  const CYCLING_CADENCE_RPM_ITEM_INFO cs(nullptr);
   for (uint8_t v : cs.values) EXPECT_EQ(v, 255);
-
   WHEEL_SPEED_ITEM_INFO ws(nullptr);
-  EXPECT_EQ(ws.UsedCount(), 0);
   for (double v : ws.values) EXPECT_EQ(v, -1.0);
   ws.values[0] = 3.5;
-  WHEEL_SPEED_ITEM_INFO wsCopy(&ws);
-  EXPECT_EQ(wsCopy.UsedCount(), 1);
+  EXPECT_EQ(WHEEL_SPEED_ITEM_INFO(&ws).UsedCount(), 1);
 }
 
 TEST(PhotoRecord, UrlDefaultsAndNewIds) {
   _PHOTO_ITEM_URL url;
-  EXPECT_TRUE(url.dirty);
-  EXPECT_TRUE(url.isPublic);
-  EXPECT_TRUE(url.dirty2);
-  EXPECT_FALSE(url.isPublic2);
+  EXPECT_EQ(std::tuple(url.dirty, url.isPublic, url.dirty2, url.isPublic2),
+            std::tuple(true, true, true, false));
   url.url[4] = L"x";
   url = url;  // self-assignment keeps the content
   EXPECT_EQ(url.url[4], L"x");

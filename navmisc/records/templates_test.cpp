@@ -2,17 +2,18 @@
 
 #include <gtest/gtest.h>
 
+#include <tuple>
+
 #include "navmisc/platform/files.h"
-#include "navmisc/platform/shared_globals.h"
 #include "testutil.h"
 
+using navmisc::testutil::ProgPathScope;
 using navmisc::testutil::TempDir;
 using navmisc::testutil::WriteFileBytes;
 
 TEST(Templates, CatalogueIsLocalisedAndResolved) {
   TempDir prog;
-  const CString previous = g_szExecProgPath;
-  navmisc::SetSharedText(g_szExecProgPath, prog.path());
+  ProgPathScope scope(prog.path());
   MakeDir(prog / L"Templates");
   WriteFileBytes(prog / L"Templates/TEMP.INI",
                  "[templates]\ntemp_count=3\n"
@@ -25,14 +26,13 @@ TEST(Templates, CatalogueIsLocalisedAndResolved) {
   FreeTemplateInfo();
   ASSERT_EQ(ReadTemplateInfo(L"de"), 3);
   auto* t0 = static_cast<TEMPLATE_ITEM_INFO*>(g_plTemplateItemList.GetHead());
-  EXPECT_EQ(t0->name, L"Klassisch");
-  EXPECT_EQ(t0->description, L"Plain page") << "an empty translation falls back";
-  EXPECT_EQ(t0->thumbnailPath, (prog / L"Templates") + L"/thumbs/a.png");
-  EXPECT_EQ(t0->landmarkPath, L"/abs/l.png");
-  EXPECT_EQ(t0->landmarkWidth, 120);
-  EXPECT_EQ(t0->mode, 2);
-  EXPECT_TRUE(t0->wideStyle);
-  EXPECT_TRUE(t0->brandedLabel);
+  // An empty translation falls back to the default language; ".\" stands for the catalogue's
+  // folder.
+  EXPECT_EQ(std::tie(t0->name, t0->description, t0->thumbnailPath, t0->landmarkPath),
+            std::tuple(L"Klassisch", L"Plain page", (prog / L"Templates") + L"/thumbs/a.png",
+                       L"/abs/l.png"));
+  EXPECT_EQ(std::tuple(t0->landmarkWidth, t0->mode, t0->wideStyle, t0->brandedLabel),
+            std::tuple(120, 2, true, true));
   auto* t1 = static_cast<TEMPLATE_ITEM_INFO*>(g_plTemplateItemList.GetAt(g_plTemplateItemList.FindIndex(1)));
   EXPECT_EQ(t1->name, L"Modern");
   EXPECT_TRUE(t1->description.IsEmpty()) << "no entry in either language";
@@ -40,5 +40,4 @@ TEST(Templates, CatalogueIsLocalisedAndResolved) {
   EXPECT_EQ(ReadTemplateInfo(L"fr"), 6) << "reading again appends";
   FreeTemplateInfo();
   EXPECT_TRUE(g_plTemplateItemList.IsEmpty());
-  navmisc::SetSharedText(g_szExecProgPath, previous);
 }

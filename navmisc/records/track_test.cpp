@@ -2,72 +2,51 @@
 
 #include <gtest/gtest.h>
 
-#include <clocale>
+#include <cmath>
 #include <cstdio>
-#include <memory>
 #include <cstring>
+#include <memory>
 #include <random>
-
-#include "navmisc/records/point_codec.h"
+#include <span>
+#include <string>
+#include <tuple>
+#include <utility>
 
 #include "navmisc/platform/atomic_file.h"
 #include "navmisc/platform/files.h"
 #include "navmisc/platform/format.h"
+#include "navmisc/records/point_codec.h"
 #include "navmisc/records/trip.h"
-#include "navmisc/records/user_profile.h"
-#include "testutil.h"
+#include "record_fixture.h"
 
-using navmisc::testutil::DataRootScope;
+using navmisc::testutil::LocaleScope;
+using navmisc::testutil::NewPoint;
 using navmisc::testutil::ReadFileBytes;
-using navmisc::testutil::TempDir;
 using navmisc::testutil::WriteFileBytes;
 
 namespace {
 
-class TrackFiles : public ::testing::Test {
+class TrackFiles : public navmisc::testutil::RecordTest {
  protected:
-  void SetUp() override {
-    for (auto* p : {&g_TripMapInfo, &g_SportMapInfo, &g_TrackerMapInfo, &g_WhereMapInfo}) p->Reset();
-  }
-  void TearDown() override {
-    for (auto* p : {&g_TripMapInfo, &g_SportMapInfo, &g_TrackerMapInfo, &g_WhereMapInfo}) p->Reset();
-    navmisc::testing::FailAtomicWritesAfter(-1);
-  }
   std::unique_ptr<BLOG_ITEM_INFO> MakeTrip(GPS_APP_PROG_TYPE type) {
     auto trip = std::make_unique<BLOG_ITEM_INFO>(type, L"TRIP1", 0);
     MakeDir(trip->GetResourcePath());
     return trip;
   }
-  static WAYPOINT_ITEM_INFO* Point(int32_t time, double lat, double lon) {
-    auto* p = new WAYPOINT_ITEM_INFO(nullptr);
-    p->time = time;
-    p->latitude = lat;
-    p->longitude = lon;
-    return p;
-  }
-
-  TempDir root_;
-  DataRootScope scope_{root_.path()};
 };
 
 TEST_F(TrackFiles, WritesEachFileInItsExactLineFormat) {
   auto trip = MakeTrip(GPS_APP_TRACKER);
   TRACK_ITEM_INFO track(trip.get());
-  auto* p = Point(1000000000, 25.0339, 121.5645);
-  p->altitude = -3.25;
-  p->speed = 4500;
-  p->type = -2;
-  p->course = 359;
-  p->extraA = -8;
-  p->extraB = 7;
+  auto* p = NewPoint(1000000000, 25.0339, 121.5645, -2);
+  std::tie(p->altitude, p->speed, p->course, p->extraA, p->extraB) =
+      std::tuple(-3.25, 4500, 359, -8, 7);
   track.points.AddTail(p);
   auto* cell = new BASE_ITEM_INFO(nullptr);
-  cell->time = 5;
-  cell->name = L"466-92-1234";
-  cell->latitude = -33.5;
-  cell->longitude = 151.25;
+  std::tie(cell->time, cell->name, cell->latitude, cell->longitude) =
+      std::tuple(5, L"466-92-1234", -33.5, 151.25);
   track.cellFixes.AddTail(cell);
-  auto* help = Point(6, 1.0, 2.0);
+  auto* help = NewPoint(6, 1.0, 2.0);
   help->name = L"SOS";
   help->extraB = 99;  // not part of the help-point line
   track.helpPoints.AddTail(help);
@@ -91,34 +70,29 @@ TEST_F(TrackFiles, WritesEachFileInItsExactLineFormat) {
   track.WriteAllWaypoint(1, &counter, nullptr);
   EXPECT_EQ(counter, 7) << "one per line written";
 
-  EXPECT_EQ(ReadFileBytes(track.GetFilePathName()),
-            "1000000000,25.033900,121.564500,-3.250000,4500,-2,359,-8,7\r\n");
-  EXPECT_EQ(ReadFileBytes(track.GetCellIDFilePathName()), "5,466-92-1234,-33.500000,151.250000\r\n");
-  EXPECT_EQ(ReadFileBytes(track.GetSOSPointFilePathName()),
-            "6,SOS,1.000000,2.000000,0.000000,0,0,-1,0\r\n");
   std::string hr = "10";
   for (int i = 0; i < 24; ++i) hr += "," + std::to_string(100 + i);
-  EXPECT_EQ(ReadFileBytes(track.GetHeartRateFilePathName()), hr + "\r\n11,90,91,255\r\n");
-  EXPECT_EQ(ReadFileBytes(track.GetCyclingCadenceFilePathName()), "12,255\r\n");
-  EXPECT_EQ(ReadFileBytes(track.GetWheelSpeedFilePathName()), "13,-1.000000\r\n");
+  const std::pair<CString, std::string> files[] = {
+      {track.GetFilePathName(), "1000000000,25.033900,121.564500,-3.250000,4500,-2,359,-8,7\r\n"},
+      {track.GetCellIDFilePathName(), "5,466-92-1234,-33.500000,151.250000\r\n"},
+      {track.GetSOSPointFilePathName(), "6,SOS,1.000000,2.000000,0.000000,0,0,-1,0\r\n"},
+      {track.GetHeartRateFilePathName(), hr + "\r\n11,90,91,255\r\n"},
+      {track.GetCyclingCadenceFilePathName(), "12,255\r\n"},
+      {track.GetWheelSpeedFilePathName(), "13,-1.000000\r\n"},
+  };
+  for (const auto& [path, bytes] : files) EXPECT_EQ(ReadFileBytes(path), bytes) << path.ToUtf8();
 
-  // Reading gives back what was written.
+  // Reading gives back what was written: written again, every file comes out the same, except
+  // that the single point is doubled one second later.
   TRACK_ITEM_INFO again(trip.get());
   again.id = track.id;
   again.ReadAllWaypoint(1);
-  ASSERT_EQ(again.points.GetCount(), 2);  // a single point is doubled
-  auto* back = static_cast<WAYPOINT_ITEM_INFO*>(again.points.GetHead());
-  EXPECT_TRUE(*back == *p);
-  EXPECT_EQ(back->extraB, 7);
-  auto* second = static_cast<WAYPOINT_ITEM_INFO*>(again.points.GetTail());
-  EXPECT_EQ(second->time, p->time + 1);
-  ASSERT_EQ(again.cellFixes.GetCount(), 1);
-  EXPECT_EQ(static_cast<BASE_ITEM_INFO*>(again.cellFixes.GetHead())->name, L"466-92-1234");
-  ASSERT_EQ(again.heartRates.GetCount(), 2);
-  EXPECT_EQ(static_cast<HEARTRATE_ITEM_INFO*>(again.heartRates.GetHead())->UsedCount(), 24);
-  EXPECT_EQ(static_cast<HEARTRATE_ITEM_INFO*>(again.heartRates.GetTail())->UsedCount(), 2);
-  ASSERT_EQ(again.wheelSpeeds.GetCount(), 1);
-  EXPECT_EQ(static_cast<WHEEL_SPEED_ITEM_INFO*>(again.wheelSpeeds.GetHead())->UsedCount(), 0);
+  for (const auto& [path, bytes] : files) ASSERT_TRUE(DeleteFile(path));
+  again.WriteAllWaypoint(1, nullptr, nullptr);
+  EXPECT_EQ(ReadFileBytes(files[0].first),
+            files[0].second + "1000000001,25.033900,121.564500,-3.250000,4500,-2,359,-8,7\r\n");
+  for (const auto& [path, bytes] : std::span(files).subspan(1))
+    EXPECT_EQ(ReadFileBytes(path), bytes) << "rewritten " << path.ToUtf8();
 }
 
 TEST_F(TrackFiles, CorruptLinesGiveDefaultFieldsAndLineEndsMayBeLf) {
@@ -133,43 +107,38 @@ TEST_F(TrackFiles, CorruptLinesGiveDefaultFieldsAndLineEndsMayBeLf) {
                      longLine + "\n"  // read in pieces of 255 characters
                  "300,+1e2,-0x1p1,inf");
   track.ReadAllWaypoint(1);
-  ASSERT_EQ(track.points.GetCount(), 7);
+  // time, latitude, longitude, altitude, speed, type, course, extra values A and B
+  using Fields = std::tuple<int32_t, double, double, double, int32_t, int32_t, int32_t, int32_t,
+                            int32_t>;
+  const Fields expected[] = {
+      {100, 1.5, 2.5, 3.5, 4, 5, 6, 7, 8},
+      {200, 1.5, 0, 0, 0, 0, -1, 0, 0},
+      {-1, 0, 0, 0, 0, 0, -1, 0, 0},
+      {-1, 0, 0, 0, 0, 0, -1, 0, 0},
+      {-1, 0, 0, 0, 0, 0, -1, 0, 0},  // 255 digits overflow like the C reader
+      {-1, 0, 0, 0, 0, 0, -1, 0, 0},  // and so do the 45 left over
+      {300, 100, -2, INFINITY, 0, 0, -1, 0, 0},
+  };
+  ASSERT_EQ(track.points.GetCount(), static_cast<int>(std::size(expected)));
   POSITION pos = track.points.GetHeadPosition();
-  auto next = [&] { return static_cast<WAYPOINT_ITEM_INFO*>(track.points.GetNext(pos)); };
-  auto* a = next();
-  EXPECT_EQ(a->time, 100);
-  EXPECT_EQ(a->extraB, 8);
-  auto* b = next();
-  EXPECT_EQ(b->time, 200);
-  EXPECT_EQ(b->latitude, 1.5);
-  EXPECT_EQ(b->longitude, 0.0);
-  EXPECT_EQ(b->speed, 0);
-  EXPECT_EQ(b->course, -1);
-  auto* c = next();
-  EXPECT_EQ(c->time, -1);
-  EXPECT_EQ(next()->time, -1);
-  EXPECT_EQ(next()->time, -1) << "a run of 255 digits overflows like the C reader";
-  next();
-  auto* last = next();
-  EXPECT_EQ(last->time, 300);
-  EXPECT_EQ(last->latitude, 100.0);
-  EXPECT_EQ(last->longitude, -2.0);
-  EXPECT_TRUE(std::isinf(last->altitude));
+  for (const Fields& want : expected) {
+    const auto* p = static_cast<WAYPOINT_ITEM_INFO*>(track.points.GetNext(pos));
+    EXPECT_EQ(Fields(p->time, p->latitude, p->longitude, p->altitude, p->speed, p->type, p->course,
+                     p->extraA, p->extraB),
+              want);
+  }
 
   // Side files of a short line leave the missing values at their defaults.
   WriteFileBytes(track.GetHeartRateFilePathName(), "7,80\n,\n");
   track.ReadAllWaypoint(1);
   ASSERT_EQ(track.heartRates.GetCount(), 2);
   auto* hr = static_cast<HEARTRATE_ITEM_INFO*>(track.heartRates.GetHead());
-  EXPECT_EQ(hr->time, 7);
-  EXPECT_EQ(hr->values[0], 80);
-  EXPECT_EQ(hr->values[1], 255);
+  EXPECT_EQ(std::tuple(hr->time, int{hr->values[0]}, int{hr->values[1]}), std::tuple(7, 80, 255));
 }
 
 TEST_F(TrackFiles, LoadingRulesOfTheApplicationType) {
-  g_TrackerMapInfo.timeZoneShiftOn = true;
-  g_TrackerMapInfo.timeZoneShift = 3600;
-  g_TrackerMapInfo.dayLight = true;
+  std::tie(g_TrackerMapInfo.timeZoneShiftOn, g_TrackerMapInfo.timeZoneShift,
+           g_TrackerMapInfo.dayLight) = std::tuple(true, 3600, true);
 
   auto tracker = MakeTrip(GPS_APP_TRACKER);
   TRACK_ITEM_INFO t(tracker.get());
@@ -194,8 +163,7 @@ TEST_F(TrackFiles, LoadingRulesOfTheApplicationType) {
   other.ReadAllWaypoint(0);
   EXPECT_TRUE(other.cellFixes.IsEmpty());
   EXPECT_EQ(static_cast<WAYPOINT_ITEM_INFO*>(other.points.GetHead())->time, 5) << "no shift outside its profile";
-  auto* fix = new BASE_ITEM_INFO(nullptr);
-  other.cellFixes.AddTail(fix);
+  other.cellFixes.AddTail(new BASE_ITEM_INFO(nullptr));
   other.WriteAllWaypoint(1, nullptr, nullptr);
   EXPECT_EQ(ReadFileBytes(other.GetCellIDFilePathName()), "keep me\r\n");
 
@@ -211,13 +179,12 @@ TEST_F(TrackFiles, LoadingRulesOfTheApplicationType) {
 TEST_F(TrackFiles, StoppedWritesShortenAndFailedWritesKeepTheOldFile) {
   auto trip = MakeTrip(GPS_APP_TRIP);
   TRACK_ITEM_INFO track(trip.get());
-  for (int i = 0; i < 5; ++i) track.points.AddTail(Point(i, 1.0, 2.0));
+  for (int i = 0; i < 5; ++i) track.points.AddTail(NewPoint(i, 1.0, 2.0));
   track.WriteAllWaypoint(1, nullptr, nullptr);
   const std::string full = ReadFileBytes(track.GetFilePathName());
 
   // A disk that fills up mid-write leaves the previous file as it was.
-  auto* extra = Point(99, 3.0, 4.0);
-  track.points.AddTail(extra);
+  track.points.AddTail(NewPoint(99, 3.0, 4.0));
   navmisc::testing::FailAtomicWritesAfter(10);
   track.WriteAllWaypoint(1, nullptr, nullptr);
   navmisc::testing::FailAtomicWritesAfter(-1);
@@ -240,9 +207,7 @@ TEST_F(TrackFiles, StoppedWritesShortenAndFailedWritesKeepTheOldFile) {
 
 TEST(PointNumbers, FixedDecimalsMatchTheCLibraryWhateverTheLocale) {
   // Comma-decimal locales must not leak into files.
-  const char* previous = std::setlocale(LC_NUMERIC, nullptr);
-  const std::string saved = previous ? previous : "C";
-  const bool comma = std::setlocale(LC_NUMERIC, "de_DE.UTF-8") != nullptr;
+  const LocaleScope comma("de_DE.UTF-8");
   std::mt19937_64 rng(42);
   std::uniform_real_distribution<double> wide(-1e9, 1e9);
   std::uniform_real_distribution<double> small(-200.0, 200.0);
@@ -259,13 +224,8 @@ TEST(PointNumbers, FixedDecimalsMatchTheCLibraryWhateverTheLocale) {
     }
     ASSERT_EQ(ours, ref) << "value " << v;
   }
-  std::setlocale(LC_NUMERIC, saved.c_str());
-  if (!comma) GTEST_SKIP() << "de_DE.UTF-8 is not installed; checked in the C locale only";
+  if (!comma.ok()) GTEST_SKIP() << "de_DE.UTF-8 is not installed; checked in the C locale only";
 }
-
-}  // namespace
-
-namespace {
 
 TEST(PointNumbers, ReadingGivesTheCLibrarysDoubles) {
   std::mt19937_64 rng(9);

@@ -4,41 +4,27 @@
 
 #include <memory>
 #include <regex>
+#include <string>
+#include <tuple>
 
 #include "navmisc/platform/atomic_file.h"
 #include "navmisc/platform/files.h"
 #include "navmisc/platform/resources.h"
-#include "navmisc/platform/settings.h"
-#include "navmisc/records/user_profile.h"
-#include "testutil.h"
+#include "record_fixture.h"
 
-using navmisc::testutil::DataRootScope;
+using navmisc::testutil::NewPoint;
 using navmisc::testutil::ReadFileBytes;
-using navmisc::testutil::TempDir;
 using navmisc::testutil::WriteFileBytes;
 
 namespace {
 
-class TripRecord : public ::testing::Test {
+class TripRecord : public navmisc::testutil::RecordTest {
  protected:
-  void SetUp() override {
-    for (auto* p : {&g_TripMapInfo, &g_SportMapInfo, &g_TrackerMapInfo, &g_WhereMapInfo}) p->Reset();
+  TripRecord() {
     WriteFileBytes(root_ / L"strings.ini", "[STRINGS]\n9616=Journey\n");
     navmisc::SetResourceFile(root_ / L"strings.ini");
   }
-  void TearDown() override {
-    for (auto* p : {&g_TripMapInfo, &g_SportMapInfo, &g_TrackerMapInfo, &g_WhereMapInfo}) p->Reset();
-    navmisc::SetResourceFile(L"");
-    navmisc::testing::FailAtomicWritesAfter(-1);
-  }
-  static WAYPOINT_ITEM_INFO* Point(int32_t time, double lat, double lon, int32_t type = 0) {
-    auto* p = new WAYPOINT_ITEM_INFO(nullptr);
-    p->time = time;
-    p->latitude = lat;
-    p->longitude = lon;
-    p->type = type;
-    return p;
-  }
+  ~TripRecord() override { navmisc::SetResourceFile(L""); }
   // A trip with two tracks, a runner and a photo on the second track, saved.
   std::unique_ptr<BLOG_ITEM_INFO> SavedTrip() {
     auto trip = std::make_unique<BLOG_ITEM_INFO>(GPS_APP_TRIP, nullptr, 3);
@@ -46,21 +32,19 @@ class TripRecord : public ::testing::Test {
       auto* track = new TRACK_ITEM_INFO(trip.get());
       track->description = t ? L"Back" : L"Out";
       track->runner = L"R1";
-      for (int i = 0; i < 3; ++i) track->points.AddTail(Point(1000 + 100 * t + i, 25 + i * 0.001, 121));
+      for (int i = 0; i < 3; ++i)
+        track->points.AddTail(NewPoint(1000 + 100 * t + i, 25 + i * 0.001, 121));
       trip->tracks.AddTail(track);
     }
     auto* runner = new RUNNER_ITEM_INFO;
-    runner->id = L"R1";
-    runner->frameCount = 2;
-    runner->frameUrl[0] = L"f0.png";
-    runner->frameUrl[1] = L"f1.png";
+    std::tie(runner->id, runner->frameCount, runner->frameUrl[0], runner->frameUrl[1]) =
+        std::tuple(L"R1", 2, L"f0.png", L"f1.png");
     trip->runners.AddTail(runner);
     WriteFileBytes(PathJoin(trip->GetResourcePath(), L"f0.png"), "frame0");
     auto* photo = new PHOTO_ITEM_INFO(trip.get(), L"", L"", L"");
-    photo->itemName = L"p.jpg";
-    photo->title = L"Line one\nline \"two\"";
-    photo->latitude = 25.001;
-    photo->longitude = 121.0;
+    std::tie(photo->itemName, photo->title, photo->latitude, photo->longitude) =
+        std::tuple(L"p.jpg", L"Line one\nline \"two\"", 25.001, 121.0);
+    photo->url.height[0] = 480;  // written as "dimension_h0", read as "dimension_H0"
     photo->trackItemId = static_cast<TRACK_ITEM_INFO*>(trip->tracks.GetTail())->id;
     trip->photos.AddTail(photo);
     trip->coverPageId = photo->photoId;
@@ -69,9 +53,6 @@ class TripRecord : public ::testing::Test {
     trip->WriteAllWaypoint(1, nullptr, nullptr);
     return trip;
   }
-
-  TempDir root_;
-  DataRootScope scope_{root_.path()};
 };
 
 TEST_F(TripRecord, NewTripGetsAnIdFolderNameAndDefaults) {
@@ -83,12 +64,10 @@ TEST_F(TripRecord, NewTripGetsAnIdFolderNameAndDefaults) {
   EXPECT_EQ(trip.GetResourcePath(), PathJoin(PathJoin(root_.path(), L"Resource"), trip.tripId));
   EXPECT_TRUE(std::regex_match(trip.name.ToUtf8(), std::regex("Journey_[0-9]{14}"))) << trip.name.ToUtf8();
   EXPECT_EQ(trip.fileName, trip.name);
-  EXPECT_TRUE(trip.optOptimize && trip.optRevise && trip.optRedundance);
-  EXPECT_EQ(trip.displayType, 2);
-  EXPECT_EQ(trip.playbackSpeed, 60);
-  EXPECT_EQ(trip.tempMode, 4);
-  EXPECT_EQ(trip.tempStyle, 7);
-  EXPECT_EQ(trip.zoom, 10);
+  // Mode and style come from the application's profile.
+  EXPECT_EQ(std::tuple(trip.optOptimize, trip.optRevise, trip.optRedundance, trip.displayType,
+                       trip.playbackSpeed, int{trip.tempMode}, int{trip.tempStyle}, int{trip.zoom}),
+            std::tuple(true, true, true, 2, 60, 4, 7, 10));
   EXPECT_FALSE(trip.languageId.IsEmpty());
 
   BLOG_ITEM_INFO where(GPS_APP_WHEREAMI, nullptr, 0);
@@ -105,33 +84,35 @@ TEST_F(TripRecord, SettingsFileRoundTripAndCounters) {
   trip->WriteInfo(0, &counter, nullptr);
   EXPECT_EQ(counter, 3 + 1 + 2 + 1) << "3, 1, one per track, one per photo";
 
+  // What was read, written again, gives the same file: every key of the trip, its runner,
+  // tracks and photo came back.
+  const std::string text = ReadFileBytes(trip->GetBlogItemProfilePathName());
   BLOG_ITEM_INFO back(GPS_APP_TRIP, trip->tripId, 0);
   ASSERT_EQ(back.ReadInfo(), 1);
-  EXPECT_EQ(back.name, trip->name);
-  EXPECT_EQ(back.coverPageId, trip->coverPageId);
-  EXPECT_TRUE(back.optOptimize);
-  EXPECT_EQ(back.displayType, 2);
-  ASSERT_EQ(back.tracks.GetCount(), 2);
-  ASSERT_EQ(back.runners.GetCount(), 1);
-  auto* runner = static_cast<RUNNER_ITEM_INFO*>(back.runners.GetHead());
-  EXPECT_EQ(runner->frameCount, 2);
-  EXPECT_EQ(runner->frameUrl[1], L"f1.png");
   ASSERT_EQ(back.photos.GetCount(), 1);
-  auto* photo = static_cast<PHOTO_ITEM_INFO*>(back.photos.GetHead());
-  EXPECT_EQ(photo->title, L"Line one\nline \"two\"");
-  EXPECT_EQ(photo->latitude, 25.001);
-  EXPECT_EQ(photo->trip, &back);
-  // Points come on demand.
-  EXPECT_TRUE(static_cast<TRACK_ITEM_INFO*>(back.tracks.GetHead())->points.IsEmpty());
+  EXPECT_EQ(static_cast<PHOTO_ITEM_INFO*>(back.photos.GetHead())->trip, &back);
+  EXPECT_TRUE(static_cast<TRACK_ITEM_INFO*>(back.tracks.GetHead())->points.IsEmpty())
+      << "points come on demand";
+  back.WriteInfo(1, nullptr, nullptr);
+  EXPECT_EQ(ReadFileBytes(back.GetBlogItemProfilePathName()), text);
   EXPECT_EQ(back.GetUTCStartTime(), 1000);
   EXPECT_EQ(back.GetUTCEndTime(), 1102);
 
-  // The photo's height key is written in lower case and read back all the same.
-  const std::string text = ReadFileBytes(trip->GetBlogItemProfilePathName());
-  EXPECT_NE(text.find("dimension_h0="), std::string::npos);
-  EXPECT_NE(text.find("[SECTION_PH(0)]"), std::string::npos);
-  EXPECT_NE(text.find("[SECTION_TK(1)]"), std::string::npos);
-  EXPECT_NE(text.find("[SECTION_RN(0)]"), std::string::npos);
+  // The photo's first height key is written in lower case; it came back all the same above.
+  for (const char* part :
+       {"\ndimension_h0=480\n", "[SECTION_PH(0)]", "[SECTION_TK(1)]", "[SECTION_RN(0)]"})
+    EXPECT_NE(text.find(part), std::string::npos) << part;
+  // The trip's own keys, in the order written.
+  const std::string head = text.substr(0, text.find("\n\n"));
+  std::string keys;
+  for (size_t at = head.find('\n'); at != std::string::npos; at = head.find('\n', at + 1))
+    keys += head.substr(at + 1, head.find('=', at) - at - 1) + " ";
+  EXPECT_EQ(keys,
+            "trip_item_id name file_name description cover_page_id language_id create_time version "
+            "opt_optimize opt_revise opt_redundance opt_level time_zone day_light time_zone_shift "
+            "display_type playback_speed temp_mode temp_style sub_sample correction zoom net_dirty "
+            "public server_id net_url tags runner_item_info_count track_item_info_count "
+            "photo_item_info_count ");
 }
 
 TEST_F(TripRecord, ReaderDefaultsDifferFromANewTrip) {
@@ -144,31 +125,25 @@ TEST_F(TripRecord, ReaderDefaultsDifferFromANewTrip) {
                  "1,0.0,0.0,0,0,0,-1,0,0\r\n2,1.0,1.0,0,0,-2,-1,0,0\r\n3,1.0,1.1,0,0,-1,-1,0,0\r\n"
                  "4,1.0,1.2,0,0,5,-1,0,0\r\n");
   ASSERT_EQ(trip.ReadInfo(), 1);
-  EXPECT_EQ(trip.fileName, L"Walk");
-  EXPECT_FALSE(trip.optOptimize);
-  EXPECT_EQ(trip.displayType, 0);
-  EXPECT_FALSE(trip.netDirty);
-  EXPECT_FALSE(trip.netPublic);
   auto* track = static_cast<TRACK_ITEM_INFO*>(trip.tracks.GetHead());
-  EXPECT_EQ(track->color, 16711935u);
-  EXPECT_EQ(track->transparency, 10);
+  EXPECT_EQ(std::tuple(trip.fileName.str(), trip.optOptimize, trip.optRevise, trip.displayType,
+                       trip.netDirty, trip.netPublic, track->color, track->transparency),
+            std::tuple(L"Walk", false, false, 0, false, false, 16711935u, 10));
 
-  long total = 0, kept = 0;
-  EXPECT_EQ(trip.GetTrackInfo(total, kept), 1);
-  EXPECT_EQ(total, 3) << "the point at 0/0 is not counted";
-  EXPECT_EQ(kept, 3) << "optimisation off keeps everything";
-  trip.optOptimize = true;
-  trip.optRevise = true;
-  trip.optRedundance = true;
-  trip.optLevel = 1;
-  trip.GetTrackInfo(total, kept);
-  EXPECT_EQ(kept, 1);
-  trip.optRevise = false;
-  trip.GetTrackInfo(total, kept);
-  EXPECT_EQ(kept, 2);
-  trip.optRedundance = false;
-  trip.GetTrackInfo(total, kept);
-  EXPECT_EQ(kept, 3);
+  // The point at 0/0 is never counted; levels -2 and -1 and 5 make the rest.
+  const struct {
+    bool optimise, revise, redundance;
+    long kept;
+  } cases[] = {{false, true, true, 3}, {true, true, true, 1}, {true, false, true, 2},
+               {true, false, false, 3}, {true, true, false, 2}};
+  for (const auto& c : cases) {
+    std::tie(trip.optOptimize, trip.optRevise, trip.optRedundance, trip.optLevel) =
+        std::tuple(c.optimise, c.revise, c.redundance, 1);
+    long total = 0, kept = 0;
+    EXPECT_EQ(trip.GetTrackInfo(total, kept), 1);
+    EXPECT_EQ(total, 3);
+    EXPECT_EQ(kept, c.kept) << c.optimise << c.revise << c.redundance;
+  }
 
   // Without tracks: the extreme times.
   BLOG_ITEM_INFO empty(GPS_APP_TRIP, L"EMPTY", 0);

@@ -3,47 +3,52 @@
 #include <gtest/gtest.h>
 #include <unistd.h>
 
-#include "navmisc/platform/files.h"
-#include "testutil.h"
+#include <utility>
 
-using navmisc::testutil::DataRootScope;
+#include "navmisc/platform/files.h"
+#include "record_fixture.h"
+
 using navmisc::testutil::ReadFileBytes;
 using navmisc::testutil::TempDir;
 using navmisc::testutil::WriteFileBytes;
 
 namespace {
 
-class TripTree : public ::testing::Test {
+class TripTree : public navmisc::testutil::RecordTest {
  protected:
   CString Resource() const { return root_ / L"Resource"; }
   // A saved trip in the tree's folder.
-  BLOG_ITEM_INFO* NewTrip(const wchar_t* name) {
+  static BLOG_ITEM_INFO* NewTrip(const wchar_t* name) {
     auto* t = new BLOG_ITEM_INFO(GPS_APP_TRIP, nullptr, 0);
     t->name = name;
     t->WriteInfo(1, nullptr, nullptr);
     return t;
   }
-  TempDir root_;
-  DataRootScope scope_{root_.path()};
+  // A named child node, owned by `parent`.
+  static BLOG_TREE_NODE* AddNode(BLOG_TREE_NODE& parent, const wchar_t* name) {
+    auto* node = new BLOG_TREE_NODE(nullptr);
+    node->name = name;
+    parent.children.AddTail(node);
+    return node;
+  }
+  // Saves the tree "All" {top} / "2024" / "Summer" {deep, server id "srv-9"}; gives the ids of
+  // the two trips.
+  std::pair<CString, CString> SaveNestedTree() {
+    BLOG_TREE_NODE root(nullptr);
+    root.name = L"All";
+    auto* top = NewTrip(L"top");
+    root.trips.AddTail(top);
+    auto* deep = NewTrip(L"deep");
+    deep->serverId = L"srv-9";
+    deep->WriteInfo(1, nullptr, nullptr);
+    AddNode(*AddNode(root, L"2024"), L"Summer")->trips.AddTail(deep);
+    root.WriteInfo(false, 0, nullptr);
+    return {top->tripId, deep->tripId};
+  }
 };
 
 TEST_F(TripTree, NestedTreeRoundTripsAndSearches) {
-  BLOG_TREE_NODE root(nullptr);
-  root.name = L"All";
-  auto* a = NewTrip(L"a");
-  root.trips.AddTail(a);
-  auto* child = new BLOG_TREE_NODE(nullptr);
-  child->name = L"2024";
-  auto* grandchild = new BLOG_TREE_NODE(nullptr);
-  grandchild->name = L"Summer";
-  auto* deep = NewTrip(L"deep");
-  deep->serverId = L"srv-9";
-  deep->WriteInfo(1, nullptr, nullptr);
-  grandchild->trips.AddTail(deep);
-  child->children.AddTail(grandchild);
-  root.children.AddTail(child);
-  root.WriteInfo(false, 0, nullptr);
-
+  SaveNestedTree();
   const std::string text = ReadFileBytes(Resource() + L"/RESOURCE_INFO.INI");
   EXPECT_NE(text.find("[SECTION_0_0]"), std::string::npos);
 
@@ -113,20 +118,7 @@ TEST_F(TripTree, OldTreeFileReplacesTheCurrentOne) {
 }
 
 TEST_F(TripTree, CleanUpRemovesOnlyUnnamedFoldersOfACompleteTree) {
-  BLOG_TREE_NODE root(nullptr);
-  root.name = L"Root";
-  auto* top = NewTrip(L"top");
-  root.trips.AddTail(top);
-  auto* child = new BLOG_TREE_NODE(nullptr);
-  child->name = L"c";
-  auto* grandchild = new BLOG_TREE_NODE(nullptr);
-  grandchild->name = L"g";
-  auto* deep = NewTrip(L"deep");
-  grandchild->trips.AddTail(deep);
-  child->children.AddTail(grandchild);
-  root.children.AddTail(child);
-  root.WriteInfo(false, 0, nullptr);
-  const CString topId = top->tripId, deepId = deep->tripId;
+  const auto [topId, deepId] = SaveNestedTree();
 
   MakeDir(Resource() + L"/orphan/sub");
   WriteFileBytes(Resource() + L"/orphan/sub/file", "x");
@@ -136,7 +128,8 @@ TEST_F(TripTree, CleanUpRemovesOnlyUnnamedFoldersOfACompleteTree) {
   ASSERT_EQ(symlink(outside.path().ToUtf8().c_str(), (Resource() + L"/link").ToUtf8().c_str()), 0);
 
   // A tree that was not read from its file never cleans up.
-  root.RemoveAllUnusedResource();
+  BLOG_TREE_NODE unread(nullptr);
+  unread.RemoveAllUnusedResource();
   EXPECT_TRUE(IsDirectory(Resource() + L"/orphan"));
 
   BLOG_TREE_NODE tree(nullptr);
@@ -154,10 +147,7 @@ TEST_F(TripTree, CopyDuplicatesEveryTrip) {
   root.name = L"Root";
   root.value2 = 5;
   root.trips.AddTail(NewTrip(L"one"));
-  auto* child = new BLOG_TREE_NODE(nullptr);
-  child->name = L"c";
-  child->trips.AddTail(NewTrip(L"two"));
-  root.children.AddTail(child);
+  AddNode(root, L"c")->trips.AddTail(NewTrip(L"two"));
   BLOG_TREE_NODE copy(&root);
   EXPECT_EQ(copy.name, L"Root");
   EXPECT_EQ(copy.value2, 5);

@@ -3,127 +3,90 @@
 #include <gtest/gtest.h>
 
 #include <cstdlib>
+#include <string>
+#include <tuple>
+#include <utility>
+#include <vector>
 
 #include "navmisc/platform/files.h"
 #include "navmisc/platform/shared_globals.h"
-#include "testutil.h"
+#include "record_fixture.h"
 
-using navmisc::testutil::DataRootScope;
 using navmisc::testutil::ReadFileBytes;
 using navmisc::testutil::TempDir;
 using navmisc::testutil::WriteFileBytes;
 
 namespace {
 
-class Profile : public ::testing::Test {
+class Profile : public navmisc::testutil::RecordTest {
  protected:
-  void SetUp() override {
+  Profile() {
     setenv("NAVMISC_KEY_FILE", (keys_ / L"secret.key").ToUtf8().c_str(), 1);
     MakeDir(root_ / L"TrackerRes");
     MakeDir(root_ / L"SportRes");
   }
-  void TearDown() override { unsetenv("NAVMISC_KEY_FILE"); }
+  ~Profile() override { unsetenv("NAVMISC_KEY_FILE"); }
   void WriteProfile(const wchar_t* folder, const std::string& text) {
     MakeDir(PathJoin(root_.path(), folder));
     WriteFileBytes(PathJoin(PathJoin(root_.path(), folder), L"USER_MAP_INFO.INI"), text);
   }
 
-  TempDir root_;
   TempDir keys_;
-  DataRootScope scope_{root_.path()};
 };
+
+// The values every application's profile keeps, then those of the tracker's only.
+auto Values(USER_MAP_INFO& p) {
+  return std::tie(p.name, p.male, p.year, p.height, p.weight, p.userAccount, p.metric, p.localize,
+                  p.dayLight, p.timeZoneShift, p.devVersion, p.devSerial, p.exportGpx);
+}
+auto TrackerValues(USER_MAP_INFO& p) {
+  return std::tie(p.trackerType, p.trackerTimeZone, p.trackerDayLight, p.trackerTimeZoneShift);
+}
 
 TEST_F(Profile, MissingFilesReadAsDefaults) {
   USER_MAP_INFO p(GPS_APP_TRIP);
   p.localize = L"DEU";
   p.SetWeightHeight(1, 2, 2020, 70, 180);
   p.ReadInfo();
-  EXPECT_EQ(p.localize, L"ENG");
-  EXPECT_EQ(p.height, 170.0);
-  EXPECT_EQ(p.weight, 60.0);
-  EXPECT_TRUE(p.male);
-  EXPECT_TRUE(p.metric);
-  EXPECT_TRUE(p.tutorial);
-  EXPECT_TRUE(p.verEnableCheck);
-  EXPECT_EQ(p.verCheckPeriodTime, 604800);
-  EXPECT_EQ(p.tempMode, 1);
-  EXPECT_EQ(p.tempStyle, 2);
-  EXPECT_TRUE(p.autoLaunch);
-  EXPECT_TRUE(p.geotagCallEditor);
-  EXPECT_FALSE(p.timeZoneShiftOn);
+  EXPECT_EQ(std::tuple(p.localize.str(), p.height, p.weight, p.male, p.metric, p.tutorial,
+                       p.verEnableCheck, p.verCheckPeriodTime, p.tempMode, p.tempStyle,
+                       p.autoLaunch, p.geotagCallEditor, p.timeZoneShiftOn),
+            std::tuple(L"ENG", 170.0, 60.0, true, true, true, true, 604800, 1, 2, true, true,
+                       false));
   EXPECT_TRUE(p.weightHeights.IsEmpty());
-  EXPECT_EQ(p.GetProfilePathName(), PathJoin(PathJoin(root_.path(), L"Resource"), L"USER_MAP_INFO.INI"));
+  EXPECT_EQ(p.GetProfilePathName(),
+            PathJoin(PathJoin(root_.path(), L"Resource"), L"USER_MAP_INFO.INI"));
 }
 
 TEST_F(Profile, EveryValueAndListRoundTrips) {
   g_sVersionInfo = {2, 1, 30, 4};
   USER_MAP_INFO p(GPS_APP_TRACKER);
-  p.name = L"Zoë";
-  p.male = false;
-  p.year = 1980;
-  p.height = 181.5;
-  p.weight = 77.25;
-  p.userAccount = L"me@example.org";
-  p.trackerType = 3;
-  p.trackerTimeZone = L"+08:00";
-  p.trackerDayLight = true;
-  p.trackerTimeZoneShift = 28800;
-  p.metric = false;
-  p.localize = L"CHT";
-  p.dayLight = true;
-  p.timeZoneShift = -3600;
-  p.devVersion = 1.25;
-  p.devSerial = 12345;
-  p.exportGpx = L"/home/me/gpx folder";
+  Values(p) = std::tuple(L"Zoë", false, 1980, 181.5, 77.25, L"me@example.org", false, L"CHT", true,
+                         -3600, 1.25, 12345, L"/home/me/gpx folder");
+  TrackerValues(p) = std::tuple(3, L"+08:00", true, 28800);
   auto* m = new MARKER_ITEM_INFO;
-  m->id = L"M1";
-  m->url = L"http://x/m1.png";
+  std::tie(m->id, m->url) = std::tuple(L"M1", L"http://x/m1.png");
   p.markers.AddTail(m);
   auto* r = new RUNNER_ITEM_INFO;
-  r->id = L"R1";
-  r->frameCount = 2;
-  r->frameUrl[0] = L"a.png";
-  r->frameUrl[1] = L"b.png";
+  std::tie(r->id, r->frameCount, r->frameUrl[0], r->frameUrl[1]) =
+      std::tuple(L"R1", 2, L"a.png", L"b.png");
   p.runners.AddTail(r);
   p.SetWeightHeight(3, 14, 2021, 76.5, 181);
   ASSERT_TRUE(p.WriteInfo());
 
   USER_MAP_INFO q(GPS_APP_TRACKER);
   q.ReadInfo();
-  EXPECT_EQ(q.name, L"Zoë");
-  EXPECT_FALSE(q.male);
-  EXPECT_EQ(q.year, 1980);
-  EXPECT_EQ(q.height, 181.5);
-  EXPECT_EQ(q.weight, 77.25);
-  EXPECT_EQ(q.userAccount, L"me@example.org");
-  EXPECT_EQ(q.trackerType, 3);
-  EXPECT_EQ(q.trackerTimeZone, L"+08:00");
-  EXPECT_TRUE(q.trackerDayLight);
-  EXPECT_EQ(q.trackerTimeZoneShift, 28800);
-  EXPECT_FALSE(q.metric);
-  EXPECT_EQ(q.localize, L"CHT");
-  EXPECT_EQ(q.version[0], 2);
-  EXPECT_EQ(q.version[3], 4);
+  EXPECT_EQ(Values(q), Values(p));
+  EXPECT_EQ(TrackerValues(q), TrackerValues(p));
+  EXPECT_EQ(std::vector<int>(q.version, q.version + 4), std::vector<int>({2, 1, 30, 4}));
   EXPECT_FALSE(q.timeZoneShiftOn) << "written by a current version";
-  EXPECT_EQ(q.timeZoneShift, -3600);
-  EXPECT_EQ(q.devVersion, 1.25);
-  EXPECT_EQ(q.devSerial, 12345);
-  EXPECT_EQ(q.exportGpx, L"/home/me/gpx folder");
-  ASSERT_EQ(q.markers.GetCount(), 1);
-  EXPECT_EQ(static_cast<MARKER_ITEM_INFO*>(q.markers.GetHead())->url, L"http://x/m1.png");
-  ASSERT_EQ(q.runners.GetCount(), 1);
-  EXPECT_EQ(static_cast<RUNNER_ITEM_INFO*>(q.runners.GetHead())->frameUrl[1], L"b.png");
-  double w = 0, h = 0;
-  ASSERT_TRUE(q.GetWeightHeight(3, 14, 2021, w, h));
-  EXPECT_EQ(w, 76.5);
-  EXPECT_EQ(h, 181.0);
-
+  // Written again, what was read gives the same file: the lists came back too.
   const std::string text = ReadFileBytes(q.GetProfilePathName());
-  EXPECT_NE(text.find("version=2,1,30,4"), std::string::npos);
-  EXPECT_NE(text.find("date=03/14/2021"), std::string::npos);
-  EXPECT_NE(text.find("[SECTION_MKR(0)]"), std::string::npos);
-  EXPECT_NE(text.find("url_1=b.png"), std::string::npos);
-  EXPECT_NE(text.find("tracker_timezone"), std::string::npos);
+  ASSERT_TRUE(q.WriteInfo());
+  EXPECT_EQ(ReadFileBytes(q.GetProfilePathName()), text);
+  for (const char* line : {"version=2,1,30,4\n", "date=03/14/2021\n", "[SECTION_MKR(0)]\n",
+                           "url_1=b.png\n", "tracker_timezone=+08:00\n"})
+    EXPECT_NE(text.find(line), std::string::npos) << line;
 
   // Other applications neither keep nor read the tracker values.
   USER_MAP_INFO sport(GPS_APP_SPORT);
@@ -138,9 +101,10 @@ TEST_F(Profile, EveryValueAndListRoundTrips) {
 
 TEST_F(Profile, TimeShiftOnlyForTheOldReleaseVersions) {
   const std::pair<const char*, bool> cases[] = {
-      {"1,0,807,0", true},     {"1,0,807,1599", true}, {"1,0,807,1600", false},
-      {"1,0,808,100", false},  {"1,0,807,-5", true},   {"", false},
-      {"1,0,807", true}  /* the missing fourth number stays 0 */,      {"x,0,807,1", false},   {"3, 2, 807, 12", true},
+      {"1,0,807,0", true},    {"1,0,807,1599", true}, {"1,0,807,1600", false},
+      {"1,0,808,100", false}, {"1,0,807,-5", true},   {"", false},
+      {"x,0,807,1", false},   {"3, 2, 807, 12", true},
+      {"1,0,807", true},  // the missing fourth number stays 0
   };
   for (const auto& [version, on] : cases) {
     WriteProfile(L"Resource", std::string("[SECTION]\nversion=") + version +
@@ -190,7 +154,8 @@ TEST_F(Profile, SuiteSettingsWinForTheVersionCheck) {
   EXPECT_EQ(p.verCheckPeriodTime, 100) << "a key the suite file lacks comes from the profile";
   p.verLastCheckTime = 1700000000;
   ASSERT_TRUE(p.WriteInfo());
-  EXPECT_NE(ReadFileBytes(root_ / L"AMBRO_SUITE_INFO.INI").find("ver_last_check_time=1700000000"), std::string::npos);
+  EXPECT_NE(ReadFileBytes(root_ / L"AMBRO_SUITE_INFO.INI").find("ver_last_check_time=1700000000"),
+            std::string::npos);
 }
 
 TEST_F(Profile, WeightHeightHistory) {
