@@ -119,13 +119,6 @@ struct Fixture {
   }
 };
 
-// The Folder name is the local date and time of the call, as the user writes them.
-void ExpectDateName(const std::string& name, long before, long after) {
-  bool found = false;
-  for (long t = before; t <= after && !found; ++t) found = name == UserDateTimeText(t).ToUtf8();
-  EXPECT_TRUE(found) << name;
-}
-
 TEST(ExportKml, WritesEveryPlacemarkByteForByteInEachPictureMode) {
   Fixture f;
   const std::string file1 = "file:///" + f.File("p1.jpg");
@@ -149,7 +142,10 @@ TEST(ExportKml, WritesEveryPlacemarkByteForByteInEachPictureMode) {
     std::string name;
     EXPECT_EQ(MaskKmlDate(ReadFileBytes(f.root / L"out.kml"), &name), f.Expected(c.src1, c.src2, file3))
         << "mode " << c.mode;
-    ExpectDateName(name, before, after);
+    // The Folder name is the local date and time of the call, as the user writes them.
+    bool found = false;
+    for (long t = before; t <= after && !found; ++t) found = name == UserDateTimeText(t).ToUtf8();
+    EXPECT_TRUE(found) << name;
   }
 }
 
@@ -160,7 +156,6 @@ TEST(ExportKmz, PacksNumberedPhotoCopiesThenTheDocument) {
   const char* oldTmp = std::getenv("TMPDIR");
   const std::string saved = oldTmp ? oldTmp : "";
   setenv("TMPDIR", scratch.path().ToUtf8().c_str(), 1);
-  WriteFileBytes(f.root / L"trip.kmz", "an older archive");
   const int result = ExportKmz(f.root / L"trip.kmz", f.tracks, f.items);
   CStringList left;
   const int leftCount = GetContent(scratch.path(), L"*.*", left);
