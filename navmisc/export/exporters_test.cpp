@@ -16,6 +16,7 @@
 #include "navmisc/export/gpx_export.h"
 #include "navmisc/export/kml_export.h"
 #include "navmisc/export/tcx_export.h"
+#include "navmisc/platform/format.h"
 #include "navmisc/platform/output_file.h"
 #include "navmisc/records/trip.h"
 #include "testutil.h"
@@ -147,26 +148,23 @@ TEST(Exporters, NumbersIgnoreACommaDecimalLocale) {
   }
 }
 
-std::string LatLon(double lat, double lon) {
-  char buf[64];
-  std::snprintf(buf, sizeof buf, "%.6f,%.6f", lat, lon);
-  return buf;
-}
-
 // "lat,lon" of every row of a gpsbabel unicsv listing (whose first columns are No, Latitude,
 // Longitude) or of every vertex of the POINT and LINESTRING geometries in an ogrinfo listing.
 Points ReadPoints(const std::string& listing) {
   Points out;
+  const auto add = [&out](double lat, double lon) {
+    out.push_back(navmisc::FormatA("%.6f,%.6f", lat, lon));
+  };
   std::istringstream lines(listing);
   for (std::string line; std::getline(lines, line);) {
     double x, y;
     int n;
-    if (std::sscanf(line.c_str(), "%d,%lf,%lf", &n, &y, &x) == 3) out.push_back(LatLon(y, x));
+    if (std::sscanf(line.c_str(), "%d,%lf,%lf", &n, &y, &x) == 3) add(y, x);
     const size_t open = line.find('(');
     if (open == std::string::npos || (line.find("POINT") > open && line.find("LINESTRING") > open)) continue;
     std::istringstream vertices(line.substr(open + 1, line.find(')') - open - 1));
     for (std::string v; std::getline(vertices, v, ',');) {
-      if (std::sscanf(v.c_str(), "%lf %lf", &x, &y) == 2) out.push_back(LatLon(y, x));
+      if (std::sscanf(v.c_str(), "%lf %lf", &x, &y) == 2) add(y, x);
     }
   }
   return out;

@@ -140,10 +140,8 @@ TEST(Reduction, EarlierStopPassKeepsItsTraceTexts) {
     for (int i = 0; i < count; ++i) kept[form].push_back(array[i].valid);
   }
   EXPECT_EQ(kept[0], kept[1]);
-  EXPECT_NE(reduceText.find("\nStop point = 20"), std::string::npos);
   EXPECT_NE(reduceText.find(", Still Stop point , Draw out."), std::string::npos);
   EXPECT_NE(reduceText.find("\n\tptStop -> pt26 = "), std::string::npos);
-  EXPECT_EQ(reduceText.find("Start Moving point"), std::string::npos);
   EXPECT_EQ(reviseText.find("Draw out."), std::string::npos);
   EXPECT_NE(reviseText.find("\nptStop -> pt26 = "), std::string::npos);
   EXPECT_NE(reviseText.find("\nStart Moving point = 25"), std::string::npos);

@@ -68,8 +68,7 @@ TEST(Mapping, TimeToPointInterpolatesOnePointPerSecond) {
     long speed = -1;
     EXPECT_EQ(track->MappingTimeToPoint(c.time, lat, lon, speed, alt), c.found) << c.time;
     if (!c.found) {
-      EXPECT_EQ(lat, 0.0);  // cleared; speed and altitude untouched
-      EXPECT_EQ(speed, -1);
+      EXPECT_EQ(std::tuple(lat, speed, alt), std::tuple(0.0, -1L, -1.0)) << c.time;  // only lat cleared
       continue;
     }
     EXPECT_EQ(+answer.time, c.answerTime) << c.time;
@@ -162,8 +161,7 @@ TEST(Mapping, PlacementPrefersTimeThenPositionThenClears) {
     EXPECT_NEAR(lon, c.placedLon, 1e-9) << c.name;
     EXPECT_EQ(time, c.placedTime) << c.name;
     if (!c.placed) {
-      EXPECT_EQ(alt, 0.0);
-      EXPECT_EQ(speed, 0);
+      EXPECT_EQ(std::tuple(alt, speed), std::tuple(0.0, 0L)) << c.name;
     }
   }
 

@@ -2,6 +2,7 @@
 
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <memory>
 #include <string>
 #include <tuple>
@@ -108,9 +109,8 @@ TEST(OptimizeWaypoint, ShortTracksAreNotRevisedOrSmoothed) {
     bool revised, smoothed;
   } cases[] = {{50, false, false}, {51, true, false}, {101, true, false}, {102, true, true}};
   for (const auto& c : cases) {
-    auto trip = std::make_unique<BLOG_ITEM_INFO>(GPS_APP_TRIP, L"OPT", 0);
-    auto* track = new TRACK_ITEM_INFO(trip.get());
-    trip->tracks.AddTail(track);
+    auto trip = MakeTrip({{0, 0}});
+    auto* track = static_cast<TRACK_ITEM_INFO*>(trip->tracks.GetHead());
     // A straight walk with one wild fix; without it 101 fixes would still be reduced.
     for (int i = 0; i < c.points; ++i) {
       auto* p = new WAYPOINT_ITEM_INFO(nullptr);
@@ -119,11 +119,9 @@ TEST(OptimizeWaypoint, ShortTracksAreNotRevisedOrSmoothed) {
       track->points.AddTail(p);
     }
     trip->OptimizeWaypoint(GPS_APP_TRIP, 1, nullptr, nullptr);
-    int essential = 0, badFixes = 0;
-    for (auto* p : PointsOf(track)) {
-      essential += p->type == navmisc::kLevelNeverDropped;
-      badFixes += p->type == navmisc::kLevelBadFix;
-    }
+    const auto points = PointsOf(track);
+    const auto essential = std::ranges::count(points, navmisc::kLevelNeverDropped, &WAYPOINT_ITEM_INFO::type);
+    const auto badFixes = std::ranges::count(points, navmisc::kLevelBadFix, &WAYPOINT_ITEM_INFO::type);
     EXPECT_EQ(badFixes, c.revised ? 1 : 0) << c.points;
     // Smoothing hands every remaining point a level of 100 or below.
     EXPECT_EQ(essential, c.smoothed ? 0 : c.points - badFixes) << c.points;
