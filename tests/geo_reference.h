@@ -37,22 +37,13 @@ class OwnedPoints {
   WAYPOINT_ITEM_INFO& operator[](int i) {
     return *static_cast<WAYPOINT_ITEM_INFO*>(list.GetAt(list.FindIndex(i)));
   }
-  // The positions in the list of the points whose kept-mark is set.
-  std::vector<int> Marked() const {
+  // The positions in the list of the points whose kept-mark is set (or, with false, clear).
+  std::vector<int> Marked(bool set = true) const {
     std::vector<int> out;
     int i = 0;
-    for (void* v : list) {
-      auto* p = static_cast<WAYPOINT_ITEM_INFO*>(v);
-      if (p && p->flags[WAYPOINT_ITEM_INFO::kFlagKept]) out.push_back(i);
+    for (auto* p : navmisc::Items<WAYPOINT_ITEM_INFO>(list)) {
+      if (p && (p->flags[WAYPOINT_ITEM_INFO::kFlagKept] != 0) == set) out.push_back(i);
       ++i;
-    }
-    return out;
-  }
-  // Every position from 0 to the list's count except those in `gaps`.
-  std::vector<int> AllBut(const std::vector<int>& gaps) const {
-    std::vector<int> out;
-    for (int i = 0; i < list.GetCount(); ++i) {
-      if (std::find(gaps.begin(), gaps.end(), i) == gaps.end()) out.push_back(i);
     }
     return out;
   }
@@ -128,11 +119,16 @@ inline bool OptimizeTrackLiterally(TRACK_ITEM_INFO& track, int optimise, int* pr
                                    bool* keepGoing) {
   constexpr int kKept = WAYPOINT_ITEM_INFO::kFlagKept;
   CPtrList& points = track.points;
+  // Gives every point of `list` at `from` (and kept-mark `kept`) the level `to`.
+  auto relevel = [](CPtrList& list, bool kept, int from, int to) {
+    for (auto* p : navmisc::Items<WAYPOINT_ITEM_INFO>(list)) {
+      if (p && (p->flags[kKept] != 0) == kept && p->type == from) p->type = to;
+    }
+  };
   auto collect = [&points](CPtrList& into) {
     into.RemoveAll();
     for (void* v : points) {
-      auto* p = static_cast<WAYPOINT_ITEM_INFO*>(v);
-      if (p && p->type == 10000) into.AddTail(p);
+      if (v && static_cast<WAYPOINT_ITEM_INFO*>(v)->type == 10000) into.AddTail(v);
     }
   };
   if (points.GetCount() == 1 && track.OwnsPoints()) {
@@ -141,15 +137,12 @@ inline bool OptimizeTrackLiterally(TRACK_ITEM_INFO& track, int optimise, int* pr
     points.AddTail(twin);
   }
   if (optimise) {
-    for (void* v : points) {
-      if (v) static_cast<WAYPOINT_ITEM_INFO*>(v)->type = 10000;
+    for (auto* p : navmisc::Items<WAYPOINT_ITEM_INFO>(points)) {
+      if (p) p->type = 10000;
     }
     if (points.GetCount() > 50) {
       Revise(points);
-      for (void* v : points) {
-        auto* p = static_cast<WAYPOINT_ITEM_INFO*>(v);
-        if (p && !p->flags[kKept] && p->type == 10000) p->type = -2;
-      }
+      relevel(points, false, 10000, -2);
     }
   }
   if (progress) *progress += 100;
@@ -158,10 +151,7 @@ inline bool OptimizeTrackLiterally(TRACK_ITEM_INFO& track, int optimise, int* pr
     collect(working);
     if (working.GetCount() > 100) {
       Reduction(working);
-      for (void* v : working) {
-        auto* p = static_cast<WAYPOINT_ITEM_INFO*>(v);
-        if (!p->flags[kKept] && p->type == 10000) p->type = -1;
-      }
+      relevel(working, false, 10000, -1);
     }
     collect(working);
   }
@@ -169,10 +159,7 @@ inline bool OptimizeTrackLiterally(TRACK_ITEM_INFO& track, int optimise, int* pr
   for (int k = 100; k >= 0; --k) {
     if (optimise && working.GetCount() > 100) {
       Smooth(working, k * 0.0001);
-      for (void* v : working) {
-        auto* p = static_cast<WAYPOINT_ITEM_INFO*>(v);
-        if (p->flags[kKept] && p->type == 10000) p->type = k;
-      }
+      relevel(working, true, 10000, k);
     }
     if (progress) *progress += 100;
     if (keepGoing && !*keepGoing) return false;
@@ -184,17 +171,14 @@ inline bool OptimizeTrackLiterally(TRACK_ITEM_INFO& track, int optimise, int* pr
 inline void OptimizeTripLiterally(BLOG_ITEM_INFO& trip, GPS_APP_PROG_TYPE product, int optimise,
                                   int* progress, bool* keepGoing) {
   trip.optLevel = 0;
-  for (void* v : trip.tracks) {
-    auto* track = static_cast<TRACK_ITEM_INFO*>(v);
+  for (auto* track : navmisc::Items<TRACK_ITEM_INFO>(trip.tracks)) {
     if (!track) continue;
     if (!OptimizeTrackLiterally(*track, optimise, progress, keepGoing)) return;
     const long limit = product == 1 ? 1000 : 11000;
     int level = 101;
     for (int l = 0; l <= 100 && level == 101; ++l) {
       long atLeast = 0;
-      for (void* w : track->points) {
-        if (w && static_cast<WAYPOINT_ITEM_INFO*>(w)->type >= l) ++atLeast;
-      }
+      for (auto* p : navmisc::Items<WAYPOINT_ITEM_INFO>(track->points)) atLeast += p && p->type >= l;
       if (atLeast < limit) level = l;
     }
     trip.optLevel = std::max(trip.optLevel, level);

@@ -33,9 +33,7 @@ struct Fixture {
   std::unique_ptr<PHOTO_ITEM_INFO> ph1, ph2, ph3;
   Fixture() {
     trip.timeZoneShift = 3600;
-    trip.optOptimize = true;
-    trip.optRevise = true;
-    trip.optRedundance = true;
+    trip.optOptimize = trip.optRevise = trip.optRedundance = true;
     trip.optLevel = 5;
     t1 = MakeTrack(L"a", {{25.1, 121.5, 100, kT, 3600, -1, 10},
                           {9, 9, 9, -1},
@@ -118,7 +116,6 @@ std::unique_ptr<TRACK_ITEM_INFO> LongTrack(int count, int untimed = -1) {
 size_t LineCount(const std::string& s) { return static_cast<size_t>(std::count(s.begin(), s.end(), '\r')); }
 
 TEST(ExportCsv, SplitsAtTheLineLimit) {
-  TempDir dir;
   CPtrList photos;
   const struct {
     int first, second;  // points of two tracks
@@ -130,36 +127,33 @@ TEST(ExportCsv, SplitsAtTheLineLimit) {
       {65000, 534, 7, {65534, 1}},  // an untimed point still takes its place in the count
   };
   for (const auto& c : cases) {
-    RemoveDir(dir.path());
-    MakeDir(dir.path());
+    TempDir dir;
     WriteFileBytes(dir / L"out.csv", "old");
-    auto a = LongTrack(c.first, c.untimed);
-    auto b = LongTrack(c.second);
+    auto a = LongTrack(c.first, c.untimed), b = LongTrack(c.second);
     CPtrList tracks;
     tracks.AddTail(a.get());
     tracks.AddTail(b.get());
     ASSERT_EQ(ExportCsv(dir / L"out.csv", tracks, photos, nullptr, true), 1);
+    const auto numbered = [&](size_t i) { return dir / FormatString(L"out_%d.csv", static_cast<int>(i)); };
     if (c.lines.empty()) {
       EXPECT_EQ(LineCount(ReadFileBytes(dir / L"out.csv")), static_cast<size_t>(c.first + c.second + 1));
-      EXPECT_FALSE(FileExists(dir / L"out_1.csv"));
-      continue;
+    } else {
+      EXPECT_FALSE(FileExists(dir / L"out.csv")) << "the target is cleared even when the lines go elsewhere";
     }
-    EXPECT_FALSE(FileExists(dir / L"out.csv")) << "the target is cleared even when the lines go elsewhere";
     for (size_t i = 0; i < c.lines.size(); ++i) {
-      const std::string text = ReadFileBytes(dir / FormatString(L"out_%d.csv", static_cast<int>(i + 1)));
+      const std::string text = ReadFileBytes(numbered(i + 1));
       EXPECT_EQ(LineCount(text), c.lines[i]) << c.first << "+" << c.second << " file " << i + 1;
       EXPECT_EQ(text.substr(0, kHeader.size()), i == 0 ? kHeader : kContinuation);
     }
-    EXPECT_FALSE(FileExists(dir / FormatString(L"out_%d.csv", static_cast<int>(c.lines.size() + 1))));
+    EXPECT_FALSE(FileExists(numbered(c.lines.size() + 1)));
+
+    // A later numbered file that cannot be made (a folder is in its way) fails the export.
+    if (c.lines.size() < 2) continue;
+    ASSERT_TRUE(DeleteFile(numbered(2)));
+    ASSERT_TRUE(MakeDir(numbered(2)));
+    EXPECT_EQ(ExportCsv(dir / L"out.csv", tracks, photos, nullptr, true), 0);
+    EXPECT_EQ(LineCount(ReadFileBytes(numbered(1))), c.lines[0]);
   }
-  // A later numbered file that cannot be made (a folder is in its way) fails the export.
-  auto big = LongTrack(65534);
-  CPtrList tracks;
-  tracks.AddTail(big.get());
-  DeleteFile(dir / L"out_2.csv");
-  ASSERT_TRUE(MakeDir(dir / L"out_2.csv"));
-  EXPECT_EQ(ExportCsv(dir / L"out.csv", tracks, photos, nullptr, true), 0);
-  EXPECT_EQ(LineCount(ReadFileBytes(dir / L"out_1.csv")), 65535u);
 }
 
 }  // namespace

@@ -1,6 +1,13 @@
-// What every exporter does alike: progress and stopping, unwritable targets, and numbers that
-// ignore the process locale.
+// What every exporter does alike (progress and stopping, existing and unwritable targets,
+// numbers that ignore the process locale), and the documents as real readers see them: xmllint
+// against the published schemas, and gpsbabel, GDAL's ogrinfo and unzip reading them back. The
+// reader tests are skipped when a tool or the schema folder is missing (scripts/setup.sh
+// installs the tools).
+#include <sys/stat.h>
+
+#include <cstdio>
 #include <functional>
+#include <sstream>
 
 #include <gtest/gtest.h>
 
@@ -9,16 +16,19 @@
 #include "navmisc/export/gpx_export.h"
 #include "navmisc/export/kml_export.h"
 #include "navmisc/export/tcx_export.h"
-#include "navmisc/export/tcx_from_trip.h"
+#include "navmisc/platform/format.h"
 #include "navmisc/platform/output_file.h"
+#include "navmisc/records/trip.h"
 #include "testutil.h"
 
 namespace {
 
 using namespace navmisc::exporttest;
+using navmisc::testutil::DataRootScope;
 using navmisc::testutil::ReadFileBytes;
 using navmisc::testutil::TempDir;
 using navmisc::testutil::WriteFileBytes;
+using Points = std::vector<std::string>;
 
 struct Exporter {
   const wchar_t* extension;
@@ -26,40 +36,73 @@ struct Exporter {
   std::function<int(const CString& path, int* counter, bool* keepGoing)> run;
 };
 
-// Three track points (one without a time) and two items, in every format.
+// A trip folder with two photos and one track (one of its points without a time), all inside
+// what the schemas allow, and each format's exporter of them.
 struct Fixture {
-  std::unique_ptr<TRACK_ITEM_INFO> track = MakeTrack(
-      L"t", {{47.376887, 8.541694, 408.5, 1714543200, 5400}, {1, 1, 1, -1}, {-33.5, -70.25, -2.5, 1714543260}});
-  std::unique_ptr<PHOTO_ITEM_INFO> marker = MakeItem(1, L"m", L"d", 47.5, 8.5, 400, 1714543230);
-  std::unique_ptr<PHOTO_ITEM_INFO> photo = MakeItem(0, L"p", L"", -1.5, -2.25, 0, 0);
+  TempDir root;
+  DataRootScope scope{root.path()};
+  BLOG_ITEM_INFO trip{GPS_APP_TRIP, L"T1", 0};
+  std::unique_ptr<TRACK_ITEM_INFO> track = MakeTrack(L"Z\u00fcrich \u2013 \u00dcetliberg",
+                                                     {{47.376887, 8.541694, 408.5, 1714543200, 5400},
+                                                      {47.3770015, 8.5421234, 409.25, 1714543210, 7200},
+                                                      {1, 1, 1, -1},
+                                                      {-33.856784, -70.250001, -2.5, 1714550400, 3600}});
+  std::unique_ptr<PHOTO_ITEM_INFO> photos[2] = {
+      MakeItem(0, L"Aussicht \u2615", L"Blick\r\nnach S\u00fcden", 47.3497, 8.4912, 870, 1714546900),
+      MakeItem(0, L"Bahnhof", L"", 47.378, 8.54, 408, 0)};
   CPtrList tracks, items;
   CTcxActivities activity;
+  const Points points = {"47.376887,8.541694", "47.377001,8.542123", "-33.856784,-70.250001"};
+  const Points photoPoints = {"47.349700,8.491200", "47.378000,8.540000"};
+  const Points allPoints = {"47.376887,8.541694", "47.377001,8.542123", "-33.856784,-70.250001",
+                            "47.349700,8.491200", "47.378000,8.540000"};
   std::vector<Exporter> exporters;
 
   Fixture() {
+    MakeDir(trip.GetResourcePath());
     tracks.AddTail(track.get());
-    items.AddTail(marker.get());
-    items.AddTail(photo.get());
-    FillTcxActivity(tracks, CTcxActivities::kRunning, activity);
+    for (int i = 0; i < 2; ++i) {
+      photos[i]->trip = &trip;
+      photos[i]->itemName = FormatString(L"photo%d.jpg", i + 1);
+      WriteFileBytes(photos[i]->GetFilePathName(), std::string(5000, 'a'));
+      items.AddTail(photos[i].get());
+    }
+    int n = 0;
+    for (auto* p : navmisc::Items<WAYPOINT_ITEM_INFO>(track->points)) {
+      p->flags[WAYPOINT_ITEM_INFO::kFlagPresence] = 0x0F;
+      std::tie(p->workDistance, p->workHeartRate, p->workCadence, p->workSpeed) =
+          std::make_tuple(100.0 * n, 110 + n, 80 + n, 1.5 * n);
+      ++n;
+    }
+    activity.Id = L"2024-05-01T06:00:00Z";
+    TcxLap* lap = activity.AddLap();
+    lap->startTime = 1714543200;
+    lap->totalTimeSeconds = 7200;
+    lap->calories = 320;  // the schema requires calories
+    lap->tracks.AddTail(track.get());
     exporters = {
-        {L"gpx", 5, [this](const CString& p, int* c, bool* k) { return ExportGpx(p, tracks, items, c, k); }},
-        {L"kml", 5, [this](const CString& p, int* c, bool* k) { return ExportKml(p, tracks, items, 0, c, k); }},
-        {L"kmz", 5, [this](const CString& p, int* c, bool* k) { return ExportKmz(p, tracks, items, nullptr, c, k); }},
-        {L"tcx", 3, [this](const CString& p, int* c, bool* k) { return ExportTcx(p, activity, c, k); }},
-        {L"csv", 3, [this](const CString& p, int* c, bool* k) { return ExportCsv(p, tracks, items, nullptr, true, c, k); }},
+        {L"gpx", 6, [this](const CString& p, int* c, bool* k) { return ExportGpx(p, tracks, items, c, k); }},
+        {L"kml", 6, [this](const CString& p, int* c, bool* k) { return ExportKml(p, tracks, items, 0, c, k); }},
+        {L"kmz", 6, [this](const CString& p, int* c, bool* k) { return ExportKmz(p, tracks, items, nullptr, c, k); }},
+        {L"tcx", 4, [this](const CString& p, int* c, bool* k) { return ExportTcx(p, activity, c, k); }},
+        {L"csv", 4, [this](const CString& p, int* c, bool* k) { return ExportCsv(p, tracks, items, &trip, true, c, k); }},
     };
   }
+  std::string Path(const wchar_t* name) const { return ShellQuote((root / name).ToUtf8()); }
 };
 
-TEST(Exporters, CountProgressAndAStoppedExportLeavesNothing) {
-  TempDir dir;
+TEST(Exporters, CountProgressReplaceTargetsAndAStoppedExportLeavesNothing) {
   Fixture f;
   for (const Exporter& e : f.exporters) {
-    const CString path = dir / (CString(L"out.") + e.extension);
+    const CString path = f.root / (CString(L"out.") + e.extension);
+    // An existing, longer, read-only file is replaced whole.
+    WriteFileBytes(path, std::string(100000, 'x'));
+    ASSERT_EQ(::chmod(navmisc::NativePath(path).c_str(), 0444), 0);
     int counter = 0;
     bool keepGoing = true;
     EXPECT_EQ(e.run(path, &counter, &keepGoing), 1) << e.extension;
     EXPECT_EQ(counter, e.steps) << e.extension;
+    EXPECT_EQ(ReadFileBytes(path).find("xxxx"), std::string::npos) << e.extension;
     // The flag is read after every step: cleared from the start, the export stops after one.
     keepGoing = false;
     counter = 0;
@@ -70,42 +113,137 @@ TEST(Exporters, CountProgressAndAStoppedExportLeavesNothing) {
 }
 
 TEST(Exporters, UnwritableTargetsGiveZeroAndAReason) {
-  TempDir dir;
   Fixture f;
-  WriteFileBytes(dir / L"file", "x");
+  WriteFileBytes(f.root / L"file", "x");
   const struct {
     CString target;
     const char* why;
-  } targets[] = {{dir / L"missing/out", "No such file or directory"},
-                 {dir / L"file/out", "Not a directory"},
-                 {dir.path(), "Is a directory"}};
+  } targets[] = {{f.root / L"missing/out", "No such file or directory"},
+                 {f.root / L"file/out", "Not a directory"},
+                 {f.root.path(), "Is a directory"}};
   for (const Exporter& e : f.exporters) {
     for (const auto& t : targets) {
       EXPECT_EQ(e.run(t.target, nullptr, nullptr), 0) << e.extension << " " << t.target.ToUtf8();
       EXPECT_EQ(navmisc::LastOpenError(), t.why) << e.extension << " " << t.target.ToUtf8();
     }
   }
-  EXPECT_EQ(ReadFileBytes(dir / L"file"), "x");
-  EXPECT_FALSE(FileExists(dir / L"missing"));
+  EXPECT_EQ(ReadFileBytes(f.root / L"file"), "x");
+  EXPECT_FALSE(FileExists(f.root / L"missing"));
 }
 
 TEST(Exporters, NumbersIgnoreACommaDecimalLocale) {
-  TempDir dir;
   Fixture f;
   std::vector<std::string> inC;
   for (const Exporter& e : f.exporters) {
-    ASSERT_EQ(e.run(dir / (CString(L"c.") + e.extension), nullptr, nullptr), 1);
-    inC.push_back(MaskKmlDate(ReadFileBytes(dir / (CString(L"c.") + e.extension))));
+    ASSERT_EQ(e.run(f.root / (CString(L"c.") + e.extension), nullptr, nullptr), 1);
+    inC.push_back(MaskKmlDate(ReadFileBytes(f.root / (CString(L"c.") + e.extension))));
   }
-  EXPECT_NE(inC[0].find("<trkpt lat=\"-33.500000\" lon=\"-70.250000\">"), std::string::npos);
   CommaLocale locale;
   if (!locale.ok()) GTEST_SKIP() << "no comma-decimal locale installed (scripts/setup.sh makes de_DE.UTF-8)";
   for (size_t i = 0; i < f.exporters.size(); ++i) {
     if (f.exporters[i].extension == std::wstring(L"kmz")) continue;  // holds the KML, and zip times
-    const CString path = dir / (CString(L"de.") + f.exporters[i].extension);
+    const CString path = f.root / (CString(L"de.") + f.exporters[i].extension);
     ASSERT_EQ(f.exporters[i].run(path, nullptr, nullptr), 1);
     EXPECT_EQ(MaskKmlDate(ReadFileBytes(path)), inC[i]) << f.exporters[i].extension;
   }
+}
+
+// "lat,lon" of every row of a gpsbabel unicsv listing (whose first columns are No, Latitude,
+// Longitude) or of every vertex of the POINT and LINESTRING geometries in an ogrinfo listing.
+Points ReadPoints(const std::string& listing) {
+  Points out;
+  const auto add = [&out](double lat, double lon) {
+    out.push_back(navmisc::FormatA("%.6f,%.6f", lat, lon));
+  };
+  std::istringstream lines(listing);
+  for (std::string line; std::getline(lines, line);) {
+    double x, y;
+    int n;
+    if (std::sscanf(line.c_str(), "%d,%lf,%lf", &n, &y, &x) == 3) add(y, x);
+    const size_t open = line.find('(');
+    if (open == std::string::npos || (line.find("POINT") > open && line.find("LINESTRING") > open)) continue;
+    std::istringstream vertices(line.substr(open + 1, line.find(')') - open - 1));
+    for (std::string v; std::getline(vertices, v, ',');) {
+      if (std::sscanf(v.c_str(), "%lf %lf", &x, &y) == 2) add(y, x);
+    }
+  }
+  return out;
+}
+
+std::string MissingTool(std::initializer_list<const char*> programs, bool schemas) {
+  for (const char* p : programs) {
+    if (!HaveProgram(p)) return std::string(p) + " is not installed (scripts/setup.sh installs it)";
+  }
+  if (schemas && SchemaDir().empty()) return "the schema folder (NAVMISC_SCHEMA_DIR) is not there";
+  return {};
+}
+#define REQUIRE(schemas, ...)                                                  \
+  if (std::string why = MissingTool({__VA_ARGS__}, schemas); !why.empty()) { \
+    GTEST_SKIP() << why;                                                       \
+  }
+
+// xmllint's exit status (0 = valid) and messages for `file` against schema `xsd`.
+CommandResult Validate(const std::string& file, const char* xsd) {
+  return RunCommand("xmllint --noout --nonet --schema " + ShellQuote(SchemaDir() + "/" + xsd) + " " + file + " 2>&1");
+}
+
+TEST(Readers, GpxValidatesAndReadsBack) {
+  REQUIRE(true, "xmllint", "gpsbabel", "ogrinfo");
+  Fixture f;
+  CPtrList none;
+  ASSERT_EQ(ExportGpx(f.root / L"out.gpx", f.tracks, f.items), 1);
+  ASSERT_EQ(ExportGpx(f.root / L"empty.gpx", none, none), 1);
+  for (const wchar_t* file : {L"out.gpx", L"empty.gpx"}) {
+    const auto valid = Validate(f.Path(file), "gpx10.xsd");
+    EXPECT_EQ(valid.status, 0) << valid.out;
+  }
+  const std::string gpx = f.Path(L"out.gpx");
+  EXPECT_EQ(ReadPoints(RunCommand("gpsbabel -t -i gpx -f " + gpx + " -o unicsv -F -").out), f.points);
+  EXPECT_EQ(ReadPoints(RunCommand("gpsbabel -w -i gpx -f " + gpx + " -o unicsv -F -").out), f.photoPoints);
+  EXPECT_EQ(ReadPoints(RunCommand("ogrinfo -ro -q " + gpx + " track_points").out), f.points);
+  EXPECT_NE(RunCommand("ogrinfo -ro -q " + gpx + " tracks").out.find("Z\xC3\xBCrich \xE2\x80\x93 \xC3\x9C" "etliberg"),
+            std::string::npos);
+}
+
+TEST(Readers, KmlValidatesAndReadsBackAndKmzOpens) {
+  REQUIRE(true, "xmllint", "gpsbabel", "ogrinfo", "unzip");
+  Fixture f;
+  ASSERT_EQ(ExportKml(f.root / L"out.kml", f.tracks, f.items, 0), 1);
+  const std::string kml = f.Path(L"out.kml");
+  const auto valid = Validate(kml, "kml21.xsd");
+  EXPECT_EQ(valid.status, 0) << valid.out;
+  EXPECT_EQ(ReadPoints(RunCommand("gpsbabel -t -i kml -f " + kml + " -o unicsv -F -").out), f.points);
+  EXPECT_EQ(ReadPoints(RunCommand("ogrinfo -ro -al -q " + kml).out), f.allPoints);
+  EXPECT_EQ(ReadPoints(RunCommand("ogrinfo --config GDAL_SKIP LIBKML -ro -al -q " + kml).out), f.allPoints);
+
+  ASSERT_EQ(ExportKmz(f.root / L"Z\u00fcrich.kmz", f.tracks, f.items), 1);
+  const std::string kmz = f.Path(L"Z\u00fcrich.kmz");
+  EXPECT_EQ(RunCommand("unzip -tq " + kmz).status, 0);
+  EXPECT_EQ(RunCommand("unzip -Z1 " + kmz).out, "1.jpg\n2.jpg\nZ\xC3\xBCrich.kml\n");
+  EXPECT_EQ(ReadPoints(RunCommand("ogrinfo -ro -al -q " + kmz).out), f.allPoints);
+}
+
+TEST(Readers, TcxValidatesAndReadsBack) {
+  REQUIRE(true, "xmllint", "gpsbabel");
+  Fixture f;
+  ASSERT_EQ(ExportTcx(f.root / L"out.tcx", f.activity), 1);
+  const auto valid = Validate(f.Path(L"out.tcx"), "tcx2-with-ax2.xsd");
+  EXPECT_EQ(valid.status, 0) << valid.out;
+  EXPECT_EQ(ReadPoints(RunCommand("gpsbabel -t -i gtrnctr -f " + f.Path(L"out.tcx") + " -o unicsv -F -").out),
+            f.points);
+}
+
+TEST(Readers, CsvReadsBack) {
+  REQUIRE(false, "gpsbabel", "ogrinfo");
+  Fixture f;
+  ASSERT_EQ(ExportCsv(f.root / L"out.csv", f.tracks, f.items, &f.trip, true), 1);
+  const std::string csv = f.Path(L"out.csv");
+  // gpsbabel reads no points from CR-only lines; the line ends are converted on the way.
+  EXPECT_EQ(ReadPoints(RunCommand("tr '\\r' '\\n' < " + csv + " | gpsbabel -i unicsv -f - -o unicsv -F -").out),
+            f.points);
+  EXPECT_EQ(ReadPoints(RunCommand("ogrinfo -ro -al -q " + csv +
+                                  " -oo X_POSSIBLE_NAMES=Longitude -oo Y_POSSIBLE_NAMES=Latitude").out),
+            f.points);
 }
 
 }  // namespace

@@ -3,6 +3,8 @@
 #include <gtest/gtest.h>
 
 #include <cmath>
+#include <tuple>
+#include <utility>
 #include <vector>
 
 #include "navmisc/records/items.h"
@@ -21,7 +23,8 @@ struct Pos {
   double lat, lon;
 };
 
-// Reference distances from an independent vector formula on a sphere of 6371 km.
+// Reference distances from an independent vector formula on a sphere of 6371 km. An unknown unit
+// gives 0, and so do points less than a centimetre apart.
 TEST(GpsHelper, DistancesMatchReferenceValuesInEveryUnit) {
   const struct {
     Pos a, b;
@@ -32,30 +35,22 @@ TEST(GpsHelper, DistancesMatchReferenceValuesInEveryUnit) {
       {{0, 0}, {0, 1}, 111.19492664455873, 69.04522520889567, 59.999183695809066},
       {{0, 0}, {90, 0}, 10007.543398010286, 6214.07026880061, 5399.926532622816},
       {{0, 0}, {0, 180}, 20015.086796020572, 12428.14053760122, 10799.853065245632},
+      {{47.1, 8.2}, {47.1, 8.2}, 0, 0, 0},
+      {{47.1, 8.2}, {47.1, 8.2 + 1e-7}, 0, 0, 0},  // 7.6 mm
   };
   Helper h;
   for (const auto& c : cases) {
-    const double tol = c.km * 1e-12;  // relative: the two formulas agree to rounding
-    EXPECT_NEAR(h.GetDistance(c.a.lat, c.a.lon, c.b.lat, c.b.lon, CGPSHelper::DIS_KILOMETER), c.km, tol);
-    EXPECT_NEAR(h.GetDistance(c.a.lat, c.a.lon, c.b.lat, c.b.lon, CGPSHelper::DIS_METER), c.km * 1000, tol * 1000);
-    EXPECT_NEAR(h.GetDistance(c.a.lat, c.a.lon, c.b.lat, c.b.lon, CGPSHelper::DIS_MILE), c.miles, tol);
-    EXPECT_NEAR(h.GetDistance(c.a.lat, c.a.lon, c.b.lat, c.b.lon, CGPSHelper::DIS_NAUTICAL_MILE), c.nautical, tol);
-    // Symmetric.
-    EXPECT_NEAR(h.GetDistance(c.b.lat, c.b.lon, c.a.lat, c.a.lon, CGPSHelper::DIS_KILOMETER), c.km, tol);
+    const std::pair<int, double> units[] = {
+        {CGPSHelper::DIS_KILOMETER, c.km}, {CGPSHelper::DIS_METER, c.km * 1000}, {CGPSHelper::DIS_MILE, c.miles},
+        {CGPSHelper::DIS_NAUTICAL_MILE, c.nautical}, {-1, 0.0}, {4, 0.0}};
+    for (const auto& [unit, want] : units) {
+      const auto u = static_cast<CGPSHelper::DIS_UNIT>(unit);
+      const double tol = want * 1e-12;  // relative: the two formulas agree to rounding
+      EXPECT_NEAR(h.GetDistance(c.a.lat, c.a.lon, c.b.lat, c.b.lon, u), want, tol) << c.km << " in " << unit;
+      EXPECT_NEAR(h.GetDistance(c.b.lat, c.b.lon, c.a.lat, c.a.lon, u), want, tol) << c.km << " in " << unit;
+    }
   }
-}
-
-TEST(GpsHelper, ZeroDistanceForSamePointsUnderACentimetreAndUnknownUnits) {
-  Helper h;
-  for (int unit = 0; unit <= 3; ++unit) {
-    const auto u = static_cast<CGPSHelper::DIS_UNIT>(unit);
-    EXPECT_EQ(h.GetDistance(47.1, 8.2, 47.1, 8.2, u), 0.0) << unit;
-    EXPECT_EQ(h.GetDistance(47.1, 8.2, 47.1, 8.2 + 1e-7, u), 0.0) << unit;  // 7.6 mm
-    EXPECT_GT(h.GetDistance(47.1, 8.2, 47.1, 8.2 + 2e-7, u), 0.0) << unit;  // 15 mm
-  }
-  for (int unit : {-1, 4, 99}) {
-    EXPECT_EQ(h.GetDistance(0, 0, 1, 1, static_cast<CGPSHelper::DIS_UNIT>(unit)), 0.0) << unit;
-  }
+  EXPECT_GT(h.GetDistance(47.1, 8.2, 47.1, 8.2 + 2e-7, CGPSHelper::DIS_METER), 0.0);  // 15 mm
 }
 
 TEST(GpsHelper, BearingsAreTruncatedToWholeDegrees) {
@@ -74,50 +69,44 @@ TEST(GpsHelper, BearingsAreTruncatedToWholeDegrees) {
       {{0, 0}, {10, -0.05}, 359.0},  // 359.716
       {{0, 0}, {10, 0.05}, 0.0},     // 0.284
       {{12.5, 7.5}, {12.5, 7.5}, 0.0},
+      {{NAN, 0}, {1, 1}, 0.0},
   };
   Helper h;
   for (const auto& c : cases) {
     EXPECT_EQ(h.GetInitialBearing(c.a.lat, c.a.lon, c.b.lat, c.b.lon), c.bearing)
         << c.a.lat << "," << c.a.lon << " -> " << c.b.lat << "," << c.b.lon;
   }
-  EXPECT_EQ(h.GetInitialBearing(NAN, 0, 1, 1), 0.0);
 }
 
 TEST(GpsHelper, DestinationMidpointAndPointBetweenDoNotWrapLongitudes) {
-  Helper h;
+  enum Op { kDestination, kMidpoint, kBetween };
+  // Destination: b.lat is the bearing and arg the distance in km. Point between: arg in metres.
   const struct {
-    Pos from;
-    double bearing, km;
+    Op op;
+    Pos a, b;
+    double arg;
     Pos to;
   } cases[] = {
-      {{51.5074, -0.1278}, 148.0, 343.5, {48.86015519537056, 2.360015702754934}},
-      {{-33.8688, 151.2093}, 100.0, 2000.0, {-35.07025447303475, 173.02100379635647}},
-      {{0, 0}, 90.0, 10007.543398010286, {0, 90}},
+      {kDestination, {51.5074, -0.1278}, {148.0, 0}, 343.5, {48.86015519537056, 2.360015702754934}},
+      {kDestination, {-33.8688, 151.2093}, {100.0, 0}, 2000.0, {-35.07025447303475, 173.02100379635647}},
+      {kDestination, {0, 0}, {90.0, 0}, 10007.543398010286, {0, 90}},
       // Across the antimeridian the longitude goes on past 180.
-      {{0, 179.5}, 90.0, 111.19492664455873, {0, 180.5}},
+      {kDestination, {0, 179.5}, {90.0, 0}, 111.19492664455873, {0, 180.5}},
+      {kMidpoint, {51.5074, -0.1278}, {48.8566, 2.3522}, 0, {50.18859487756828, 1.146617629030325}},
+      {kMidpoint, {0, 170}, {0, -170}, 0, {0, 180}},  // the short way, through 180
+      // 1000 m from (0,0) towards (1,1): the bearing 44.996 is cut to 44 before walking.
+      {kBetween, {0, 0}, {1, 1}, 1000.0, {0.006469178231600001, 0.006247212839407895}},
+      {kBetween, {0, 0}, {0, 1}, 1000.0, {0, 1000.0 / 111194.92664455874}},
   };
+  Helper h;
   for (const auto& c : cases) {
     double lat = 99, lon = 99;
-    h.GetDestinationPoint(c.from.lat, c.from.lon, c.bearing, c.km, lat, lon);
-    EXPECT_NEAR(lat, c.to.lat, 1e-9);
-    EXPECT_NEAR(lon, c.to.lon, 1e-9);
+    if (c.op == kDestination) h.GetDestinationPoint(c.a.lat, c.a.lon, c.b.lat, c.arg, lat, lon);
+    if (c.op == kMidpoint) h.GetMidiPoint(c.a.lat, c.a.lon, c.b.lat, c.b.lon, lat, lon);
+    if (c.op == kBetween) h.GetPointBetween2Point(c.a.lat, c.a.lon, c.b.lat, c.b.lon, c.arg, lat, lon);
+    EXPECT_NEAR(lat, c.to.lat, 1e-9) << c.op << " from " << c.a.lat << "," << c.a.lon;
+    EXPECT_NEAR(lon, c.to.lon, 1e-9) << c.op << " from " << c.a.lat << "," << c.a.lon;
   }
-
-  double lat = 0, lon = 0;
-  h.GetMidiPoint(51.5074, -0.1278, 48.8566, 2.3522, lat, lon);
-  EXPECT_NEAR(lat, 50.18859487756828, 1e-9);
-  EXPECT_NEAR(lon, 1.146617629030325, 1e-9);
-  h.GetMidiPoint(0, 170, 0, -170, lat, lon);  // the short way, through 180
-  EXPECT_NEAR(lat, 0.0, 1e-9);
-  EXPECT_NEAR(lon, 180.0, 1e-9);
-
-  // 1000 m from (0,0) towards (1,1): the bearing 44.996 is cut to 44 before walking.
-  h.GetPointBetween2Point(0, 0, 1, 1, 1000.0, lat, lon);
-  EXPECT_NEAR(lat, 0.006469178231600001, 1e-12);
-  EXPECT_NEAR(lon, 0.006247212839407895, 1e-12);
-  h.GetPointBetween2Point(0, 0, 0, 1, 1000.0, lat, lon);
-  EXPECT_NEAR(lat, 0.0, 1e-12);
-  EXPECT_NEAR(lon, 1000.0 / 111194.92664455874, 1e-12);
 }
 
 TEST(GpsHelper, GpsDistanceUsesTheFirstArgumentAsBothLatitudes) {
@@ -140,14 +129,12 @@ TEST(GpsHelper, DistanceToSegmentsAndPolylines) {
   };
   for (const auto& c : toEquatorLeg) {
     double where = -1;
-    EXPECT_NEAR(h._GetMinDistance(0, 0, 0, 1, c.p.lat, c.p.lon, &where), c.km, 1e-7);
-    EXPECT_NEAR(where, c.where, 1e-4);
+    EXPECT_NEAR(h._GetMinDistance(0, 0, 0, 1, c.p.lat, c.p.lon, &where), c.km, 1e-7) << c.p.lon;
+    EXPECT_NEAR(where, c.where, 1e-4) << c.p.lon;
   }
   // The nearest of three legs is the northward one along 1 degree east.
   std::vector<sWayPoint> line(3);
-  line[1].longitude = 1;
-  line[2].latitude = 1;
-  line[2].longitude = 1;
+  line[1].longitude = line[2].longitude = line[2].latitude = 1;
   double where = -1;
   EXPECT_NEAR(h.GetMinDistance(line.data(), 3, 0.5, 1.01, &where), 1.1119069268242912, 1e-6);
   EXPECT_NEAR(where, 0.5, 1e-3);
@@ -174,6 +161,7 @@ Plot PlotOf(const std::vector<Pos>& track, long size, long margin) {
 
 TEST(GpsHelper, MappingToXYPlotsNorthUpAndCoarsensBySteps) {
   const std::vector<Pos> leg = {{0, 0}, {0, 0.01}};  // 1111.9 m east on the equator
+  const std::vector<Pos> bend = {{0, 0}, {0.001, 0.0005}, {0, 0.001}};
   const struct {
     std::vector<Pos> track;
     long size, margin, expectSize;
@@ -187,7 +175,7 @@ TEST(GpsHelper, MappingToXYPlotsNorthUpAndCoarsensBySteps) {
       {leg, 1111, 5, 1111, {925 + 5, 5}, 0.5},        // at its own extent: 1111 / 1.2
       {leg, 500, 5, 500, {462 + 5, 5}, 0.5},          // 1111 / 2.2 = 505 is too wide; 2.4 fits
       // North up; the bend lies 111.2 m off the line from first to last.
-      {{{0, 0}, {0.001, 0.0005}, {0, 0.001}}, 1000, 0, 111, {111, 111}, 111.19 + 0.5},
+      {bend, 1000, 0, 111, {111, 111}, 111.19 + 0.5},
   };
   for (const auto& c : cases) {
     const Plot plot = PlotOf(c.track, c.size, c.margin);
@@ -197,7 +185,7 @@ TEST(GpsHelper, MappingToXYPlotsNorthUpAndCoarsensBySteps) {
     EXPECT_EQ(plot.screen.back().y, c.last.y) << c.size;
     EXPECT_NEAR(plot.deviation, c.deviation, 0.01) << c.size;
   }
-  EXPECT_EQ(PlotOf({{0, 0}, {0.001, 0.0005}, {0, 0.001}}, 1000, 0).screen[1].y, 0);
+  EXPECT_EQ(PlotOf(bend, 1000, 0).screen[1].y, 0);
   const Plot none = PlotOf({}, 77, 0);  // nothing to plot: nothing is touched
   EXPECT_EQ(none.size, 77);
   EXPECT_EQ(none.deviation, -1);
@@ -207,26 +195,22 @@ TEST(GpsHelper, TimeSpansAreUnsignedAndUnchecked) {
   Helper h;
   EXPECT_EQ(h._GetTimeDurationSec(100L, 160L), 60u);
   EXPECT_EQ(h._GetTimeDurationSec(160L, 100L), 4294967236u);
-  const COleDateTime a(45000.0), b(45001.5);
-  EXPECT_EQ(h._GetTimeDurationSec(a, b), 129600);
+  EXPECT_EQ(h._GetTimeDurationSec(COleDateTime(45000.0), COleDateTime(45001.5)), 129600);
 }
 
 TEST(GpsHelper, WayPointArrayKeepsListSlotsAndArrangeCompacts) {
   CPtrList list;
   WAYPOINT_ITEM_INFO p1, p2;
-  p1.time = 10;
-  p1.speed = 3600;
-  p1.extraA = -8;
-  p2.time = 20;
+  std::tie(p1.time, p1.speed, p1.extraA, p2.time) = std::tuple(10, 3600, -8, 20);
   for (void* entry : {static_cast<void*>(&p1), static_cast<void*>(nullptr), static_cast<void*>(&p2)}) list.AddTail(entry);
   navmisc::WayPointArray array = navmisc::MakeWayPointArray(list);
   // One record per list entry: the non-null points first, in order, then the defaults.
-  EXPECT_EQ(+array[0].speed, 3600);
-  EXPECT_EQ(+array[0].extraA, -8);
-  EXPECT_EQ(+array[1].time, 20);
-  EXPECT_EQ(+array[1].valid, 1);
-  EXPECT_EQ(+array[2].time, -1);
-  EXPECT_EQ(+array[2].valid, 0);
+  const auto fields = [&](int i) {
+    return std::tuple(+array[i].time, +array[i].speed, +array[i].extraA, +array[i].valid);
+  };
+  EXPECT_EQ(fields(0), std::tuple(10, 3600, -8, 1));
+  EXPECT_EQ(fields(1), std::tuple(20, 0, 0, 1));
+  EXPECT_EQ(fields(2), std::tuple(-1, 0, 0, 0));
   EXPECT_EQ(CreateWayPointArray(CPtrList()), nullptr);
 
   array[0].valid = 0;
@@ -234,9 +218,9 @@ TEST(GpsHelper, WayPointArrayKeepsListSlotsAndArrangeCompacts) {
   int count = 3;
   Helper()._Arrange(array.get(), count);
   EXPECT_EQ(count, 2);
-  EXPECT_EQ(+array[0].time, 20);
-  EXPECT_EQ(+array[1].time, -1);
-  EXPECT_EQ(+array[2].valid, 0);  // reset to the defaults
+  EXPECT_EQ(fields(0), std::tuple(20, 0, 0, 1));
+  EXPECT_EQ(fields(1), std::tuple(-1, 0, 0, 1));
+  EXPECT_EQ(fields(2), std::tuple(-1, 0, 0, 0));  // reset to the defaults
 }
 
 }  // namespace

@@ -26,11 +26,8 @@ std::unique_ptr<TRACK_ITEM_INFO> MakeTrack(const wchar_t* id, int32_t start = 10
   } fixes[] = {{0, 47.0, 8.0, 100, 3600}, {10, 47.01, 8.0, 200, 7201}, {3610, 47.01, 8.1, 0, 0}};
   for (const auto& f : fixes) {
     auto* p = new WAYPOINT_ITEM_INFO(nullptr);
-    p->time = start + f.dt;
-    p->latitude = f.lat;
-    p->longitude = f.lon;
-    p->altitude = f.alt;
-    p->speed = f.speed;
+    std::tie(p->time, p->latitude, p->longitude, p->altitude, p->speed) =
+        std::tuple(start + f.dt, f.lat, f.lon, f.alt, f.speed);
     track->points.AddTail(p);
   }
   return track;
@@ -71,8 +68,7 @@ TEST(Mapping, TimeToPointInterpolatesOnePointPerSecond) {
     long speed = -1;
     EXPECT_EQ(track->MappingTimeToPoint(c.time, lat, lon, speed, alt), c.found) << c.time;
     if (!c.found) {
-      EXPECT_EQ(lat, 0.0);  // cleared; speed and altitude untouched
-      EXPECT_EQ(speed, -1);
+      EXPECT_EQ(std::tuple(lat, speed, alt), std::tuple(0.0, -1L, -1.0)) << c.time;  // only lat cleared
       continue;
     }
     EXPECT_EQ(+answer.time, c.answerTime) << c.time;
@@ -120,9 +116,8 @@ TEST(Mapping, PointToTimeWithinTolerance) {
 
   // A single fix answers every position with its time, and no time with a position.
   TRACK_ITEM_INFO single(nullptr);
-  auto* p = new WAYPOINT_ITEM_INFO(nullptr);
-  p->time = 777;
-  single.points.AddTail(p);
+  single.points.AddTail(new WAYPOINT_ITEM_INFO(nullptr));
+  static_cast<WAYPOINT_ITEM_INFO*>(single.points.GetHead())->time = 777;
   EXPECT_EQ(single.MappingPointToTime(-33.0, 151.0, 1.0), 777);
   double lat, lon, alt;
   long speed;
@@ -166,8 +161,7 @@ TEST(Mapping, PlacementPrefersTimeThenPositionThenClears) {
     EXPECT_NEAR(lon, c.placedLon, 1e-9) << c.name;
     EXPECT_EQ(time, c.placedTime) << c.name;
     if (!c.placed) {
-      EXPECT_EQ(alt, 0.0);
-      EXPECT_EQ(speed, 0);
+      EXPECT_EQ(std::tuple(alt, speed), std::tuple(0.0, 0L)) << c.name;
     }
   }
 
@@ -227,8 +221,8 @@ TEST(Mapping, ScopedAnswersEqualThePlainSearch) {
   for (int variant = 0; variant < 3; ++variant) {
     TRACK_ITEM_INFO track(nullptr);
     navmisc::testing::AppendNoisyTrack(track.points, 7 + variant, 3000);
-    std::vector<WAYPOINT_ITEM_INFO*> fixes;
-    for (void* v : track.points) fixes.push_back(static_cast<WAYPOINT_ITEM_INFO*>(v));
+    const auto items = navmisc::Items<WAYPOINT_ITEM_INFO>(track.points);
+    const std::vector<WAYPOINT_ITEM_INFO*> fixes(items.begin(), items.end());
     if (variant == 1) fixes[1500]->time = fixes[10]->time;  // times out of order
     if (variant == 2) fixes[200]->time = fixes[199]->time;  // a repeated time
     const int32_t first = fixes.front()->time, last = fixes.back()->time;

@@ -2,8 +2,10 @@
 
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <memory>
 #include <string>
+#include <tuple>
 #include <utility>
 #include <vector>
 
@@ -14,8 +16,10 @@
 
 namespace {
 
-using navmisc::testing::ProductScope;
+using navmisc::testing::MetresEast;
+using navmisc::testing::MetresNorth;
 using navmisc::testing::OptimizeTripLiterally;
+using navmisc::testing::ProductScope;
 constexpr int kKept = WAYPOINT_ITEM_INFO::kFlagKept;
 
 struct TrackShape {
@@ -23,28 +27,29 @@ struct TrackShape {
   int points;
 };
 
+// Noisy tracks whose points all hold the old level 7, in a trip whose display level is 42.
 std::unique_ptr<BLOG_ITEM_INFO> MakeTrip(const std::vector<TrackShape>& shapes,
                                          const wchar_t* folder = L"OPT") {
   auto trip = std::make_unique<BLOG_ITEM_INFO>(GPS_APP_TRIP, folder, 0);
+  trip->optLevel = 42;
   for (const TrackShape& s : shapes) {
     auto* track = new TRACK_ITEM_INFO(trip.get());
     navmisc::testing::AppendNoisyTrack(track->points, s.seed, s.points);
+    for (void* p : track->points) static_cast<WAYPOINT_ITEM_INFO*>(p)->type = 7;
     trip->tracks.AddTail(track);
   }
   return trip;
 }
 
-std::vector<WAYPOINT_ITEM_INFO*> PointsOf(TRACK_ITEM_INFO* track) {
-  std::vector<WAYPOINT_ITEM_INFO*> out;
-  for (void* v : track->points) out.push_back(static_cast<WAYPOINT_ITEM_INFO*>(v));
-  return out;
+template <class T>
+std::vector<T*> All(const CPtrList& list) {
+  const auto items = navmisc::Items<T>(list);
+  return {items.begin(), items.end()};
 }
-
-std::vector<TRACK_ITEM_INFO*> TracksOf(const CPtrList& tracks) {
-  std::vector<TRACK_ITEM_INFO*> out;
-  for (void* v : tracks) out.push_back(static_cast<TRACK_ITEM_INFO*>(v));
-  return out;
+std::vector<WAYPOINT_ITEM_INFO*> PointsOf(const TRACK_ITEM_INFO* track) {
+  return All<WAYPOINT_ITEM_INFO>(track->points);
 }
+std::vector<TRACK_ITEM_INFO*> TracksOf(const CPtrList& tracks) { return All<TRACK_ITEM_INFO>(tracks); }
 
 void ExpectSameLevels(BLOG_ITEM_INFO& a, BLOG_ITEM_INFO& b, const std::string& what) {
   EXPECT_EQ(a.optLevel, b.optLevel) << what;
@@ -54,36 +59,47 @@ void ExpectSameLevels(BLOG_ITEM_INFO& a, BLOG_ITEM_INFO& b, const std::string& w
     const auto pa = PointsOf(ta[t]), pb = PointsOf(tb[t]);
     ASSERT_EQ(pa.size(), pb.size()) << what;
     for (size_t i = 0; i < pa.size(); ++i) {
-      ASSERT_EQ(pa[i]->type, pb[i]->type) << what << ", track " << t << ", point " << i;
-      ASSERT_EQ(pa[i]->flags[kKept], pb[i]->flags[kKept]) << what << ", track " << t << ", point " << i;
-      ASSERT_EQ(pa[i]->time, pb[i]->time) << what;
+      const std::string where = what + ", track " + std::to_string(t) + ", point " + std::to_string(i);
+      ASSERT_EQ(pa[i]->type, pb[i]->type) << where;
+      ASSERT_EQ(pa[i]->flags[kKept], pb[i]->flags[kKept]) << where;
+      ASSERT_EQ(pa[i]->time, pb[i]->time) << where;
     }
   }
 }
 
-// The one-pass levels against a separate Smooth run for every level.
+// The one-pass levels against a separate Smooth run for every level. A cancel (the flag cleared
+// before the work starts) stops after the first track's coarsest level: the display level stays
+// 0 and the later tracks keep their old levels.
 TEST(OptimizeWaypoint, LevelsEqualTheLiteralMethod) {
   const struct {
     std::vector<TrackShape> tracks;
     GPS_APP_PROG_TYPE product;
+    bool cancel = false;
   } cases[] = {
       {{{1, 3000}}, GPS_APP_TRIP},
       {{{2, 1500}, {3, 400}, {4, 120}}, GPS_APP_TRIP},
       {{{5, 2500}, {6, 1200}}, GPS_APP_SPORT},
       {{{7, 60}, {8, 101}, {9, 102}, {10, 1}}, GPS_APP_TRACKER},  // a lone fix gets a twin
       {{{11, 5000}}, GPS_APP_TRACKER},
+      {{{21, 2000}, {22, 500}, {23, 300}}, GPS_APP_TRIP, true},
   };
   for (const auto& c : cases) {
     ProductScope product(c.product);
     auto fast = MakeTrip(c.tracks), literal = MakeTrip(c.tracks);
     int fastProgress = 0, literalProgress = 0;
-    bool keepGoing = true;
+    bool keepGoing = !c.cancel;
     fast->OptimizeWaypoint(c.product, 1, &fastProgress, &keepGoing);
     OptimizeTripLiterally(*literal, c.product, 1, &literalProgress, &keepGoing);
     const std::string what = "seed " + std::to_string(c.tracks[0].seed);
     ExpectSameLevels(*fast, *literal, what);
     EXPECT_EQ(fastProgress, literalProgress) << what;
-    EXPECT_EQ(fastProgress, static_cast<int>(c.tracks.size()) * 10300) << what;
+    EXPECT_EQ(fastProgress, c.cancel ? 300 : static_cast<int>(c.tracks.size()) * 10300) << what;
+    if (!c.cancel) continue;
+    EXPECT_EQ(fast->optLevel, 0);
+    for (TRACK_ITEM_INFO* later : TracksOf(fast->tracks)) {
+      if (later == fast->tracks.GetHead()) continue;
+      for (auto* p : PointsOf(later)) ASSERT_EQ(p->type, 7);
+    }
   }
 }
 
@@ -93,24 +109,19 @@ TEST(OptimizeWaypoint, ShortTracksAreNotRevisedOrSmoothed) {
     bool revised, smoothed;
   } cases[] = {{50, false, false}, {51, true, false}, {101, true, false}, {102, true, true}};
   for (const auto& c : cases) {
-    auto trip = std::make_unique<BLOG_ITEM_INFO>(GPS_APP_TRIP, L"OPT", 0);
-    auto* track = new TRACK_ITEM_INFO(trip.get());
-    trip->tracks.AddTail(track);
+    auto trip = MakeTrip({{0, 0}});
+    auto* track = static_cast<TRACK_ITEM_INFO*>(trip->tracks.GetHead());
     // A straight walk with one wild fix; without it 101 fixes would still be reduced.
     for (int i = 0; i < c.points; ++i) {
       auto* p = new WAYPOINT_ITEM_INFO(nullptr);
-      p->time = 1000 + 5 * i;
-      p->latitude = navmisc::testing::MetresNorth(i == 5 ? 3000 : 0);
-      p->longitude = navmisc::testing::MetresEast(50.0 * i);
-      p->speed = 36000;
+      std::tie(p->time, p->latitude, p->longitude, p->speed) =
+          std::tuple(1000 + 5 * i, MetresNorth(i == 5 ? 3000 : 0), MetresEast(50.0 * i), 36000);
       track->points.AddTail(p);
     }
     trip->OptimizeWaypoint(GPS_APP_TRIP, 1, nullptr, nullptr);
-    int essential = 0, badFixes = 0;
-    for (auto* p : PointsOf(track)) {
-      essential += p->type == navmisc::kLevelNeverDropped;
-      badFixes += p->type == navmisc::kLevelBadFix;
-    }
+    const auto points = PointsOf(track);
+    const auto essential = std::ranges::count(points, navmisc::kLevelNeverDropped, &WAYPOINT_ITEM_INFO::type);
+    const auto badFixes = std::ranges::count(points, navmisc::kLevelBadFix, &WAYPOINT_ITEM_INFO::type);
     EXPECT_EQ(badFixes, c.revised ? 1 : 0) << c.points;
     // Smoothing hands every remaining point a level of 100 or below.
     EXPECT_EQ(essential, c.smoothed ? 0 : c.points - badFixes) << c.points;
@@ -131,45 +142,13 @@ TEST(OptimizeWaypoint, OffKeepsTheLevelsAndRecomputesTheDisplayLevel) {
   };
   for (const auto& c : cases) {
     auto trip = MakeTrip({{3, c.points}});
-    trip->optLevel = 77;
-    for (auto* p : PointsOf(static_cast<TRACK_ITEM_INFO*>(trip->tracks.GetHead()))) p->type = c.level;
+    const auto points = PointsOf(static_cast<TRACK_ITEM_INFO*>(trip->tracks.GetHead()));
+    for (auto* p : points) p->type = c.level;
     int progress = 0;
     trip->OptimizeWaypoint(c.product, 0, &progress, nullptr);
     EXPECT_EQ(trip->optLevel, c.displayLevel) << c.points << " at " << c.level;
     EXPECT_EQ(progress, 10300);
-    for (auto* p : PointsOf(static_cast<TRACK_ITEM_INFO*>(trip->tracks.GetHead()))) {
-      ASSERT_EQ(p->type, c.level);
-    }
-  }
-}
-
-TEST(OptimizeWaypoint, CancelDuringSmoothingStopsAtOnce) {
-  const std::vector<TrackShape> shapes = {{21, 2000}, {22, 500}, {23, 300}};
-  auto trip = MakeTrip(shapes), literal = MakeTrip(shapes);
-  for (BLOG_ITEM_INFO* t : {trip.get(), literal.get()}) {
-    t->optLevel = 42;
-    for (TRACK_ITEM_INFO* track : TracksOf(t->tracks)) {
-      for (auto* p : PointsOf(track)) p->type = 7;
-    }
-  }
-  int progress = 0, literalProgress = 0;
-  bool keepGoing = false;  // cleared before the work starts: it stops after the first step
-  trip->OptimizeWaypoint(GPS_APP_TRIP, 1, &progress, &keepGoing);
-  OptimizeTripLiterally(*literal, GPS_APP_TRIP, 1, &literalProgress, &keepGoing);
-  EXPECT_EQ(progress, 300);
-  EXPECT_EQ(literalProgress, 300);
-  EXPECT_EQ(trip->optLevel, 0);
-  ExpectSameLevels(*trip, *literal, "cancelled");
-  const auto tracks = TracksOf(trip->tracks);
-  int coarse = 0, open = 0;
-  for (auto* p : PointsOf(tracks[0])) {
-    coarse += p->type == 100;
-    open += p->type == navmisc::kLevelNeverDropped;
-  }
-  EXPECT_GT(coarse, 1);
-  EXPECT_GT(open, coarse);  // the finer levels were never handed out
-  for (TRACK_ITEM_INFO* later : {tracks[1], tracks[2]}) {
-    for (auto* p : PointsOf(later)) ASSERT_EQ(p->type, 7);
+    for (auto* p : points) ASSERT_EQ(p->type, c.level);
   }
 }
 
@@ -194,12 +173,10 @@ TEST(OptimizeTrack, ThinnedTracksShareButNeverFreePoints) {
   for (size_t t = 0; t < thin.size(); ++t) {
     EXPECT_FALSE(thin[t]->OwnsPoints());
     EXPECT_EQ(thin[t]->id, real[t]->id);
-    std::vector<WAYPOINT_ITEM_INFO*> expected;
-    for (auto* p : PointsOf(real[t])) {
-      if (p->type == navmisc::kLevelStop || (p->type != navmisc::kLevelBadFix && p->type >= 20)) {
-        expected.push_back(p);
-      }
-    }
+    std::vector<WAYPOINT_ITEM_INFO*> expected = PointsOf(real[t]);
+    std::erase_if(expected, [](const WAYPOINT_ITEM_INFO* p) {
+      return p->type != navmisc::kLevelStop && (p->type == navmisc::kLevelBadFix || p->type < 20);
+    });
     EXPECT_EQ(PointsOf(thin[t]), expected);
     EXPECT_LT(expected.size(), static_cast<size_t>(real[t]->points.GetCount()));
   }
@@ -226,18 +203,6 @@ TEST(OptimizeTrack, ThinnedTracksShareButNeverFreePoints) {
   RestoreOldTrack(trip.get(), old);
   old.RemoveAll();
   EXPECT_EQ(TracksOf(trip->tracks), real);
-
-  // Saved and read back whole, with the levels.
-  trip->WriteAllWaypoint(1, nullptr, nullptr);
-  trip->WriteInfo(1, nullptr, nullptr);
-  BLOG_ITEM_INFO back(GPS_APP_TRIP, L"THIN", 0);
-  ASSERT_EQ(back.ReadInfo(), 1);
-  back.ReadAllWaypoint(1);
-  const auto backTracks = TracksOf(back.tracks);
-  ASSERT_EQ(backTracks.size(), 2u);
-  const auto saved = PointsOf(backTracks[0]), kept = PointsOf(real[0]);
-  ASSERT_EQ(saved.size(), kept.size());
-  for (size_t i = 0; i < saved.size(); ++i) ASSERT_EQ(saved[i]->type, kept[i]->type);
 
   // A thinned trip freed without its restore: the real tracks still own every point.
   CreateOptimizeTrack(trip.get(), old);

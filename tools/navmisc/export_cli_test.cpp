@@ -31,6 +31,7 @@ struct SavedTrip {
       p->time = 1714543200 + 10 * i;
       p->latitude = 47.37 + 0.001 * i;
       p->longitude = 8.54;
+      p->altitude = 100;
       track->points.AddTail(p);
     }
     trip.tracks.AddTail(track);
@@ -56,33 +57,37 @@ struct SavedTrip {
 
 TEST(ExportCommand, WritesEachFormatOrSaysWhyNot) {
   SavedTrip s;
-  const std::string longName(300, 'n');
+  const CString longName = CString::FromUtf8(std::string(300, 'n'));
   const struct {
-    std::string args;
+    std::string format;  // and the options that go with it
+    CString out;
     int status;
     std::string output;  // expected part of what the command prints
   } cases[] = {
-      {"export " + s.id + " --format gpx -o " + s.Out(L"t.gpx"), 0, "t.gpx\n"},
-      {"export " + s.id + " --format kml -o " + s.Out(L"t.kml"), 0, "t.kml\n"},
-      {"export " + s.id + " --format tcx --sport 0 -o " + s.Out(L"t.tcx"), 0, "t.tcx\n"},
-      {"export " + s.id + " --format csv --metric -o " + s.Out(L"t.csv"), 0, "t.csv\n"},
-      {"export " + s.id + " --format kmz -o " + s.Out(L"t.kmz"), 1,
+      {"gpx", L"t.gpx", 0, "t.gpx\n"},
+      {"kml", L"t.kml", 0, "t.kml\n"},
+      {"tcx --sport 0", L"t.tcx", 0, "t.tcx\n"},
+      {"csv --metric", L"t.csv", 0, "t.csv\n"},
+      {"kmz", L"t.kmz", 1,
        "cannot add photo \"Gone\" (" + s.gonePhoto + ") to " + (s.root / L"t.kmz").ToUtf8() +
            ": No such file or directory"},
-      {"export " + s.id + " --format gpx -o " + s.Out(L"missing/t.gpx"), 1, "does not exist"},
-      {"export " + s.id + " --format gpx -o " + s.Out(L"t.gpx/x.gpx"), 1, "t.gpx is not a folder"},
-      {"export " + s.id + " --format gpx -o " + s.Out(CString::FromUtf8(longName)), 1,
-       "cannot write " + (s.root / CString::FromUtf8(longName)).ToUtf8() + ": File name too long"},
-      {"export " + s.id + " --format svg -o " + s.Out(L"t.svg"), 2, "--format must be"},
+      {"gpx", L"missing/t.gpx", 1, "does not exist"},
+      {"gpx", L"t.gpx/x.gpx", 1, "t.gpx is not a folder"},
+      {"gpx", longName, 1, "cannot write " + (s.root / longName).ToUtf8() + ": File name too long"},
+      {"svg", L"t.svg", 2, "--format must be"},
   };
   for (const auto& c : cases) {
-    const auto r = s.Run(c.args);
-    EXPECT_EQ(r.status, c.status) << c.args << "\n" << r.out;
-    EXPECT_NE(r.out.find(c.output), std::string::npos) << c.args << "\n" << r.out;
+    const std::string args = "export " + s.id + " --format " + c.format + " -o " + s.Out(c.out);
+    const auto r = s.Run(args);
+    EXPECT_EQ(r.status, c.status) << args << "\n" << r.out;
+    EXPECT_NE(r.out.find(c.output), std::string::npos) << args << "\n" << r.out;
+    if (c.status == 0) {
+      EXPECT_FALSE(ReadFileBytes(s.root / c.out).empty()) << args;
+    }
   }
-  EXPECT_EQ(ReadFileBytes(s.root / L"t.gpx").substr(0, 21), "<?xml version=\"1.0\" e");
+  // The options reach the writers: the sport, and metric figures (an altitude of 100 m).
   EXPECT_NE(ReadFileBytes(s.root / L"t.tcx").find("<Activity Sport=\"Biking\">"), std::string::npos);
-  EXPECT_NE(ReadFileBytes(s.root / L"t.csv").find("47.374000, 8.540000, 0.00,  0.00"), std::string::npos);
+  EXPECT_NE(ReadFileBytes(s.root / L"t.csv").find("47.374000, 8.540000, 100.00,  0.00"), std::string::npos);
 }
 
 }  // namespace

@@ -16,25 +16,13 @@ namespace {
 using navmisc::testutil::CommandResult;
 using navmisc::testutil::HaveProgram;
 
-// The program with `args`, standard error folded into the output.
-CommandResult RunTool(const std::string& args) {
-  return navmisc::testutil::RunCommand(std::string(NAVMISC_TOOL_PATH) + " " + args + " 2>&1");
-}
-
 std::vector<WAYPOINT_ITEM_INFO*> AllPoints(BLOG_ITEM_INFO& trip) {
   std::vector<WAYPOINT_ITEM_INFO*> out;
-  for (void* t : trip.tracks) {
-    for (void* p : static_cast<TRACK_ITEM_INFO*>(t)->points) out.push_back(static_cast<WAYPOINT_ITEM_INFO*>(p));
+  for (auto* t : navmisc::Items<TRACK_ITEM_INFO>(trip.tracks)) {
+    for (auto* p : navmisc::Items<WAYPOINT_ITEM_INFO>(t->points)) out.push_back(p);
   }
   return out;
 }
-
-// A command line, the exit code it must end with and a text its output must hold.
-struct Expectation {
-  std::string args;
-  int status;
-  std::string shows;
-};
 
 class GeoCommands : public ::testing::Test {
  protected:
@@ -59,14 +47,10 @@ class GeoCommands : public ::testing::Test {
     return trip;
   }
 
-  std::string Tool(const std::string& args) { return "--data-root " + root.path().ToUtf8() + " " + args; }
-
-  void Check(const std::vector<Expectation>& cases, const std::string& prefix = "") {
-    for (const Expectation& c : cases) {
-      const CommandResult r = RunTool(Tool(prefix + c.args));
-      EXPECT_EQ(r.status, c.status) << c.args << "\n" << r.out;
-      EXPECT_NE(r.out.find(c.shows), std::string::npos) << c.args << "\n" << r.out;
-    }
+  // The program on the test's data root with `args`, standard error folded into the output.
+  CommandResult RunTool(const std::string& args) {
+    return navmisc::testutil::RunCommand(std::string(NAVMISC_TOOL_PATH) + " --data-root " +
+                                         root.path().ToUtf8() + " " + args + " 2>&1");
   }
 
   navmisc::testutil::TempDir root;
@@ -76,7 +60,7 @@ class GeoCommands : public ::testing::Test {
 TEST_F(GeoCommands, OptimizeStoresTheLibrarysLevels) {
   auto expected = Load();
   expected->OptimizeWaypoint(GPS_APP_TRIP, 1, nullptr, nullptr);
-  const CommandResult r = RunTool(Tool("optimize GEOTRIP"));
+  const CommandResult r = RunTool("optimize GEOTRIP");
   ASSERT_EQ(r.status, 0) << r.out;
   EXPECT_NE(r.out.find("display level " + std::to_string(expected->optLevel)), std::string::npos) << r.out;
   auto saved = Load();
@@ -92,7 +76,7 @@ TEST_F(GeoCommands, OptimizeStoresTheLibrarysLevels) {
   EXPECT_GT(stops, 0);
 
   // --off keeps the levels and chooses the display level again.
-  const CommandResult off = RunTool(Tool("optimize GEOTRIP --off"));
+  const CommandResult off = RunTool("optimize GEOTRIP --off");
   ASSERT_EQ(off.status, 0) << off.out;
   auto reloaded = Load();
   const auto again = AllPoints(*reloaded);
@@ -100,9 +84,9 @@ TEST_F(GeoCommands, OptimizeStoresTheLibrarysLevels) {
 }
 
 TEST_F(GeoCommands, PlotWritesAValidDrawingOfEveryPoint) {
-  ASSERT_EQ(RunTool(Tool("optimize GEOTRIP")).status, 0);
+  ASSERT_EQ(RunTool("optimize GEOTRIP").status, 0);
   const std::string svg = (root / L"trip.svg").ToUtf8();
-  const CommandResult r = RunTool(Tool("plot GEOTRIP --size 500 -o " + svg));
+  const CommandResult r = RunTool("plot GEOTRIP --size 500 -o " + svg);
   ASSERT_EQ(r.status, 0) << r.out;
   const std::string text = navmisc::testutil::ReadFileBytes(CString::FromUtf8(svg));
   ASSERT_EQ(text.rfind("<?xml", 0), 0u);
@@ -117,25 +101,25 @@ TEST_F(GeoCommands, PlotWritesAValidDrawingOfEveryPoint) {
   }
 }
 
-TEST_F(GeoCommands, PlaceAnswersByTimeOrPosition) {
+TEST_F(GeoCommands, PlaceAnswersByTimeOrPositionAndErrorsSayWhy) {
   auto trip = Load();
   const WAYPOINT_ITEM_INFO* fix = AllPoints(*trip)[700];
   const std::string lat = navmisc::FormatA("%.6f", fix->latitude);
   const std::string lon = navmisc::FormatA("%.6f", fix->longitude);
-  Check({
-      {"--time " + std::to_string(fix->time), 0, "latitude   " + lat},
-      {"--lat " + lat + " --lon " + lon + " --tolerance 5", 0, "placed by position"},
-      {"--lat 10 --lon 10", 1, "no track of the trip passed within 50 m"},
-      {"--time 100", 1, "the trip has no track at 1970-01-01T00:01:40Z"},
-      {"", 2, "place needs --time or --lat and --lon"},
-      {"--lat 10", 2, "--lat and --lon go together"},
-      {"--lat 0 --lon 0", 2, "0/0 stands for no position"},
-      {"--time yesterday", 2, "is not a time"},
-  }, "place GEOTRIP ");
-}
-
-TEST_F(GeoCommands, ClearErrors) {
-  Check({
+  const std::string place = "place GEOTRIP ";
+  const struct {
+    std::string args;
+    int status;
+    std::string shows;  // a text the output must hold
+  } cases[] = {
+      {place + "--time " + std::to_string(fix->time), 0, "latitude   " + lat},
+      {place + "--lat " + lat + " --lon " + lon + " --tolerance 5", 0, "placed by position"},
+      {place + "--lat 10 --lon 10", 1, "no track of the trip passed within 50 m"},
+      {place + "--time 100", 1, "the trip has no track at 1970-01-01T00:01:40Z"},
+      {place, 2, "place needs --time or --lat and --lon"},
+      {place + "--lat 10", 2, "--lat and --lon go together"},
+      {place + "--lat 0 --lon 0", 2, "0/0 stands for no position"},
+      {place + "--time yesterday", 2, "is not a time"},
       {"optimize NOPE", 1, "no trip 'NOPE'"},
       {"optimize", 2, "optimize takes one trip id"},
       {"plot GEOTRIP", 2, "plot needs -o FILE.svg"},
@@ -144,7 +128,12 @@ TEST_F(GeoCommands, ClearErrors) {
       {"optimize --help", 0, "Usage: navmisc optimize TRIP"},
       {"plot --help", 0, "Usage: navmisc plot TRIP"},
       {"place --help", 0, "Usage: navmisc place TRIP"},
-  });
+  };
+  for (const auto& c : cases) {
+    const CommandResult r = RunTool(c.args);
+    EXPECT_EQ(r.status, c.status) << c.args << "\n" << r.out;
+    EXPECT_NE(r.out.find(c.shows), std::string::npos) << c.args << "\n" << r.out;
+  }
 }
 
 }  // namespace
