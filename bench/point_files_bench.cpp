@@ -2,6 +2,7 @@
 // plain stdio writer and reader of the same line format. Both must make the same bytes and the
 // same points; the benchmark stops with an error when they do not.
 #include <benchmark/benchmark.h>
+#include <sys/resource.h>
 
 #include <cstdio>
 #include <cstdlib>
@@ -13,6 +14,7 @@
 #include "navmisc/platform/shared_globals.h"
 #include "navmisc/platform/temp_folder.h"
 #include "navmisc/records/trip.h"
+#include "speedup_reporter.h"
 
 namespace {
 
@@ -146,6 +148,44 @@ void BM_StdioRead(benchmark::State& state) {
   navmisc::DeleteAll<WAYPOINT_ITEM_INFO>(points);
 }
 
+long PeakRssKb() {
+  rusage usage{};
+  ::getrusage(RUSAGE_SELF, &usage);
+  return usage.ru_maxrss;
+}
+
+// Reading streams: the memory a read costs is the points it holds, not a copy of the file. Runs
+// first, before anything else has raised the process's peak, on a file written line by line.
+void BM_ReadMemory(benchmark::State& state) {
+  const CString root = CreateTempFolder(L"navmisc-bench-memory");
+  navmisc::SetSharedText(g_szAppDataPath, root);
+  BLOG_ITEM_INFO trip(GPS_APP_TRIP, L"MEMORY", 0);
+  MakeDir(trip.GetResourcePath());
+  TRACK_ITEM_INFO track(&trip);
+  const std::string path = navmisc::NativePath(track.GetFilePathName());
+  FILE* f = std::fopen(path.c_str(), "wb");
+  for (int i = 0; i < kPoints; ++i) {
+    std::fprintf(f, "%d,%lf,%lf,%lf,%d,%d,%d,0,0\r\n", 1700000000 + i, 25.0 + i * 1e-6,
+                 121.5 - i * 1e-6, 100.0 + (i % 1000) * 0.5, i % 50000, i % 102 - 2, i % 361 - 1);
+  }
+  const double fileBytes = static_cast<double>(std::ftell(f));
+  std::fclose(f);
+  const long before = PeakRssKb();
+  for (auto _ : state) track.ReadAllWaypoint(1);
+  const double perPoint = (PeakRssKb() - before) * 1024.0 / kPoints;
+  // What holding one point costs at the least: the record and a list node, as the allocator
+  // rounds them.
+  const double held = (sizeof(WAYPOINT_ITEM_INFO) + 8 + 15) / 16 * 16 + 32;
+  state.counters["file_bytes_per_point"] = fileBytes / kPoints;
+  state.counters["rss_bytes_per_point"] = perPoint;
+  state.counters["held_bytes_per_point"] = held;
+  if (track.points.GetCount() != kPoints) state.SkipWithError("unexpected number of points");
+  if (perPoint > held + fileBytes / kPoints / 2) state.SkipWithError("reading keeps the file in memory");
+  navmisc::DeleteAll<WAYPOINT_ITEM_INFO>(track.points);
+  RemoveDir(root, L"*.*");
+}
+
+BENCHMARK(BM_ReadMemory)->Unit(benchmark::kMillisecond)->Iterations(1);
 BENCHMARK(BM_WriteAllWaypoint)->Unit(benchmark::kMillisecond)->MinTime(2.0);
 BENCHMARK(BM_StdioWrite)->Unit(benchmark::kMillisecond)->MinTime(2.0);
 BENCHMARK(BM_ReadAllWaypoint)->Unit(benchmark::kMillisecond)->MinTime(2.0);
@@ -153,4 +193,9 @@ BENCHMARK(BM_StdioRead)->Unit(benchmark::kMillisecond)->MinTime(2.0);
 
 }  // namespace
 
-BENCHMARK_MAIN();
+int main(int argc, char** argv) {
+  return navmisc::bench::RunWithSpeedups(
+      argc, argv,
+      {{"BM_WriteAllWaypoint/min_time:2.000", "BM_StdioWrite/min_time:2.000", 5},
+       {"BM_ReadAllWaypoint/min_time:2.000", "BM_StdioRead/min_time:2.000", 5}});
+}

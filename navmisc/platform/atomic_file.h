@@ -4,6 +4,8 @@
 // as it was.
 #pragma once
 
+#include <sys/types.h>
+
 #include <cstddef>
 #include <string>
 #include <string_view>
@@ -34,7 +36,10 @@ class AtomicFile {
 
  private:
   bool Flush();
+  void StartWriteback();
   int fd_ = -1;
+  off_t written_ = 0;      // bytes in the temporary file
+  off_t writtenBack_ = 0;  // bytes whose writing out has been started
   bool failed_ = false;
   std::string target_;
   std::string temp_;

@@ -211,17 +211,12 @@ std::basic_string<Char> VFormat(const Char* fmt, va_list in_args) {
   return out;
 }
 
-// "%.*f" for the common case, exactly as printf rounds it: the double is m * 2^e with an integer
-// m, so value * 10^d is m * 10^d / 2^-e, an exact 128-bit integer division whose remainder
-// decides the rounding (half to even, like printf on an exact tie). Returns false when the value
-// is outside the range this handles.
-bool FastFixed(char* buf, size_t& len, double value, int decimals) {
-  if (decimals < 0 || decimals > 9 || !std::isfinite(value) || std::fabs(value) >= 1e15) return false;
-  static constexpr uint64_t kPow10[] = {1, 10, 100, 1000, 10000, 100000, 1000000, 10000000,
-                                        100000000, 1000000000};
+// |value| * 10^d rounded as printf rounds it. The double is m * 2^e with an integer m, so the
+// product is m * 10^d / 2^-e, an exact 128-bit integer division whose remainder decides the
+// rounding (half to even, like printf on an exact tie).
+unsigned __int128 ScaledExactly(double value, uint64_t scale) {
   uint64_t bits;
   std::memcpy(&bits, &value, sizeof bits);
-  const bool negative = bits >> 63;
   const int exp_bits = static_cast<int>((bits >> 52) & 0x7FF);
   uint64_t mant = bits & ((uint64_t{1} << 52) - 1);
   int e;
@@ -231,21 +226,34 @@ bool FastFixed(char* buf, size_t& len, double value, int decimals) {
     mant |= uint64_t{1} << 52;
     e = exp_bits - 1075;
   }
+  if (e >= 0) return (static_cast<unsigned __int128>(mant) * scale) << e;  // |value| < 1e15
+  const int shift = -e;
+  if (shift > 100) return 0;  // far below half a unit of the last digit
+  const unsigned __int128 n = static_cast<unsigned __int128>(mant) * scale;
+  unsigned __int128 q = n >> shift;
+  const unsigned __int128 rem = n - (q << shift);
+  const unsigned __int128 half = static_cast<unsigned __int128>(1) << (shift - 1);
+  if (rem > half || (rem == half && (q & 1))) ++q;
+  return q;
+}
+
+// "%.*f" for the common case, exactly as printf writes it. Returns false when the value is
+// outside the range this handles.
+bool FastFixed(char* buf, size_t& len, double value, int decimals) {
+  if (decimals < 0 || decimals > 9 || !std::isfinite(value) || std::fabs(value) >= 1e15) return false;
+  static constexpr uint64_t kPow10[] = {1, 10, 100, 1000, 10000, 100000, 1000000, 10000000,
+                                        100000000, 1000000000};
+  const bool negative = std::signbit(value);
   const uint64_t scale = kPow10[decimals];
+  // Below 2^40 the rounded product |value| * 10^d is within 2^-14 of the exact one; unless the
+  // fraction is that close to a half, rounding it gives what the exact division would.
   unsigned __int128 q128;
-  if (e >= 0) {
-    q128 = (static_cast<unsigned __int128>(mant) * scale) << e;  // |value| < 1e15 keeps this small
+  const double y = std::fabs(value) * static_cast<double>(scale);
+  const double floor = std::floor(y);
+  if (y < 0x1p40 && std::fabs(y - floor - 0.5) > 0x1p-11) {
+    q128 = static_cast<uint64_t>(floor) + (y - floor > 0.5 ? 1 : 0);
   } else {
-    const int shift = -e;
-    const unsigned __int128 n = static_cast<unsigned __int128>(mant) * scale;
-    if (shift > 100) {
-      q128 = 0;  // far below half a unit of the last digit
-    } else {
-      q128 = n >> shift;
-      const unsigned __int128 rem = n - (q128 << shift);
-      const unsigned __int128 half = static_cast<unsigned __int128>(1) << (shift - 1);
-      if (rem > half || (rem == half && (q128 & 1))) ++q128;
-    }
+    q128 = ScaledExactly(value, scale);
   }
   uint64_t whole, frac;
   if ((q128 >> 64) == 0) {  // the usual case: plain 64-bit division

@@ -214,6 +214,11 @@ TEST(PointNumbers, FixedDecimalsMatchTheCLibraryWhateverTheLocale) {
   std::vector<double> values = {0.0, -0.0, 0.0078125, 0.5e-6, 2.5e-7, -1e-9, 121.5, 1e14, -0.0000005,
                                 999999.9999995, 4.9e-324, 0.1, 0.7, 1.0000005};
   for (int i = 0; i < 20000; ++i) values.push_back(i % 2 ? wide(rng) : small(rng));
+  // Exact ties of the sixth decimal (odd multiples of 1/128) and their closest neighbours.
+  for (int i = 1; i < 4000; i += 2) {
+    const double tie = (i % 7 - 3) * 1234.5 + i / 128.0;
+    values.insert(values.end(), {tie, std::nextafter(tie, 0.0), std::nextafter(tie, 1e9)});
+  }
   for (double v : values) {
     std::string ours;
     navmisc::AppendFixed(ours, v, 6);
