@@ -170,33 +170,37 @@ Points ReadPoints(const std::string& listing) {
   return out;
 }
 
-std::string MissingTool(std::initializer_list<const char*> programs, bool schemas) {
+std::string MissingTool(std::initializer_list<const char*> programs) {
   for (const char* p : programs) {
     if (!HaveProgram(p)) return std::string(p) + " is not installed (scripts/setup.sh installs it)";
   }
-  if (schemas && SchemaDir().empty()) return "the schema folder (NAVMISC_SCHEMA_DIR) is not there";
   return {};
 }
-#define REQUIRE(schemas, ...)                                                  \
-  if (std::string why = MissingTool({__VA_ARGS__}, schemas); !why.empty()) { \
-    GTEST_SKIP() << why;                                                       \
+#define REQUIRE(...)                                                   \
+  if (std::string why = MissingTool({__VA_ARGS__}); !why.empty()) { \
+    GTEST_SKIP() << why;                                               \
   }
 
-// xmllint's exit status (0 = valid) and messages for `file` against schema `xsd`.
-CommandResult Validate(const std::string& file, const char* xsd) {
-  return RunCommand("xmllint --noout --nonet --schema " + ShellQuote(SchemaDir() + "/" + xsd) + " " + file + " 2>&1");
+// `file` must validate against schema `xsd` (xmllint). Without the schema folder only this check
+// is left out, with a note; the read-back checks still run.
+void ExpectValid(const std::string& file, const char* xsd) {
+  if (SchemaDir().empty()) {
+    std::printf("note: no schema check of %s: the schema folder (NAVMISC_SCHEMA_DIR) is not there\n",
+                file.c_str());
+    return;
+  }
+  const CommandResult r =
+      RunCommand("xmllint --noout --nonet --schema " + ShellQuote(SchemaDir() + "/" + xsd) + " " + file + " 2>&1");
+  EXPECT_EQ(r.status, 0) << r.out;
 }
 
 TEST(Readers, GpxValidatesAndReadsBack) {
-  REQUIRE(true, "xmllint", "gpsbabel", "ogrinfo");
+  REQUIRE("xmllint", "gpsbabel", "ogrinfo");
   Fixture f;
   CPtrList none;
   ASSERT_EQ(ExportGpx(f.root / L"out.gpx", f.tracks, f.items), 1);
   ASSERT_EQ(ExportGpx(f.root / L"empty.gpx", none, none), 1);
-  for (const wchar_t* file : {L"out.gpx", L"empty.gpx"}) {
-    const auto valid = Validate(f.Path(file), "gpx10.xsd");
-    EXPECT_EQ(valid.status, 0) << valid.out;
-  }
+  for (const wchar_t* file : {L"out.gpx", L"empty.gpx"}) ExpectValid(f.Path(file), "gpx10.xsd");
   const std::string gpx = f.Path(L"out.gpx");
   EXPECT_EQ(ReadPoints(RunCommand("gpsbabel -t -i gpx -f " + gpx + " -o unicsv -F -").out), f.points);
   EXPECT_EQ(ReadPoints(RunCommand("gpsbabel -w -i gpx -f " + gpx + " -o unicsv -F -").out), f.photoPoints);
@@ -206,12 +210,11 @@ TEST(Readers, GpxValidatesAndReadsBack) {
 }
 
 TEST(Readers, KmlValidatesAndReadsBackAndKmzOpens) {
-  REQUIRE(true, "xmllint", "gpsbabel", "ogrinfo", "unzip");
+  REQUIRE("xmllint", "gpsbabel", "ogrinfo", "unzip");
   Fixture f;
   ASSERT_EQ(ExportKml(f.root / L"out.kml", f.tracks, f.items, 0), 1);
   const std::string kml = f.Path(L"out.kml");
-  const auto valid = Validate(kml, "kml21.xsd");
-  EXPECT_EQ(valid.status, 0) << valid.out;
+  ExpectValid(kml, "kml21.xsd");
   EXPECT_EQ(ReadPoints(RunCommand("gpsbabel -t -i kml -f " + kml + " -o unicsv -F -").out), f.points);
   EXPECT_EQ(ReadPoints(RunCommand("ogrinfo -ro -al -q " + kml).out), f.allPoints);
   EXPECT_EQ(ReadPoints(RunCommand("ogrinfo --config GDAL_SKIP LIBKML -ro -al -q " + kml).out), f.allPoints);
@@ -224,17 +227,16 @@ TEST(Readers, KmlValidatesAndReadsBackAndKmzOpens) {
 }
 
 TEST(Readers, TcxValidatesAndReadsBack) {
-  REQUIRE(true, "xmllint", "gpsbabel");
+  REQUIRE("xmllint", "gpsbabel");
   Fixture f;
   ASSERT_EQ(ExportTcx(f.root / L"out.tcx", f.activity), 1);
-  const auto valid = Validate(f.Path(L"out.tcx"), "tcx2-with-ax2.xsd");
-  EXPECT_EQ(valid.status, 0) << valid.out;
+  ExpectValid(f.Path(L"out.tcx"), "tcx2-with-ax2.xsd");
   EXPECT_EQ(ReadPoints(RunCommand("gpsbabel -t -i gtrnctr -f " + f.Path(L"out.tcx") + " -o unicsv -F -").out),
             f.points);
 }
 
 TEST(Readers, CsvReadsBack) {
-  REQUIRE(false, "gpsbabel", "ogrinfo");
+  REQUIRE("gpsbabel", "ogrinfo");
   Fixture f;
   ASSERT_EQ(ExportCsv(f.root / L"out.csv", f.tracks, f.items, &f.trip, true), 1);
   const std::string csv = f.Path(L"out.csv");
