@@ -21,23 +21,13 @@ CommandResult Tool(const std::string& env, const std::string& args) {
 
 bool Shows(const CommandResult& r, const std::string& text) { return r.out.find(text) != std::string::npos; }
 
-TEST(InfoCommands, TimeZoneFollowsTheZoneDatabase) {
-  const struct {
-    const char* zone;
-    const char* offset;
-    const char* daylight;
-  } cases[] = {
-      {"Asia/Taipei", "28800 s", "Daylight saving: no"},
-      {"Europe/Berlin", "", "Daylight saving: yes"},  // offset depends on today's date
-      {"UTC", "Offset from UTC: 0 s", "Daylight saving: no"},
-      {"America/Sao_Paulo", "-10800 s", "Daylight saving: no"},  // gave up daylight saving in 2019
-  };
-  for (const auto& c : cases) {
-    const CommandResult r = Tool(std::string("TZ=") + c.zone, "timezone");
-    EXPECT_EQ(r.status, 0) << c.zone << "\n" << r.out;
-    EXPECT_TRUE(Shows(r, c.offset)) << c.zone << "\n" << r.out;
-    EXPECT_TRUE(Shows(r, c.daylight)) << c.zone << "\n" << r.out;
-  }
+TEST(InfoCommands, TimeZoneFollowsTZ) {
+  // The zone rules themselves are the library's; here the command must honour TZ and say both.
+  CommandResult r = Tool("TZ=Asia/Taipei", "timezone");
+  EXPECT_EQ(r.status, 0) << r.out;
+  EXPECT_TRUE(Shows(r, "Offset from UTC: 28800 s (+8.00 h)\nDaylight saving: no")) << r.out;
+  r = Tool("TZ=Europe/Berlin", "timezone");
+  EXPECT_TRUE(Shows(r, "Daylight saving: yes")) << r.out;
   EXPECT_EQ(Tool("", "timezone extra").status, 2);
 }
 
