@@ -415,6 +415,19 @@ bool Tried(const TRACK_ITEM_INFO* track, const wchar_t* trackId) {
   return track && (!trackId || !trackId[0] || track->id == trackId);
 }
 
+// The track's point at `time` into the outputs, which stay untouched when the track has none.
+bool PointAt(TRACK_ITEM_INFO& track, long time, double& latitude, double& longitude,
+             double& altitude, long& speed) {
+  double lat = 0.0, lon = 0.0, alt = 0.0;
+  long spd = 0;
+  if (!track.MappingTimeToPoint(time, lat, lon, spd, alt)) return false;
+  latitude = lat;
+  longitude = lon;
+  altitude = alt;
+  speed = spd;
+  return true;
+}
+
 }  // namespace
 
 TRACK_ITEM_INFO* GetTrackGPSFromTime(const CPtrList& tracks, long time, double& latitude,
@@ -422,14 +435,7 @@ TRACK_ITEM_INFO* GetTrackGPSFromTime(const CPtrList& tracks, long time, double& 
                                      const wchar_t* trackId) {
   for (const TRACK_ITEM_INFO* c : navmisc::Items<const TRACK_ITEM_INFO>(tracks)) {
     auto* track = const_cast<TRACK_ITEM_INFO*>(c);
-    if (!Tried(track, trackId)) continue;
-    double lat = 0.0, lon = 0.0, alt = 0.0;
-    long spd = 0;
-    if (track->MappingTimeToPoint(time, lat, lon, spd, alt)) {
-      latitude = lat;
-      longitude = lon;
-      altitude = alt;
-      speed = spd;
+    if (Tried(track, trackId) && PointAt(*track, time, latitude, longitude, altitude, speed)) {
       return track;
     }
   }
@@ -445,15 +451,7 @@ TRACK_ITEM_INFO* GetTrackTimeFromGPS(const CPtrList& tracks, double tolerance, d
     const long t = track->MappingPointToTime(latitude, longitude, tolerance);
     if (t == -1) continue;
     time = t;
-    double lat = 0.0, lon = 0.0, alt = 0.0;
-    long spd = 0;
-    if (track->MappingTimeToPoint(t, lat, lon, spd, alt)) {
-      latitude = lat;
-      longitude = lon;
-      altitude = alt;
-      speed = spd;
-      return track;
-    }
+    if (PointAt(*track, t, latitude, longitude, altitude, speed)) return track;
   }
   return nullptr;
 }

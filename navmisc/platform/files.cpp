@@ -15,28 +15,11 @@
 #include <string_view>
 #include <vector>
 
+#include "navmisc/platform/detail/unique_fd.h"
+
 namespace {
 
-// Closes a descriptor when it goes out of scope.
-class Fd {
- public:
-  explicit Fd(int fd = -1) : fd_(fd) {}
-  ~Fd() {
-    if (fd_ >= 0) ::close(fd_);
-  }
-  Fd(const Fd&) = delete;
-  Fd& operator=(const Fd&) = delete;
-  int get() const { return fd_; }
-  bool ok() const { return fd_ >= 0; }
-  int release() {
-    int fd = fd_;
-    fd_ = -1;
-    return fd;
-  }
-
- private:
-  int fd_;
-};
+using Fd = navmisc::detail::UniqueFd;
 
 std::wstring_view WView(const wchar_t* s) { return s ? std::wstring_view(s) : std::wstring_view(); }
 

@@ -12,6 +12,7 @@
 #include <string>
 #include <vector>
 
+#include "navmisc/platform/detail/unique_fd.h"
 #include "navmisc/platform/files.h"
 
 namespace navmisc {
@@ -20,19 +21,7 @@ namespace {
 constexpr char kPrefix[] = "v1:";
 using Key = std::array<unsigned char, crypto_secretbox_KEYBYTES>;
 
-class Fd {
- public:
-  explicit Fd(int fd) : fd_(fd) {}
-  ~Fd() {
-    if (fd_ >= 0) ::close(fd_);
-  }
-  Fd(const Fd&) = delete;
-  Fd& operator=(const Fd&) = delete;
-  int get() const { return fd_; }
-
- private:
-  int fd_;
-};
+using Fd = navmisc::detail::UniqueFd;
 
 bool ReadAll(int fd, unsigned char* p, size_t n) {
   while (n > 0) {

@@ -19,6 +19,7 @@
 #include <vector>
 
 #include "navmisc/platform/atomic_file.h"
+#include "navmisc/platform/detail/unique_fd.h"
 #include "navmisc/platform/format.h"
 #include "navmisc/platform/files.h"
 #include "navmisc/platform/textconv.h"
@@ -300,19 +301,7 @@ class Utf16Decoder {
   unsigned high_ = 0;  // a high surrogate waiting for its partner
 };
 
-class Fd {
- public:
-  explicit Fd(int fd) : fd_(fd) {}
-  ~Fd() {
-    if (fd_ >= 0) ::close(fd_);
-  }
-  Fd(const Fd&) = delete;
-  Fd& operator=(const Fd&) = delete;
-  int get() const { return fd_; }
-
- private:
-  int fd_;
-};
+using Fd = navmisc::detail::UniqueFd;
 
 // Reads up to `size` bytes, fewer only at the end of the file. -1 on error.
 ssize_t ReadFull(int fd, char* buf, size_t size) {
