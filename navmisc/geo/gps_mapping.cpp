@@ -76,17 +76,24 @@ int CGPSMapping::MappingTimeToPoint(long time, sWayPoint& point) {
   for (int i = 1; i < m_nCount; ++i) {
     navmisc::GeoTrace("\r\nType = %d", static_cast<int>(m_pPoints[i].extraA));
     const long t0 = m_pPoints[i - 1].time, t1 = m_pPoints[i].time;
-    if (time == t0) {
-      point = m_pPoints[i - 1];
-      return 1;
+    if (time == t0 || time == t1 || (t0 <= time && time <= t1)) {
+      return _MapTimeOnLeg(i, time, point);
     }
-    if (time == t1) {
-      point = m_pPoints[i];
-      return 1;
-    }
-    if (t0 <= time && time <= t1) return _MapTimeWithinLeg(i, time, point);
   }
   return 0;
+}
+
+int CGPSMapping::_MapTimeOnLeg(int i, long time, sWayPoint& point) {
+  // A time that a point carries is answered by that point, the leg's start first.
+  if (time == m_pPoints[i - 1].time) {
+    point = m_pPoints[i - 1];
+    return 1;
+  }
+  if (time == m_pPoints[i].time) {
+    point = m_pPoints[i];
+    return 1;
+  }
+  return _MapTimeWithinLeg(i, time, point);
 }
 
 int CGPSMapping::_MapTimeWithinLeg(int i, long time, sWayPoint& point) {
@@ -179,15 +186,7 @@ class IndexedTrack : public CGPSMapping {
     const int i = std::max(1, static_cast<int>(it - times_.begin()));
     const long t0 = times_[i - 1], t1 = times_[i];
     if (!(t0 <= time && time <= t1)) return 0;
-    if (time == t0) {
-      point = m_pPoints[i - 1];
-      return 1;
-    }
-    if (time == t1) {
-      point = m_pPoints[i];
-      return 1;
-    }
-    return _MapTimeWithinLeg(i, time, point);
+    return _MapTimeOnLeg(i, time, point);
   }
 
   int PointToTime(double lat, double lon, long& time, double tolerance) {

@@ -43,6 +43,8 @@ class CGPSMapping : public CGPSHelper {
   // _Expand2 without a limit.
   sWayPoint* _Expand(const sWayPoint* p1, const sWayPoint* p2, int& count);
 
+  // The answer for a time within the leg (i - 1, i), its ends included.
+  int _MapTimeOnLeg(int i, long time, sWayPoint& point);
   // The answer for a time strictly inside the leg (i - 1, i).
   int _MapTimeWithinLeg(int i, long time, sWayPoint& point);
   // The answer for a position whose nearest leg is (i, i + 1).

@@ -20,6 +20,7 @@
 
 #include "navmisc/platform/atomic_file.h"
 #include "navmisc/platform/detail/unique_fd.h"
+#include "navmisc/platform/detail/utf8.h"
 #include "navmisc/platform/format.h"
 #include "navmisc/platform/files.h"
 #include "navmisc/platform/textconv.h"
@@ -278,23 +279,7 @@ class Utf16Decoder {
     }
   }
 
-  static void Put(unsigned cp, std::string& out) {
-    if (cp < 0x80) {
-      out.push_back(static_cast<char>(cp));
-    } else if (cp < 0x800) {
-      out.push_back(static_cast<char>(0xC0 | (cp >> 6)));
-      out.push_back(static_cast<char>(0x80 | (cp & 0x3F)));
-    } else if (cp < 0x10000) {
-      out.push_back(static_cast<char>(0xE0 | (cp >> 12)));
-      out.push_back(static_cast<char>(0x80 | ((cp >> 6) & 0x3F)));
-      out.push_back(static_cast<char>(0x80 | (cp & 0x3F)));
-    } else {
-      out.push_back(static_cast<char>(0xF0 | (cp >> 18)));
-      out.push_back(static_cast<char>(0x80 | ((cp >> 12) & 0x3F)));
-      out.push_back(static_cast<char>(0x80 | ((cp >> 6) & 0x3F)));
-      out.push_back(static_cast<char>(0x80 | (cp & 0x3F)));
-    }
-  }
+  static void Put(unsigned cp, std::string& out) { navmisc::detail::AppendUtf8(out, cp); }
 
   bool big_endian_;
   int odd_ = -1;       // first byte of an incomplete code unit

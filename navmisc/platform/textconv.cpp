@@ -2,28 +2,12 @@
 
 #include <cstring>
 
+#include "navmisc/platform/detail/utf8.h"
+
 namespace navmisc {
 namespace {
 
 bool ValidScalar(char32_t c) { return c <= 0x10FFFF && (c < 0xD800 || c > 0xDFFF); }
-
-void PutUtf8(std::string& out, char32_t c) {
-  if (c < 0x80) {
-    out.push_back(static_cast<char>(c));
-  } else if (c < 0x800) {
-    out.push_back(static_cast<char>(0xC0 | (c >> 6)));
-    out.push_back(static_cast<char>(0x80 | (c & 0x3F)));
-  } else if (c < 0x10000) {
-    out.push_back(static_cast<char>(0xE0 | (c >> 12)));
-    out.push_back(static_cast<char>(0x80 | ((c >> 6) & 0x3F)));
-    out.push_back(static_cast<char>(0x80 | (c & 0x3F)));
-  } else {
-    out.push_back(static_cast<char>(0xF0 | (c >> 18)));
-    out.push_back(static_cast<char>(0x80 | ((c >> 12) & 0x3F)));
-    out.push_back(static_cast<char>(0x80 | ((c >> 6) & 0x3F)));
-    out.push_back(static_cast<char>(0x80 | (c & 0x3F)));
-  }
-}
 
 // Decodes one UTF-8 sequence at in[i]; returns false for a malformed one (overlong forms,
 // surrogates and values beyond U+10FFFF included). `len` receives the bytes to skip.
@@ -66,7 +50,7 @@ bool WideToUtf8(std::wstring_view in, std::string& out) {
       out.clear();
       return false;
     }
-    PutUtf8(out, c);
+    detail::AppendUtf8(out, c);
   }
   return true;
 }
@@ -92,7 +76,7 @@ std::string ToUtf8Lossy(std::wstring_view in) {
   out.reserve(in.size());
   for (wchar_t w : in) {
     const char32_t c = static_cast<char32_t>(w);
-    if (ValidScalar(c)) PutUtf8(out, c);
+    if (ValidScalar(c)) detail::AppendUtf8(out, c);
     else out.push_back('?');
   }
   return out;
