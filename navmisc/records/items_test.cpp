@@ -78,8 +78,6 @@ TEST(WaypointRecord, EqualityComparesTheTrackFieldsOnly) {
   const Case cases[] = {
       {"name", [](WAYPOINT_ITEM_INFO& p) { p.name = L"other"; }, true},
       {"extraB", [](WAYPOINT_ITEM_INFO& p) { p.extraB = 99; }, true},
-      {"flags", [](WAYPOINT_ITEM_INFO& p) { p.flags[0] = 0; }, true},
-      {"attr1", [](WAYPOINT_ITEM_INFO& p) { p.attr1 = 42; }, true},
       {"type", [](WAYPOINT_ITEM_INFO& p) { p.type = -1; }, false},
       {"time", [](WAYPOINT_ITEM_INFO& p) { p.time += 1; }, false},
       {"latitude", [](WAYPOINT_ITEM_INFO& p) { p.latitude += 1e-12; }, false},
@@ -122,7 +120,6 @@ TEST(PhotoRecord, UrlDefaultsAndNewIds) {
   PHOTO_ITEM_INFO photo(nullptr, L"a", L"b", L"c");
   const std::regex idForm("PH_[0-9A-F]{16}");
   EXPECT_TRUE(std::regex_match(photo.photoId.ToUtf8(), idForm)) << photo.photoId.ToUtf8();
-  EXPECT_TRUE(photo.itemName.IsEmpty());
   PHOTO_ITEM_INFO other(nullptr, L"a", L"b", L"c");
   EXPECT_NE(photo.photoId, other.photoId);
   EXPECT_TRUE(std::regex_match(NewItemId(L"TK_").ToUtf8(), std::regex("TK_[0-9A-F]{16}")));

@@ -142,20 +142,4 @@ TEST_F(TripTree, CleanUpRemovesOnlyUnnamedFoldersOfACompleteTree) {
   EXPECT_EQ(ReadFileBytes(outside / L"precious"), "keep");
 }
 
-TEST_F(TripTree, CopyDuplicatesEveryTrip) {
-  BLOG_TREE_NODE root(nullptr);
-  root.name = L"Root";
-  root.value2 = 5;
-  root.trips.AddTail(NewTrip(L"one"));
-  AddNode(root, L"c")->trips.AddTail(NewTrip(L"two"));
-  BLOG_TREE_NODE copy(&root);
-  EXPECT_EQ(copy.name, L"Root");
-  EXPECT_EQ(copy.value2, 5);
-  auto* t = static_cast<BLOG_ITEM_INFO*>(copy.trips.GetHead());
-  EXPECT_NE(t->tripId, static_cast<BLOG_ITEM_INFO*>(root.trips.GetHead())->tripId);
-  EXPECT_EQ(t->name, L"one");
-  ASSERT_EQ(copy.children.GetCount(), 1);
-  EXPECT_EQ(static_cast<BLOG_TREE_NODE*>(copy.children.GetHead())->trips.GetCount(), 1);
-}
-
 }  // namespace
