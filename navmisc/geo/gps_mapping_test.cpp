@@ -2,9 +2,9 @@
 
 #include <gtest/gtest.h>
 
+#include <array>
 #include <cmath>
 #include <memory>
-#include <optional>
 #include <string>
 #include <tuple>
 #include <vector>
@@ -221,22 +221,23 @@ TEST(Mapping, ScopedAnswersEqualThePlainSearch) {
     fixes[changed]->time = fixes[from]->time;
     // At every third fix (1500 and 192 among them, and the first and last): up to 3 s either
     // side of its time, and from its own position to 5 km north of it.
-    std::vector<std::string> answers[2];
-    for (std::vector<std::string>& out : answers) {
-      std::optional<navmisc::TrackMappingScope> scope;
-      if (&out == &answers[1]) scope.emplace();
+    const auto ask = [&] {
+      std::vector<std::string> out;
       for (size_t i = 0; i < fixes.size(); i += 3) {
-        const double north[] = {0, 1e-4, 5e-4, 0.01, 0.05};
         double lat = -1, lon = -1, alt = -1;
         long speed = -1;
         const long when = fixes[i]->time + static_cast<long>(i % 7) - 3;
         const bool found = track.MappingTimeToPoint(when, lat, lon, speed, alt);
-        const long time = track.MappingPointToTime(fixes[i]->latitude + north[i % 5], fixes[i]->longitude,
+        const double north = std::array{0.0, 1e-4, 5e-4, 0.01, 0.05}[i % 5];
+        const long time = track.MappingPointToTime(fixes[i]->latitude + north, fixes[i]->longitude,
                                                    i % 2 ? 30.0 : 5000.0);
         out.push_back(navmisc::FormatA("%d %.12f %.12f %ld %.6f %ld", found, lat, lon, speed, alt, time));
       }
-    }
-    ASSERT_EQ(answers[1], answers[0]) << "fix " << changed << " at the time of fix " << from;
+      return out;
+    };
+    const std::vector<std::string> plain = ask();
+    navmisc::TrackMappingScope scope;
+    ASSERT_EQ(ask(), plain) << "fix " << changed << " at the time of fix " << from;
   }
 }
 
