@@ -23,7 +23,7 @@ const std::string kPrologue =
 // is filled first to show that waypoints still come first.
 struct Fixture {
   CPtrList tracks, items;
-  std::unique_ptr<TRACK_ITEM_INFO> t1, t2, t3;
+  std::unique_ptr<TRACK_ITEM_INFO> t1, t2;
   std::unique_ptr<PHOTO_ITEM_INFO> a, b, c;
   Fixture() {
     t1 = MakeTrack(L"Track 1", {{25.1, 121.5, 12, 1000000000, 36000},
@@ -31,12 +31,10 @@ struct Fixture {
                                 {25.1005, 121.5005, 13.25, 1000000010, 1800},
                                 {-45.5, -170.25, -1.5, 1000086399, 3599},
                                 {1, 2, 0, 0, 1}});
-    t2 = MakeTrack(L"Empty", {});
-    t3 = MakeTrack(L"\u00dcber", {{1, 1, 1, -1}, {2, 2, 2, -1}});
+    t2 = MakeTrack(L"\u00dcber", {{1, 1, 1, -1}, {2, 2, 2, -1}});
     tracks.AddTail(t1.get());
     tracks.AddTail(static_cast<void*>(nullptr));
     tracks.AddTail(t2.get());
-    tracks.AddTail(t3.get());
     a = MakeItem(0, L"a", L"b\r\nsecond line", 25.1, 121.5, 12, 1000000000);
     b = MakeItem(1, L"Caf\u00e9 \u2615", L"", -33.856, 151.215, -3.5, 0);
     c = MakeItem(0, L"x&<y>", L"l1\nl2\r\nl3", 0.0000004, -0.0000006, 0, -1);
@@ -66,7 +64,6 @@ const std::string kFullDocument =
     "\r\n<trkpt lat=\"1.000000\" lon=\"2.000000\">\r\n<ele>0.000000</ele>\r\n"
     "<time>1970-01-01T00:00:00Z</time>\r\n<speed>0.00</speed>\r\n</trkpt>"
     "\r\n</trkseg>\r\n</trk>"
-    "\r\n<trk>\r\n<name>Empty</name>\r\n<desc>Color:004000ff</desc>\r\n<trkseg>\r\n</trkseg>\r\n</trk>"
     "\r\n<trk>\r\n<name>\xC3\x9C" "ber</name>\r\n<desc>Color:004000ff</desc>\r\n<trkseg>\r\n</trkseg>\r\n</trk>"
     "\r\n</gpx>";
 
