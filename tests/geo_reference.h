@@ -34,9 +34,6 @@ class OwnedPoints {
     list.AddTail(p);
     return p;
   }
-  WAYPOINT_ITEM_INFO& operator[](int i) {
-    return *static_cast<WAYPOINT_ITEM_INFO*>(list.GetAt(list.FindIndex(i)));
-  }
   // The positions in the list of the points whose kept-mark is set (or, with false, clear).
   std::vector<int> Marked(bool set = true) const {
     std::vector<int> out;

@@ -1,8 +1,7 @@
-// What every exporter does alike (progress and stopping, existing and unwritable targets,
-// numbers that ignore the process locale), and the documents as real readers see them: xmllint
-// against the published schemas, and gpsbabel, GDAL's ogrinfo and unzip reading them back. The
-// reader tests are skipped when a tool or the schema folder is missing (scripts/setup.sh
-// installs the tools).
+// What every exporter does alike (progress and stopping, existing and unwritable targets), and
+// the documents as real readers see them: xmllint against the published schemas, and gpsbabel,
+// GDAL's ogrinfo and unzip reading them back. The reader tests are skipped when a tool or the
+// schema folder is missing (scripts/setup.sh installs the tools).
 #include <sys/stat.h>
 
 #include <cstdio>
@@ -129,23 +128,6 @@ TEST(Exporters, UnwritableTargetsGiveZeroAndAReason) {
   }
   EXPECT_EQ(ReadFileBytes(f.root / L"file"), "x");
   EXPECT_FALSE(FileExists(f.root / L"missing"));
-}
-
-TEST(Exporters, NumbersIgnoreACommaDecimalLocale) {
-  Fixture f;
-  std::vector<std::string> inC;
-  for (const Exporter& e : f.exporters) {
-    ASSERT_EQ(e.run(f.root / (CString(L"c.") + e.extension), nullptr, nullptr), 1);
-    inC.push_back(MaskKmlDate(ReadFileBytes(f.root / (CString(L"c.") + e.extension))));
-  }
-  CommaLocale locale;
-  if (!locale.ok()) GTEST_SKIP() << "no comma-decimal locale installed (scripts/setup.sh makes de_DE.UTF-8)";
-  for (size_t i = 0; i < f.exporters.size(); ++i) {
-    if (f.exporters[i].extension == std::wstring(L"kmz")) continue;  // holds the KML, and zip times
-    const CString path = f.root / (CString(L"de.") + f.exporters[i].extension);
-    ASSERT_EQ(f.exporters[i].run(path, nullptr, nullptr), 1);
-    EXPECT_EQ(MaskKmlDate(ReadFileBytes(path)), inC[i]) << f.exporters[i].extension;
-  }
 }
 
 // "lat,lon" of every row of a gpsbabel unicsv listing (whose first columns are No, Latitude,

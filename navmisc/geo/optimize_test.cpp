@@ -2,11 +2,10 @@
 
 #include <gtest/gtest.h>
 
-#include <algorithm>
+#include <cstdint>
 #include <memory>
 #include <string>
 #include <tuple>
-#include <utility>
 #include <vector>
 
 #include "geo_reference.h"
@@ -27,15 +26,22 @@ struct TrackShape {
   int points;
 };
 
-// Noisy tracks whose points all hold the old level 7, in a trip whose display level is 42.
+// Tracks whose points all hold the old level `oldLevel`, in a trip whose display level is 42:
+// noisy ones, or for seed 0 a walk east, 50 m per 5 s, with one wild fix (the sixth) 3 km off.
 std::unique_ptr<BLOG_ITEM_INFO> MakeTrip(const std::vector<TrackShape>& shapes,
-                                         const wchar_t* folder = L"OPT") {
+                                         const wchar_t* folder = L"OPT", int32_t oldLevel = 7) {
   auto trip = std::make_unique<BLOG_ITEM_INFO>(GPS_APP_TRIP, folder, 0);
   trip->optLevel = 42;
   for (const TrackShape& s : shapes) {
     auto* track = new TRACK_ITEM_INFO(trip.get());
-    navmisc::testing::AppendNoisyTrack(track->points, s.seed, s.points);
-    for (void* p : track->points) static_cast<WAYPOINT_ITEM_INFO*>(p)->type = 7;
+    if (s.seed) navmisc::testing::AppendNoisyTrack(track->points, s.seed, s.points);
+    for (int i = 0; s.seed == 0 && i < s.points; ++i) {
+      auto* p = new WAYPOINT_ITEM_INFO(nullptr);
+      std::tie(p->time, p->latitude, p->longitude, p->speed) =
+          std::tuple(1000 + 5 * i, MetresNorth(i == 5 ? 3000 : 0), MetresEast(50.0 * i), 36000);
+      track->points.AddTail(p);
+    }
+    for (void* p : track->points) static_cast<WAYPOINT_ITEM_INFO*>(p)->type = oldLevel;
     trip->tracks.AddTail(track);
   }
   return trip;
@@ -67,14 +73,17 @@ void ExpectSameLevels(BLOG_ITEM_INFO& a, BLOG_ITEM_INFO& b, const std::string& w
   }
 }
 
-// The one-pass levels against a separate Smooth run for every level. A cancel (the flag cleared
-// before the work starts) stops after the first track's coarsest level: the display level stays
-// 0 and the later tracks keep their old levels.
+// The one-pass levels against a separate Smooth run for every level, optimising or (off) only
+// choosing the display level again. A cancel (the flag cleared before the work starts) stops
+// after the first track's coarsest level: the display level stays 0 and the later tracks keep
+// their old levels.
 TEST(OptimizeWaypoint, LevelsEqualTheLiteralMethod) {
   const struct {
     std::vector<TrackShape> tracks;
     GPS_APP_PROG_TYPE product;
     bool cancel = false;
+    int optimise = 1;
+    int32_t oldLevel = 7;
   } cases[] = {
       {{{1, 3000}}, GPS_APP_TRIP},
       {{{2, 1500}, {3, 400}, {4, 120}}, GPS_APP_TRIP},
@@ -82,15 +91,22 @@ TEST(OptimizeWaypoint, LevelsEqualTheLiteralMethod) {
       {{{7, 60}, {8, 101}, {9, 102}, {10, 1}}, GPS_APP_TRACKER},  // a lone fix gets a twin
       {{{11, 5000}}, GPS_APP_TRACKER},
       {{{21, 2000}, {22, 500}, {23, 300}}, GPS_APP_TRIP, true},
+      // Revise runs on more than 50 points; Reduction and Smooth on more than 100 left after it.
+      {{{0, 50}, {0, 51}, {0, 101}, {0, 102}}, GPS_APP_TRIP},
+      // Off: 1200 points at 50 leave fewer than 1000 only above 50 (the other applications allow
+      // 11000); points never dropped leave no level with fewer.
+      {{{3, 1200}}, GPS_APP_TRIP, false, 0, 50},
+      {{{3, 1200}}, GPS_APP_SPORT, false, 0, 50},
+      {{{3, 1200}}, GPS_APP_TRIP, false, 0, navmisc::kLevelNeverDropped},
   };
   for (const auto& c : cases) {
     ProductScope product(c.product);
-    auto fast = MakeTrip(c.tracks), literal = MakeTrip(c.tracks);
+    auto fast = MakeTrip(c.tracks, L"OPT", c.oldLevel), literal = MakeTrip(c.tracks, L"OPT", c.oldLevel);
     int fastProgress = 0, literalProgress = 0;
     bool keepGoing = !c.cancel;
-    fast->OptimizeWaypoint(c.product, 1, &fastProgress, &keepGoing);
-    OptimizeTripLiterally(*literal, c.product, 1, &literalProgress, &keepGoing);
-    const std::string what = "seed " + std::to_string(c.tracks[0].seed);
+    fast->OptimizeWaypoint(c.product, c.optimise, &fastProgress, &keepGoing);
+    OptimizeTripLiterally(*literal, c.product, c.optimise, &literalProgress, &keepGoing);
+    const std::string what = "case " + std::to_string(&c - cases);
     ExpectSameLevels(*fast, *literal, what);
     EXPECT_EQ(fastProgress, literalProgress) << what;
     EXPECT_EQ(fastProgress, c.cancel ? 300 : static_cast<int>(c.tracks.size()) * 10300) << what;
@@ -98,57 +114,8 @@ TEST(OptimizeWaypoint, LevelsEqualTheLiteralMethod) {
     EXPECT_EQ(fast->optLevel, 0);
     for (TRACK_ITEM_INFO* later : TracksOf(fast->tracks)) {
       if (later == fast->tracks.GetHead()) continue;
-      for (auto* p : PointsOf(later)) ASSERT_EQ(p->type, 7);
+      for (auto* p : PointsOf(later)) ASSERT_EQ(p->type, c.oldLevel);
     }
-  }
-}
-
-TEST(OptimizeWaypoint, ShortTracksAreNotRevisedOrSmoothed) {
-  const struct {
-    int points;
-    bool revised, smoothed;
-  } cases[] = {{50, false, false}, {51, true, false}, {101, true, false}, {102, true, true}};
-  for (const auto& c : cases) {
-    auto trip = MakeTrip({{0, 0}});
-    auto* track = static_cast<TRACK_ITEM_INFO*>(trip->tracks.GetHead());
-    // A straight walk with one wild fix; without it 101 fixes would still be reduced.
-    for (int i = 0; i < c.points; ++i) {
-      auto* p = new WAYPOINT_ITEM_INFO(nullptr);
-      std::tie(p->time, p->latitude, p->longitude, p->speed) =
-          std::tuple(1000 + 5 * i, MetresNorth(i == 5 ? 3000 : 0), MetresEast(50.0 * i), 36000);
-      track->points.AddTail(p);
-    }
-    trip->OptimizeWaypoint(GPS_APP_TRIP, 1, nullptr, nullptr);
-    const auto points = PointsOf(track);
-    const auto essential = std::ranges::count(points, navmisc::kLevelNeverDropped, &WAYPOINT_ITEM_INFO::type);
-    const auto badFixes = std::ranges::count(points, navmisc::kLevelBadFix, &WAYPOINT_ITEM_INFO::type);
-    EXPECT_EQ(badFixes, c.revised ? 1 : 0) << c.points;
-    // Smoothing hands every remaining point a level of 100 or below.
-    EXPECT_EQ(essential, c.smoothed ? 0 : c.points - badFixes) << c.points;
-  }
-}
-
-TEST(OptimizeWaypoint, OffKeepsTheLevelsAndRecomputesTheDisplayLevel) {
-  const struct {
-    int points, level;
-    GPS_APP_PROG_TYPE product;
-    int32_t displayLevel;
-  } cases[] = {
-      {1200, 50, GPS_APP_TRIP, 51},  // 1200 points at 50: fewer than 1000 only above 50
-      {1200, 50, GPS_APP_SPORT, 0},  // the other applications allow 11000
-      {900, 50, GPS_APP_TRIP, 0},
-      {1200, navmisc::kLevelStop, GPS_APP_TRIP, 0},
-      {1200, navmisc::kLevelNeverDropped, GPS_APP_TRIP, 101},
-  };
-  for (const auto& c : cases) {
-    auto trip = MakeTrip({{3, c.points}});
-    const auto points = PointsOf(static_cast<TRACK_ITEM_INFO*>(trip->tracks.GetHead()));
-    for (auto* p : points) p->type = c.level;
-    int progress = 0;
-    trip->OptimizeWaypoint(c.product, 0, &progress, nullptr);
-    EXPECT_EQ(trip->optLevel, c.displayLevel) << c.points << " at " << c.level;
-    EXPECT_EQ(progress, 10300);
-    for (auto* p : points) ASSERT_EQ(p->type, c.level);
   }
 }
 

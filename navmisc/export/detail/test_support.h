@@ -1,8 +1,6 @@
 // Record builders and file helpers shared by the exporter tests.
 #pragma once
 
-#include <clocale>
-#include <cstdio>
 #include <memory>
 #include <string>
 #include <tuple>
@@ -58,30 +56,6 @@ inline std::string MaskKmlDate(const std::string& doc, std::string* name = nullp
   if (name) *name = doc.substr(from, end - from);
   return doc.substr(0, from) + "@DATE@" + doc.substr(end);
 }
-
-// Switches the whole process to a locale that writes decimal commas for the object's lifetime;
-// ok() is false when the system has none.
-class CommaLocale {
- public:
-  CommaLocale() {
-    for (const char* name : {"de_DE.UTF-8", "de_DE.utf8", "fr_FR.UTF-8", "fr_FR.utf8"}) {
-      if (std::setlocale(LC_ALL, name)) {
-        char buf[16];
-        std::snprintf(buf, sizeof buf, "%.1f", 1.5);
-        if (std::string(buf) == "1,5") {
-          ok_ = true;
-          return;
-        }
-      }
-    }
-    std::setlocale(LC_ALL, "C");
-  }
-  ~CommaLocale() { std::setlocale(LC_ALL, "C"); }
-  bool ok() const { return ok_; }
-
- private:
-  bool ok_ = false;
-};
 
 // The folder of the published schemas, or empty when it is absent.
 inline std::string SchemaDir() {
