@@ -10,7 +10,14 @@ packages=(
   libsodium-dev                        # protection of the stored password
   libexiv2-dev                         # the tagging tool
   libgtest-dev libgmock-dev libbenchmark-dev
+  libcli11-dev                         # the command line's options
+  libexpat1-dev                        # reading GPX, TCX and KML files
+  libcurl4-openssl-dev                 # the web service
+  libcpp-httplib-dev                   # the tests' loopback web server
+  libgps-dev gpsd gpsd-clients         # live positions from gpsd; gpsfake for its tests
   libxml2-utils gpsbabel gdal-bin zip unzip   # readers that check the exported documents
+  exiv2 libimage-exiftool-perl         # readers that check the tagged photos
+  python3-gpxpy                        # moving times to compare with
   tzdata
   locales                              # a comma-decimal locale for the locale tests
 )
