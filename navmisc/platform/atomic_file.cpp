@@ -129,6 +129,7 @@ bool AtomicFile::Open(const wchar_t* path) {
   fd_ = fd;
   temp_ = std::move(temp);
   failed_ = false;
+  keepTimes_ = false;
   written_ = writtenBack_ = 0;
   buffer_.clear();
   buffer_.reserve(kBufferSize);
@@ -172,11 +173,18 @@ void AtomicFile::StartWriteback() {
   writtenBack_ = written_;
 }
 
+void AtomicFile::SetTimes(const struct timespec& accessed, const struct timespec& modified) {
+  times_[0] = accessed;
+  times_[1] = modified;
+  keepTimes_ = true;
+}
+
 bool AtomicFile::Commit() {
   if (fd_ < 0) return false;
   // The data must be on disk before the rename makes it visible, or a crash could leave the
-  // target name pointing at an empty or partial file.
-  bool ok = Flush() && FsyncRetry(fd_);
+  // target name pointing at an empty or partial file. The times are set after the last write,
+  // which would otherwise move the modification time again.
+  bool ok = Flush() && (!keepTimes_ || ::futimens(fd_, times_) == 0) && FsyncRetry(fd_);
   const int fd = fd_;
   fd_ = -1;
   if (RetryClose(fd) != 0) ok = false;

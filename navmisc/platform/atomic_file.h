@@ -5,6 +5,7 @@
 #pragma once
 
 #include <sys/types.h>
+#include <time.h>
 
 #include <cstddef>
 #include <string>
@@ -29,6 +30,9 @@ class AtomicFile {
   bool Write(const void* data, size_t size) {
     return Write(std::string_view(static_cast<const char*>(data), size));
   }
+  // Gives the new file these access and modification times instead of the time of the write
+  // (for a file whose content changes in a way its user should not see as an edit).
+  void SetTimes(const struct timespec& accessed, const struct timespec& modified);
   // Flushes, syncs and renames over the target. False (target untouched) on any failure.
   bool Commit();
   // Removes the temporary file; the target stays as it was.
@@ -41,6 +45,8 @@ class AtomicFile {
   off_t written_ = 0;      // bytes in the temporary file
   off_t writtenBack_ = 0;  // bytes whose writing out has been started
   bool failed_ = false;
+  bool keepTimes_ = false;
+  struct timespec times_[2] = {};
   std::string target_;
   std::string temp_;
   std::string buffer_;

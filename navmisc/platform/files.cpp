@@ -274,6 +274,25 @@ bool IsDirectory(const wchar_t* path) {
   return !p.empty() && ::stat(p.c_str(), &st) == 0 && S_ISDIR(st.st_mode);
 }
 
+bool GetFileBirthTime(const wchar_t* path, long long& seconds, long& nanoseconds) {
+  std::string p = NativePath(path);
+  if (p.empty()) return false;
+  Fd fd(::open(p.c_str(), O_RDONLY | O_CLOEXEC | O_NONBLOCK));
+  if (!fd.ok()) return false;
+  struct statx sx {};
+  if (::statx(fd.get(), "", AT_EMPTY_PATH, STATX_BTIME | STATX_CTIME, &sx) == 0) {
+    const struct statx_timestamp& t = (sx.stx_mask & STATX_BTIME) ? sx.stx_btime : sx.stx_ctime;
+    seconds = t.tv_sec;
+    nanoseconds = static_cast<long>(t.tv_nsec);
+    return true;
+  }
+  struct stat st;
+  if (::fstat(fd.get(), &st) != 0) return false;
+  seconds = st.st_ctim.tv_sec;
+  nanoseconds = st.st_ctim.tv_nsec;
+  return true;
+}
+
 bool SetFileNormal(const wchar_t* path) {
   std::string p = NativePath(path);
   struct stat st;

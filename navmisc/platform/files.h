@@ -29,6 +29,10 @@ int PathStatus(const wchar_t* path);
 bool FileExists(const wchar_t* path);
 // True when the path leads to a folder, following symbolic links.
 bool IsDirectory(const wchar_t* path);
+// When the file was made: its birth time where the file system records one, else the time its
+// status last changed (the nearest a Linux file system without birth times comes to it). Seconds
+// and nanoseconds since 1970 (UTC). False when the file cannot be opened for reading.
+bool GetFileBirthTime(const wchar_t* path, long long& seconds, long& nanoseconds);
 // Makes the file writable by its owner ("attributes normal").
 bool SetFileNormal(const wchar_t* path);
 // The clearing of an export's target: up to 3 attempts; stop when the file-name part is empty or
