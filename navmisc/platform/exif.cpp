@@ -7,6 +7,7 @@
 #include <cstdint>
 #include <cstdio>
 #include <mutex>
+#include <stdexcept>
 #include <string>
 #include <vector>
 
@@ -57,9 +58,18 @@ void InitExiv2() {
 
 Exiv2::Image::AutoPtr OpenImage(std::string_view bytes) {
   InitExiv2();
-  Exiv2::Image::AutoPtr image = Exiv2::ImageFactory::open(
-      reinterpret_cast<const Exiv2::byte*>(bytes.data()), static_cast<long>(bytes.size()));
-  if (!image.get()) throw Exiv2::Error(Exiv2::kerMemoryContainsUnknownImageType);
+  const auto* data = reinterpret_cast<const Exiv2::byte*>(bytes.data());
+  const auto size = static_cast<long>(bytes.size());
+  // exiv2's own message for this case speaks of failing to read input data (a format probe that
+  // looks beyond the end of a short file throws).
+  bool known = false;
+  try {
+    known = !bytes.empty() && Exiv2::ImageFactory::getType(data, size) != Exiv2::ImageType::none;
+  } catch (const Exiv2::AnyError&) {
+  }
+  if (!known) throw std::runtime_error("not a photo of a known format");
+  Exiv2::Image::AutoPtr image = Exiv2::ImageFactory::open(data, size);
+  if (!image.get()) throw std::runtime_error("not a photo of a known format");
   image->readMetadata();
   return image;
 }
@@ -180,18 +190,24 @@ void AppendUtf16(std::string& out, const CString& text, bool bigEndian) {
   }
 }
 
-std::string RawBytes(const Exiv2::Exifdatum& d) {
+// The bytes of a tag; 16-bit text of a comment value comes in `order`.
+std::string RawBytes(const Exiv2::Exifdatum& d, Exiv2::ByteOrder order) {
   std::string raw(static_cast<size_t>(d.size()), '\0');
-  if (!raw.empty()) d.copy(reinterpret_cast<Exiv2::byte*>(raw.data()), Exiv2::littleEndian);
+  if (!raw.empty()) d.copy(reinterpret_cast<Exiv2::byte*>(raw.data()), order);
   return raw;
 }
 
-// Exif.Photo.UserComment: an 8-byte character code, then the text ("UNICODE" in the byte order
-// of the EXIF data, anything else read as UTF-8).
-CString UserComment(const Exiv2::ExifData& exif, Exiv2::ByteOrder order) {
+// Exif.Photo.UserComment: an 8-byte character code, then the text ("UNICODE" is UTF-16 in the
+// byte order of the EXIF data, anything else is read as UTF-8).
+CString UserComment(const Exiv2::ExifData& exif, Exiv2::ByteOrder imageOrder) {
   const Exiv2::Exifdatum* d = Find(exif, kUserComment);
   if (!d) return {};
-  const std::string raw = RawBytes(*d);
+  // exiv2 reads the tag as a comment value, which hands its UTF-16 out in any order asked for;
+  // other values give their bytes as stored.
+  const bool converts = dynamic_cast<const Exiv2::CommentValue*>(&d->value()) != nullptr;
+  const Exiv2::ByteOrder order =
+      converts || imageOrder == Exiv2::invalidByteOrder ? Exiv2::littleEndian : imageOrder;
+  const std::string raw = RawBytes(*d, order);
   if (raw.size() < 8) return CleanText(raw);
   const std::string_view code(raw.data(), 8), text(raw.data() + 8, raw.size() - 8);
   if (code == std::string_view("UNICODE\0", 8)) return Utf16Text(text, order == Exiv2::bigEndian);
@@ -379,7 +395,7 @@ bool ReadExif(std::string_view photo, ExifInfo& info, std::string& error) {
       }
     }
     info.comment = CleanText(image->comment());
-    if (const Exiv2::Exifdatum* d = Find(exif, kXpComment)) info.xpComment = Utf16Text(RawBytes(*d), false);
+    if (const Exiv2::Exifdatum* d = Find(exif, kXpComment)) info.xpComment = Utf16Text(RawBytes(*d, Exiv2::littleEndian), false);
     info.userComment = UserComment(exif, image->byteOrder());
     info.dateTimeOriginal = DateTimeText(exif, kDateTimeOriginal);
     info.dateTime = DateTimeText(exif, kDateTime);

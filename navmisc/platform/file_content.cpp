@@ -48,14 +48,7 @@ bool FileContent::Load(const wchar_t* path, size_t maxBytes) {
   return true;
 }
 
-bool FileContent::IsWritable() const {
-  const std::string native = NativePath(path_);
-  struct stat st;
-  // A file without any write permission counts as read-only even for a user (root) whom the
-  // system would let write it: the protection is the file owner's wish.
-  return !native.empty() && ::stat(native.c_str(), &st) == 0 && (st.st_mode & 0222) != 0 &&
-         ::access(native.c_str(), W_OK) == 0;
-}
+bool FileContent::IsWritable() const { return IsFileWritable(path_); }
 
 bool FileContent::Replace(std::string_view bytes) {
   error_.clear();

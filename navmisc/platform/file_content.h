@@ -23,8 +23,7 @@ class FileContent {
 
   const std::string& bytes() const { return bytes_; }
   const CString& path() const { return path_; }
-  // True when the calling user may write the file: it has a write permission bit and the system
-  // grants this user writing.
+  // True when the calling user may write the file (IsFileWritable).
   bool IsWritable() const;
 
   // Replaces the loaded file's content with `bytes`. False, with error() telling why and the

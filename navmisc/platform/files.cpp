@@ -293,6 +293,23 @@ bool GetFileBirthTime(const wchar_t* path, long long& seconds, long& nanoseconds
   return true;
 }
 
+bool IsFileWritable(const wchar_t* path) {
+  const int mode = GetFileMode(path);
+  return mode >= 0 && (mode & 0222) != 0 && ::access(NativePath(path).c_str(), W_OK) == 0;
+}
+
+int GetFileMode(const wchar_t* path) {
+  std::string p = NativePath(path);
+  struct stat st;
+  if (p.empty() || ::stat(p.c_str(), &st) != 0) return -1;
+  return static_cast<int>(st.st_mode & 07777);
+}
+
+bool SetFileMode(const wchar_t* path, int mode) {
+  std::string p = NativePath(path);
+  return !p.empty() && mode >= 0 && ::chmod(p.c_str(), static_cast<mode_t>(mode & 07777)) == 0;
+}
+
 bool SetFileNormal(const wchar_t* path) {
   std::string p = NativePath(path);
   struct stat st;

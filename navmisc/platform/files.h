@@ -33,6 +33,13 @@ bool IsDirectory(const wchar_t* path);
 // status last changed (the nearest a Linux file system without birth times comes to it). Seconds
 // and nanoseconds since 1970 (UTC). False when the file cannot be opened for reading.
 bool GetFileBirthTime(const wchar_t* path, long long& seconds, long& nanoseconds);
+// True when the calling user may write the file: it has a write permission bit (a file without
+// any counts as write-protected even for root, who could write it) and the system grants this
+// user writing.
+bool IsFileWritable(const wchar_t* path);
+// The permission bits of a file (07777), following a symbolic link; -1 when it cannot be read.
+int GetFileMode(const wchar_t* path);
+bool SetFileMode(const wchar_t* path, int mode);
 // Makes the file writable by its owner ("attributes normal").
 bool SetFileNormal(const wchar_t* path);
 // The clearing of an export's target: up to 3 attempts; stop when the file-name part is empty or
