@@ -373,6 +373,8 @@ bool ReadExif(std::string_view photo, ExifInfo& info, std::string& error) {
   return Guarded(error, [&] {
     Exiv2::Image::AutoPtr image = OpenImage(photo);
     const Exiv2::ExifData& exif = image->exifData();
+    info.width = std::max(0, image->pixelWidth());
+    info.height = std::max(0, image->pixelHeight());
     double lat = 0.0, lon = 0.0;
     if (Coordinate(exif, kLatitude, kLatitudeRef, 'S', 90.0, lat) &&
         Coordinate(exif, kLongitude, kLongitudeRef, 'W', 180.0, lon)) {

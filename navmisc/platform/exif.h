@@ -20,6 +20,8 @@ constexpr size_t kMaxPhotoBytes = size_t{1} << 30;
 // What a photo's metadata says. Values that are missing, malformed or absurd (a latitude of 300,
 // a zero denominator, a date "0000:00:00 00:00:00") are reported as absent.
 struct ExifInfo {
+  int width = 0;   // pixels, 0 when unknown
+  int height = 0;
   bool hasPosition = false;
   double latitude = 0.0;   // degrees, north positive
   double longitude = 0.0;  // degrees, east positive

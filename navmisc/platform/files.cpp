@@ -10,6 +10,7 @@
 #include <unistd.h>
 
 #include <algorithm>
+#include <filesystem>
 #include <cwctype>
 #include <string>
 #include <string_view>
@@ -356,6 +357,13 @@ CString GetCurrentExecPath() {
   if (n <= 0 || static_cast<size_t>(n) >= buf.size()) return CString();
   buf.resize(static_cast<size_t>(n));
   return PathFolder(CString::FromUtf8(buf));
+}
+
+CString AbsolutePath(const wchar_t* path) {
+  std::error_code ec;
+  const std::filesystem::path abs = std::filesystem::absolute(NativePath(path), ec);
+  if (ec || NativePath(path).empty()) return {};
+  return CString::FromUtf8(abs.lexically_normal().string());
 }
 
 CString PathJoin(const wchar_t* folder, const wchar_t* name) {

@@ -53,6 +53,10 @@ void SleepMs(unsigned ms);
 // The folder of the running executable, without a trailing separator.
 CString GetCurrentExecPath();
 
+// `path` made absolute against the current folder, with "." and ".." steps removed (links are
+// not resolved). Empty when the current folder cannot be found.
+CString AbsolutePath(const wchar_t* path);
+
 // Path text helpers (no file system access).
 CString PathJoin(const wchar_t* folder, const wchar_t* name);
 CString PathFolder(const wchar_t* path);     // "a/b/c.txt" -> "a/b"; "c.txt" -> ""
