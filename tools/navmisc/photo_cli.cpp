@@ -3,6 +3,7 @@
 #include <cmath>
 #include <exception>
 #include <iostream>
+#include <map>
 #include <memory>
 #include <string>
 
@@ -75,6 +76,23 @@ bool RunFallible(const std::string& label, int total, int& counter, bool& keepGo
   if (failure) std::rethrow_exception(failure);
   return finished;
 }
+
+// Passes the questions on to another view (if any) and remembers the answers by photo name.
+class RecordingView : public COverwriteView {
+ public:
+  explicit RecordingView(COverwriteView* inner) : inner_(inner) {}
+  int AskOverwrite(const wchar_t* photoName, bool& noAsk) override {
+    const int answer = inner_ ? inner_->AskOverwrite(photoName, noAsk) : IDNO;
+    answers.emplace(photoName, answer);
+    return answer;
+  }
+  bool Confirm(const wchar_t* message) override { return inner_ && inner_->Confirm(message); }
+
+  std::map<std::wstring, int> answers;
+
+ private:
+  COverwriteView* inner_;
+};
 
 bool Placed(const PHOTO_ITEM_INFO& photo) { return photo.latitude != 0.0 || photo.longitude != 0.0; }
 
@@ -241,14 +259,16 @@ GeotagOutcome GeotagTrip(BLOG_ITEM_INFO& trip, bool originals, std::optional<int
   if (placed.IsEmpty()) return outcome;
   bool noToAll = !originals || answer == IDCANCEL;
   bool yesToAll = originals && answer == IDYESTOALL;
+  const bool presetYes = yesToAll;
   int started = 0, counter = 0;
   bool keepGoing = true;
   const bool asking = !noToAll && !yesToAll;
+  RecordingView recorder(view);
   struct ViewScope {
     explicit ViewScope(COverwriteView* v) : previous(GetOverwriteView()) { SetOverwriteView(v); }
     ~ViewScope() { SetOverwriteView(previous); }
     COverwriteView* previous;
-  } scope(view);
+  } scope(&recorder);
   if (asking) {
     // The questions are the progress; a progress bar would write over them.
     started = CheckAndWriteGeoTagInfo(placed, noToAll, yesToAll, &counter, &keepGoing);
@@ -260,13 +280,20 @@ GeotagOutcome GeotagTrip(BLOG_ITEM_INFO& trip, bool originals, std::optional<int
   if (!started) {
     Fail("cannot start the tagging tool " + PathJoin(g_szExecProgPath, L"FixTag.exe").ToUtf8());
   }
+  // The originals the user agreed to, in the order they were asked about: after "yes to all"
+  // the rest are not asked.
+  bool all = presetYes;
   for (const auto* p : Items<PHOTO_ITEM_INFO>(placed)) {
     if (SamePosition(*p, p->GetFilePathName())) {
       ++outcome.tagged;
     } else {
       outcome.failed.push_back(p->itemName.ToUtf8());
     }
-    if (originals && !p->originalName.IsEmpty() && SamePosition(*p, p->originalName)) ++outcome.originals;
+    const auto said = recorder.answers.find(p->originalName.str());
+    const bool agreed = all || (said != recorder.answers.end() &&
+                                (said->second == IDYES || said->second == IDYESTOALL));
+    if (said != recorder.answers.end() && said->second == IDYESTOALL) all = true;
+    if (agreed && !p->originalName.IsEmpty() && SamePosition(*p, p->originalName)) ++outcome.originals;
   }
   return outcome;
 }

@@ -55,7 +55,9 @@ class PhotoCommands : public ::testing::Test {
   std::string Shot(const char* name, const std::string& arguments) {
     const CString path = camera_ / CString::FromUtf8(name);
     WriteFileBytes(path, Bytes(navmisc::kTinyJpeg));
-    if (!arguments.empty()) EXPECT_TRUE(ExiftoolWrite(path, arguments));
+    if (!arguments.empty()) {
+      EXPECT_TRUE(ExiftoolWrite(path, arguments));
+    }
     return path.ToUtf8();
   }
 
