@@ -6,8 +6,8 @@
 // Run: exif_fuzz -max_len=16384 -timeout=10 fuzz/corpus/exif
 #include <cmath>
 #include <cstdint>
-#include <cstdlib>
 #include <cstdio>
+#include <cstdlib>
 #include <string>
 #include <string_view>
 
@@ -37,7 +37,8 @@ bool IsDateTime(const CString& text) {
 extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
   navmisc::ExifInfo info;
   std::string error;
-  if (!navmisc::ReadExif(std::string_view(reinterpret_cast<const char*>(data), size), info, error)) {
+  if (!navmisc::ReadExif(std::string_view(reinterpret_cast<const char*>(data), size), info,
+                         error)) {
     Require(!error.empty(), "a failure without a reason");
     return 0;
   }

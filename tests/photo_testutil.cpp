@@ -9,7 +9,9 @@
 
 namespace navmisc::testutil {
 
-bool HavePhotoReaders() { return HaveProgram("exiftool") && HaveProgram("exiv2"); }
+bool HavePhotoReaders() {
+  return HaveProgram("exiftool") && HaveProgram("exiv2");
+}
 
 std::vector<std::string> Exiftool(const CString& photo, const std::vector<std::string>& tags) {
   std::string command = "exiftool -n -f -s3";
@@ -59,7 +61,9 @@ double Exiv2Degrees(const std::string& rationals) {
   return parts[0] + parts[1] / 60.0 + parts[2] / 3600.0;
 }
 
-CString FixTagPath() { return CString::FromUtf8(NAVMISC_TOOLS_DIR "/FixTag.exe"); }
+CString FixTagPath() {
+  return CString::FromUtf8(NAVMISC_TOOLS_DIR "/FixTag.exe");
+}
 
 int RunFixTag(const CString& commandFile) {
   ChildProcess tool;

@@ -15,8 +15,8 @@ inline constexpr const wchar_t* kPropSection = L"PROP";
 inline constexpr const wchar_t* kCount = L"Count";
 inline constexpr const wchar_t* kFileSection = L"File.%d";  // 0, 1, ...
 
-inline constexpr const wchar_t* kOldFile = L"Old File";  // the photo acted on
-inline constexpr const wchar_t* kNewFile = L"New File";  // copy request: the photo to copy to
+inline constexpr const wchar_t* kOldFile = L"Old File";   // the photo acted on
+inline constexpr const wchar_t* kNewFile = L"New File";   // copy request: the photo to copy to
 inline constexpr const wchar_t* kReadOnly = L"ReadOnly";  // read request when "true"
 inline constexpr const wchar_t* kTrue = L"true";
 

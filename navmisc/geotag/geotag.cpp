@@ -39,7 +39,9 @@ CString CommandFilePath() {
                   FormatString(L"%lX_%s", navmisc::GetCurrentThreadId(), fx::kFileName));
 }
 
-CString Section(int index) { return FormatString(fx::kFileSection, index); }
+CString Section(int index) {
+  return FormatString(fx::kFileSection, index);
+}
 
 // A path as a quoted argument of the command line: a double quote inside it is escaped so that
 // splitting the line gives the path back whole.
@@ -75,7 +77,9 @@ int32_t MetresPerHour(double kmh) {
 }
 
 // A time that comes from a long into a 32-bit time field.
-int32_t Time32(long long t) { return static_cast<int32_t>(static_cast<uint32_t>(t)); }
+int32_t Time32(long long t) {
+  return static_cast<int32_t>(static_cast<uint32_t>(t));
+}
 
 // "2012:05:17 08:30:00" as "05/17/2012 08:30:00": the tokens between " ", ":" and "/" in the
 // order month, day, year, hour, minute, second. Missing tokens stay empty (and the text then
@@ -172,7 +176,9 @@ int WriteCopies(const std::vector<PHOTO_ITEM_INFO*>& photos) {
   return started ? 1 : 0;
 }
 
-bool HasFile(const PHOTO_ITEM_INFO* photo) { return photo && !photo->GetFilePathName().IsEmpty(); }
+bool HasFile(const PHOTO_ITEM_INFO* photo) {
+  return photo && !photo->GetFilePathName().IsEmpty();
+}
 
 // The overwrite question for one photo: true when its original is to be written as well.
 bool WantsOriginal(const PHOTO_ITEM_INFO& photo, bool& noToAll, bool& yesToAll) {
@@ -257,7 +263,8 @@ int WriteGeoTagInfoToOriginal(PHOTO_ITEM_INFO* photo) {
   const bool hidden = PathFileName(path).Left(1) == L".";
   if (protectedFile || hidden) {
     const CString why = LoadResString(protectedFile ? kReadOnlyText : kHiddenText) + L" " + path;
-    if (!COverwriteDlg::Confirm(FormatString(L"%s\n%s", why.c_str(), LoadResString(kWriteAnywayText).c_str()))) {
+    if (!COverwriteDlg::Confirm(
+            FormatString(L"%s\n%s", why.c_str(), LoadResString(kWriteAnywayText).c_str()))) {
       return 0;
     }
   }

@@ -1,12 +1,11 @@
 #include "navmisc/geotag/geotag.h"
 
+#include <gtest/gtest.h>
 #include <sys/stat.h>
 
 #include <memory>
 #include <string>
 #include <vector>
-
-#include <gtest/gtest.h>
 
 #include "navmisc/geotag/fixtag_format.h"
 #include "navmisc/platform/datetime.h"
@@ -57,7 +56,8 @@ class GeotagTest : public ::testing::Test {
 
   // A photo of `trip` whose file in the trip folder is the tiny JPEG, imported from `original`
   // (a JPEG too, when given).
-  PHOTO_ITEM_INFO* AddPhoto(BLOG_ITEM_INFO& trip, const wchar_t* name, const CString& original = {}) {
+  PHOTO_ITEM_INFO* AddPhoto(BLOG_ITEM_INFO& trip, const wchar_t* name,
+                            const CString& original = {}) {
     auto* photo = new PHOTO_ITEM_INFO(&trip, nullptr, nullptr, nullptr);
     photo->itemName = name;
     photo->originalName = original;
@@ -91,10 +91,11 @@ TEST_F(GeotagTest, ReadRequestKeepsTheIndexOfSkippedEntriesAndConvertsAnswers) {
     double latitude;
     int32_t speed;
     const wchar_t* comment;
-    long time;            // -2: the file's creation time plus the zone shift
+    long time;  // -2: the file's creation time plus the zone shift
   } rows[] = {
       {"Latitude=47.5\nLongitude=8.25\nAltitude=410\nSpeed=12.5\nComment=c\nImage.XPComment=x\n"
-       "Photo.UserComment=u\nPhoto.DateTimeOriginal=2012:05:17 08:30:00\nImage.DateTime=2001:01:01 00:00:00\n",
+       "Photo.UserComment=u\nPhoto.DateTimeOriginal=2012:05:17 08:30:00\nImage.DateTime=2001:01:01 "
+       "00:00:00\n",
        47.5, 12500, L"c", DateTimeToLong(5, 17, 2012, 8, 30, 0)},
       {"Image.XPComment=x\nPhoto.UserComment=u\nImage.DateTime=2013:01:02 03:04:05\n", 0.0, 0, L"x",
        DateTimeToLong(1, 2, 2013, 3, 4, 5)},
@@ -120,8 +121,9 @@ TEST_F(GeotagTest, ReadRequestKeepsTheIndexOfSkippedEntriesAndConvertsAnswers) {
 
   const std::string seen = Seen();
   EXPECT_NE(seen.find("[PROP]\nCount=8\n"), std::string::npos) << seen;
-  EXPECT_NE(seen.find("[File.6]\nOld File=" + (root_ / L"stale.jpg").ToUtf8() + "\nReadOnly=true\n"),
-            std::string::npos);
+  EXPECT_NE(
+      seen.find("[File.6]\nOld File=" + (root_ / L"stale.jpg").ToUtf8() + "\nReadOnly=true\n"),
+      std::string::npos);
   EXPECT_EQ(seen.find("[File.1]"), std::string::npos) << "known photos are not asked for";
   EXPECT_EQ(ReadFileBytes(toolDir_ / L"args.txt"),
             (toolDir_ / fx::kProgram).ToUtf8() + "\n-ZE\n" + CommandFile().ToUtf8() + "\n");
@@ -157,13 +159,15 @@ TEST_F(GeotagTest, WriteAndCopyRequestsFormTheCommandFile) {
   photo->speed = 36000;
   WriteFileBytes(CommandFile(), "left over from a crash");
   EXPECT_EQ(WriteGeoTagInfo(photo, false), 1);
-  EXPECT_EQ(Seen(), "[PROP]\nCount=1\n\n[File.0]\nOld File=" + photo->GetFilePathName().ToUtf8() +
-                        "\nLatitude=46.5\nLongitude=7.25\nAltitude=1500\nSpeed=36\nComment=a b c d  e\n");
+  EXPECT_EQ(Seen(),
+            "[PROP]\nCount=1\n\n[File.0]\nOld File=" + photo->GetFilePathName().ToUtf8() +
+                "\nLatitude=46.5\nLongitude=7.25\nAltitude=1500\nSpeed=36\nComment=a b c d  e\n");
   EXPECT_FALSE(FileExists(CommandFile()));
 
   EXPECT_EQ(CopyExifGeoTagInfo(L"/photos/a b.jpg", L"/photos/\"quoted\".jpg"), 1);
-  EXPECT_EQ(Seen(), "[PROP]\nCount=1\n\n[File.0]\nOld File=/photos/a b.jpg\n"
-                    "New File=/photos/\"quoted\".jpg\n");
+  EXPECT_EQ(Seen(),
+            "[PROP]\nCount=1\n\n[File.0]\nOld File=/photos/a b.jpg\n"
+            "New File=/photos/\"quoted\".jpg\n");
 
   PHOTO_ITEM_INFO noFile(&trip, nullptr, nullptr, nullptr);
   bool no = false, yes = false;
@@ -201,9 +205,10 @@ TEST_F(GeotagTest, RealToolReadsTagsAndCopies) {
   ProgPathScope tools(CString::FromUtf8(NAVMISC_TOOLS_DIR));
   const CString camera = root_ / L"camera.jpg";
   WriteFileBytes(camera, Bytes(kTinyJpeg));
-  ASSERT_TRUE(ExiftoolWrite(camera, "'-DateTimeOriginal=2012:05:17 08:30:00' -GPSLatitude=10.5 "
-                                    "-GPSLatitudeRef=S -GPSLongitude=20.25 -GPSLongitudeRef=E "
-                                    "'-XPComment=from the camera'"));
+  ASSERT_TRUE(ExiftoolWrite(camera,
+                            "'-DateTimeOriginal=2012:05:17 08:30:00' -GPSLatitude=10.5 "
+                            "-GPSLatitudeRef=S -GPSLongitude=20.25 -GPSLongitudeRef=E "
+                            "'-XPComment=from the camera'"));
   _ExifImageInfo entry;
   entry.path = camera;
   ASSERT_EQ(GetPhotoInfor(&entry, false), 1);
@@ -219,9 +224,10 @@ TEST_F(GeotagTest, RealToolReadsTagsAndCopies) {
   photo->speed = 12345;
   photo->description = L"Line one\nline two";
   ASSERT_EQ(WriteGeoTagInfo(photo, false), 1);
-  EXPECT_EQ(Exiftool(photo->GetFilePathName(), {"Composite:GPSLatitude", "Composite:GPSLongitude",
-                                                "GPS:GPSSpeed", "UserComment"}),
-            (std::vector<std::string>{"-45.1234567", "170.7654321", "12.345", "Line one line two"}));
+  EXPECT_EQ(
+      Exiftool(photo->GetFilePathName(),
+               {"Composite:GPSLatitude", "Composite:GPSLongitude", "GPS:GPSSpeed", "UserComment"}),
+      (std::vector<std::string>{"-45.1234567", "170.7654321", "12.345", "Line one line two"}));
 
   const CString copy = root_ / L"copy.jpg";
   WriteFileBytes(copy, Bytes(kTinyJpeg));
@@ -361,7 +367,8 @@ TEST_F(GeotagTest, ProtectedOriginalsAreWrittenOnlyWithConsent) {
     EXPECT_EQ(GetFileMode(original), c.mode) << "the protection is put back";
     if (c.question) {
       ASSERT_EQ(view.confirmations.size(), 1u);
-      EXPECT_EQ(view.confirmations[0], FormatString(CString::FromUtf8(c.question), original.c_str()));
+      EXPECT_EQ(view.confirmations[0],
+                FormatString(CString::FromUtf8(c.question), original.c_str()));
     } else {
       EXPECT_TRUE(view.confirmations.empty());
     }
@@ -385,7 +392,8 @@ TEST_F(GeotagTest, FileCreationTimeAsFileTimeAndLocalSeconds) {
   long nanos = 0;
   ASSERT_TRUE(GetFileBirthTime(path, seconds, nanos));
   FILETIME created;
-  EXPECT_EQ(GetFileCreationTime(path, created), seconds) << "outside a daylight change, the same second";
+  EXPECT_EQ(GetFileCreationTime(path, created), seconds)
+      << "outside a daylight change, the same second";
   const unsigned long long ticks =
       static_cast<unsigned long long>(created.dwHighDateTime) << 32 | created.dwLowDateTime;
   EXPECT_EQ(ticks, static_cast<unsigned long long>(seconds + 11644473600LL) * 10000000ULL +

@@ -6,8 +6,12 @@ namespace {
 std::atomic<COverwriteView*> g_view{nullptr};
 }  // namespace
 
-void SetOverwriteView(COverwriteView* view) { g_view.store(view); }
-COverwriteView* GetOverwriteView() { return g_view.load(); }
+void SetOverwriteView(COverwriteView* view) {
+  g_view.store(view);
+}
+COverwriteView* GetOverwriteView() {
+  return g_view.load();
+}
 
 COverwriteDlg::COverwriteDlg(const wchar_t* photoName, COverwriteView* view)
     : m_strPhotoName(photoName), view_(view ? view : GetOverwriteView()) {}

@@ -6,7 +6,7 @@
 #include "navmisc/platform/cstring.h"
 
 // The answers of the question.
-constexpr int IDCANCEL = 2;      // no, for this photo and every following one
+constexpr int IDCANCEL = 2;  // no, for this photo and every following one
 constexpr int IDYES = 6;
 constexpr int IDNO = 7;
 constexpr int IDYESTOALL = 637;  // yes, for this photo and every following one

@@ -143,7 +143,8 @@ bool Coordinate(const Exiv2::ExifData& exif, const char* key, const char* refKey
 // blanks that pad fixed-size fields, cut to the comment limit.
 CString CleanText(std::string_view bytes) {
   while (!bytes.empty() && (bytes.back() == '\0' || bytes.back() == ' ')) bytes.remove_suffix(1);
-  if (const size_t nul = bytes.find('\0'); nul != std::string_view::npos) bytes = bytes.substr(0, nul);
+  if (const size_t nul = bytes.find('\0'); nul != std::string_view::npos)
+    bytes = bytes.substr(0, nul);
   std::wstring text = FromUtf8Lossy(bytes);
   if (text.size() > kMaxCommentChars) text.resize(kMaxCommentChars);
   return CString(std::move(text));
@@ -153,11 +154,13 @@ CString CleanText(std::string_view bytes) {
 CString Utf16Text(std::string_view bytes, bool bigEndian) {
   std::wstring out;
   for (size_t i = 0; i + 1 < bytes.size() && out.size() < kMaxCommentChars; i += 2) {
-    const auto b0 = static_cast<unsigned char>(bytes[i]), b1 = static_cast<unsigned char>(bytes[i + 1]);
+    const auto b0 = static_cast<unsigned char>(bytes[i]),
+               b1 = static_cast<unsigned char>(bytes[i + 1]);
     unsigned unit = bigEndian ? (b0 << 8 | b1) : (b1 << 8 | b0);
     if (unit == 0) break;
     if (unit >= 0xD800 && unit <= 0xDBFF && i + 3 < bytes.size()) {
-      const auto c0 = static_cast<unsigned char>(bytes[i + 2]), c1 = static_cast<unsigned char>(bytes[i + 3]);
+      const auto c0 = static_cast<unsigned char>(bytes[i + 2]),
+                 c1 = static_cast<unsigned char>(bytes[i + 3]);
       const unsigned low = bigEndian ? (c0 << 8 | c1) : (c1 << 8 | c0);
       if (low >= 0xDC00 && low <= 0xDFFF) {
         unit = 0x10000 + ((unit - 0xD800) << 10) + (low - 0xDC00);
@@ -237,7 +240,8 @@ bool ParseDateTime(std::string_view s, int& y, int& mo, int& d, int& h, int& mi,
     return false;
   }
   static constexpr int kDays[] = {31, 29, 31, 30, 31, 30, 31, 31, 30, 31, 30, 31};
-  if (y < 1 || mo < 1 || mo > 12 || d < 1 || d > kDays[mo - 1] || h > 23 || mi > 59 || se > 59) return false;
+  if (y < 1 || mo < 1 || mo > 12 || d < 1 || d > kDays[mo - 1] || h > 23 || mi > 59 || se > 59)
+    return false;
   const bool leap = (y % 4 == 0 && y % 100 != 0) || y % 400 == 0;
   return !(mo == 2 && d == 29 && !leap);
 }
@@ -255,8 +259,8 @@ bool CaptureTimeUtc(const Exiv2::ExifData& exif, struct tm& utc) {
   const Exiv2::Exifdatum* d = Find(exif, kDateTimeOriginal);
   if (!d) d = Find(exif, kDateTime);
   struct tm local {};
-  if (!d || !ParseDateTime(d->toString(), local.tm_year, local.tm_mon, local.tm_mday,
-                           local.tm_hour, local.tm_min, local.tm_sec)) {
+  if (!d || !ParseDateTime(d->toString(), local.tm_year, local.tm_mon, local.tm_mday, local.tm_hour,
+                           local.tm_min, local.tm_sec)) {
     return false;
   }
   local.tm_year -= 1900;
@@ -285,9 +289,10 @@ void SetAscii(Exiv2::ExifData& exif, const char* key, const std::string& text) {
   exif[key].setValue(text);
 }
 
-void SetBytes(Exiv2::ExifData& exif, const char* key, Exiv2::TypeId type, const std::string& bytes) {
-  Exiv2::DataValue v(reinterpret_cast<const Exiv2::byte*>(bytes.data()), static_cast<long>(bytes.size()),
-                     Exiv2::invalidByteOrder, type);
+void SetBytes(Exiv2::ExifData& exif, const char* key, Exiv2::TypeId type,
+              const std::string& bytes) {
+  Exiv2::DataValue v(reinterpret_cast<const Exiv2::byte*>(bytes.data()),
+                     static_cast<long>(bytes.size()), Exiv2::invalidByteOrder, type);
   exif[key].setValue(&v);
 }
 
@@ -397,7 +402,8 @@ bool ReadExif(std::string_view photo, ExifInfo& info, std::string& error) {
       }
     }
     info.comment = CleanText(image->comment());
-    if (const Exiv2::Exifdatum* d = Find(exif, kXpComment)) info.xpComment = Utf16Text(RawBytes(*d, Exiv2::littleEndian), false);
+    if (const Exiv2::Exifdatum* d = Find(exif, kXpComment))
+      info.xpComment = Utf16Text(RawBytes(*d, Exiv2::littleEndian), false);
     info.userComment = UserComment(exif, image->byteOrder());
     info.dateTimeOriginal = DateTimeText(exif, kDateTimeOriginal);
     info.dateTime = DateTimeText(exif, kDateTime);
@@ -417,7 +423,8 @@ bool WriteExifGeoTag(std::string& photo, const ExifGeoTag& tag, std::string& err
       SetBytes(exif, kGpsVersion, Exiv2::unsignedByte, std::string("\x02\x03\x00\x00", 4));
       SetCoordinate(exif, kLatitude, kLatitudeRef, tag.latitude, 'N', 'S');
       SetCoordinate(exif, kLongitude, kLongitudeRef, tag.longitude, 'E', 'W');
-      SetBytes(exif, kAltitudeRef, Exiv2::unsignedByte, std::string(1, tag.altitude < 0.0 ? '\1' : '\0'));
+      SetBytes(exif, kAltitudeRef, Exiv2::unsignedByte,
+               std::string(1, tag.altitude < 0.0 ? '\1' : '\0'));
       SetMillis(exif, kAltitude, tag.altitude);
       SetAscii(exif, kSpeedRef, "K");
       SetMillis(exif, kSpeed, tag.speed);
@@ -428,7 +435,8 @@ bool WriteExifGeoTag(std::string& photo, const ExifGeoTag& tag, std::string& err
                                                        {static_cast<uint32_t>(utc.tm_sec), 1}});
         exif[kTimeStamp].setValue(&stamp);
         SetAscii(exif, kDateStamp,
-                 FormatString(L"%04d:%02d:%02d", utc.tm_year + 1900, utc.tm_mon + 1, utc.tm_mday).ToUtf8());
+                 FormatString(L"%04d:%02d:%02d", utc.tm_year + 1900, utc.tm_mon + 1, utc.tm_mday)
+                     .ToUtf8());
       } else {
         // A stamp left from an earlier tag would contradict the new position.
         EraseKey(exif, kTimeStamp);
@@ -517,7 +525,8 @@ bool CExif2::GetExif(const wchar_t* path, navmisc::ExifInfo& info) {
 }
 
 bool CExif2::SetExif(const wchar_t* path, const navmisc::ExifGeoTag& tag) {
-  return Rewrite(path, [&](std::string& bytes) { return navmisc::WriteExifGeoTag(bytes, tag, error_); });
+  return Rewrite(path,
+                 [&](std::string& bytes) { return navmisc::WriteExifGeoTag(bytes, tag, error_); });
 }
 
 bool CExif2::CopyGps(const wchar_t* from, const wchar_t* to) {
@@ -526,7 +535,8 @@ bool CExif2::CopyGps(const wchar_t* from, const wchar_t* to) {
     error_ = source.error();
     return false;
   }
-  return Rewrite(to, [&](std::string& bytes) { return navmisc::CopyExifGps(source.bytes(), bytes, error_); });
+  return Rewrite(
+      to, [&](std::string& bytes) { return navmisc::CopyExifGps(source.bytes(), bytes, error_); });
 }
 
 bool CExif2::SetCaptureTime(const wchar_t* path, const CString& dateTime) {

@@ -20,18 +20,18 @@ constexpr size_t kMaxPhotoBytes = size_t{1} << 30;
 // What a photo's metadata says. Values that are missing, malformed or absurd (a latitude of 300,
 // a zero denominator, a date "0000:00:00 00:00:00") are reported as absent.
 struct ExifInfo {
-  int width = 0;   // pixels, 0 when unknown
+  int width = 0;  // pixels, 0 when unknown
   int height = 0;
   bool hasPosition = false;
   double latitude = 0.0;   // degrees, north positive
   double longitude = 0.0;  // degrees, east positive
   bool hasAltitude = false;
-  double altitude = 0.0;   // metres, negative below sea level
+  double altitude = 0.0;  // metres, negative below sea level
   bool hasSpeed = false;
-  double speed = 0.0;      // km/h, whatever unit the photo stores it in
-  CString comment;         // the file's own comment (a JPEG comment segment, a PNG description)
-  CString xpComment;       // Exif.Image.XPComment
-  CString userComment;     // Exif.Photo.UserComment
+  double speed = 0.0;   // km/h, whatever unit the photo stores it in
+  CString comment;      // the file's own comment (a JPEG comment segment, a PNG description)
+  CString xpComment;    // Exif.Image.XPComment
+  CString userComment;  // Exif.Photo.UserComment
   // Capture date-times as "YYYY:MM:DD hh:mm:ss", the camera's clock as it stands; empty unless
   // the photo holds a real date and time.
   CString dateTimeOriginal;  // Exif.Photo.DateTimeOriginal

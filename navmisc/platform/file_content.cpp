@@ -48,14 +48,17 @@ bool FileContent::Load(const wchar_t* path, size_t maxBytes) {
   return true;
 }
 
-bool FileContent::IsWritable() const { return IsFileWritable(path_); }
+bool FileContent::IsWritable() const {
+  return IsFileWritable(path_);
+}
 
 bool FileContent::Replace(std::string_view bytes) {
   error_.clear();
   const std::string native = NativePath(path_);
   struct stat now {};
   if (native.empty() || ::stat(native.c_str(), &now) != 0) {
-    return Fail(errno == ENOENT ? "the file was deleted" : "cannot find the file", errno == ENOENT ? 0 : errno);
+    return Fail(errno == ENOENT ? "the file was deleted" : "cannot find the file",
+                errno == ENOENT ? 0 : errno);
   }
   if (now.st_dev != stat_.st_dev || now.st_ino != stat_.st_ino) {
     return Fail("the file was replaced by another", 0);

@@ -1,13 +1,12 @@
 #include "navmisc/platform/file_content.h"
 
 #include <fcntl.h>
+#include <gtest/gtest.h>
 #include <sys/stat.h>
 #include <time.h>
 #include <unistd.h>
 
 #include <string>
-
-#include <gtest/gtest.h>
 
 #include "navmisc/platform/files.h"
 #include "testutil.h"

@@ -15,7 +15,8 @@ namespace {
 // any other name.
 long long FileSectionIndex(const CString& name) {
   static const CString prefix = CString(kFileSection).Left(CString(kFileSection).Find(L'%'));
-  if (name.GetLength() <= prefix.GetLength() || name.Left(prefix.GetLength()).CompareNoCase(prefix) != 0) {
+  if (name.GetLength() <= prefix.GetLength() ||
+      name.Left(prefix.GetLength()).CompareNoCase(prefix) != 0) {
     return -1;
   }
   const CString digits = name.Mid(prefix.GetLength());
@@ -133,8 +134,8 @@ bool RunCommandFile(const wchar_t* path, Outcome& outcome, std::FILE* errors) {
     ++outcome.failed;
     WR_STRING(out, section, kError, CString::FromUtf8(error));
     if (errors) {
-      std::fprintf(errors, "FixTag.exe: %s: %s\n", RD_STRING(in, section, kOldFile, L"").ToUtf8().c_str(),
-                   error.c_str());
+      std::fprintf(errors, "FixTag.exe: %s: %s\n",
+                   RD_STRING(in, section, kOldFile, L"").ToUtf8().c_str(), error.c_str());
     }
   }
   RD_END(in);

@@ -1,14 +1,13 @@
 // The tagging tool as its callers meet it: the real FixTag.exe on real photos of every format,
 // what it writes read back by exiftool and by the exiv2 command, and what it reads from photos
 // that exiftool wrote.
+#include <gtest/gtest.h>
 #include <sys/stat.h>
 
 #include <cmath>
 #include <cstdlib>
 #include <string>
 #include <vector>
-
-#include <gtest/gtest.h>
 
 #include "navmisc/geotag/fixtag_format.h"
 #include "navmisc/platform/files.h"
@@ -40,7 +39,9 @@ class FixTagTest : public ::testing::Test {
   TempDir dir_;
 };
 
-CString Section(int n) { return FormatString(fx::kFileSection, n); }
+CString Section(int n) {
+  return FormatString(fx::kFileSection, n);
+}
 
 struct WriteCase {
   const char* extension;
@@ -156,7 +157,8 @@ TEST_F(FixTagTest, ReadsWhatExiftoolWrote) {
 TEST_F(FixTagTest, GpsStampIsTheCaptureTimeInUtc) {
   navmisc::testutil::TzScope tz("JST-9");  // the tool inherits the zone
   const CString withOffset = Photo("offset.jpg", Bytes(kTinyJpeg));
-  ASSERT_TRUE(ExiftoolWrite(withOffset, "'-DateTimeOriginal=2012:05:17 08:30:00' -OffsetTimeOriginal=+02:00"));
+  ASSERT_TRUE(ExiftoolWrite(withOffset,
+                            "'-DateTimeOriginal=2012:05:17 08:30:00' -OffsetTimeOriginal=+02:00"));
   const CString local = Photo("local.jpg", Bytes(kTinyJpeg));
   ASSERT_TRUE(ExiftoolWrite(local, "'-DateTimeOriginal=2012:05:17 00:30:00'"));
   const CString stale = Photo("stale.jpg", Bytes(kTinyJpeg));
@@ -184,10 +186,12 @@ TEST_F(FixTagTest, GpsStampIsTheCaptureTimeInUtc) {
 
 TEST_F(FixTagTest, CopyRequestsReplaceTheTargetsGpsTags) {
   const CString from = Photo("from.jpg", Bytes(kTinyJpeg));
-  ASSERT_TRUE(ExiftoolWrite(from, "-GPSLatitude=12.25 -GPSLatitudeRef=N -GPSLongitude=3.5 "
-                                  "-GPSLongitudeRef=W -GPSImgDirection=270"));
+  ASSERT_TRUE(ExiftoolWrite(from,
+                            "-GPSLatitude=12.25 -GPSLatitudeRef=N -GPSLongitude=3.5 "
+                            "-GPSLongitudeRef=W -GPSImgDirection=270"));
   const CString to = Photo("to.png", Bytes(kTinyPng));
-  ASSERT_TRUE(ExiftoolWrite(to, "-GPSLatitude=1 -GPSLatitudeRef=S -GPSAltitude=99 -UserComment=kept"));
+  ASSERT_TRUE(
+      ExiftoolWrite(to, "-GPSLatitude=1 -GPSLatitudeRef=S -GPSAltitude=99 -UserComment=kept"));
   const CString untagged = Photo("untagged.jpg", Bytes(kTinyJpeg));
   const CString target2 = Photo("target2.jpg", Bytes(kTinyJpeg));
   const std::string target2Before = ReadFileBytes(target2);
@@ -201,9 +205,9 @@ TEST_F(FixTagTest, CopyRequestsReplaceTheTargetsGpsTags) {
   ASSERT_EQ(WR_END(w), 1);
   EXPECT_EQ(RunFixTag(CommandFile()), 1) << "the second copy has nothing to copy";
 
-  const auto v = Exiftool(to, {"GPS:GPSLatitude", "GPS:GPSLatitudeRef", "GPS:GPSLongitude",
-                               "GPS:GPSLongitudeRef", "GPS:GPSImgDirection", "GPS:GPSAltitude",
-                               "UserComment"});
+  const auto v = Exiftool(
+      to, {"GPS:GPSLatitude", "GPS:GPSLatitudeRef", "GPS:GPSLongitude", "GPS:GPSLongitudeRef",
+           "GPS:GPSImgDirection", "GPS:GPSAltitude", "UserComment"});
   EXPECT_EQ(v, (std::vector<std::string>{"12.25", "N", "3.5", "W", "270", "-", "kept"}));
   EXPECT_EQ(ReadFileBytes(target2), target2Before);
   const unsigned long r = RD_BEGIN(CommandFile());
@@ -256,11 +260,13 @@ TEST_F(FixTagTest, BadPhotosGiveClearErrorsAndStayUnchanged) {
 
   const unsigned long r = RD_BEGIN(CommandFile());
   for (size_t i = 0; i < std::size(cases); ++i) {
-    EXPECT_EQ(RD_STRING(r, Section(static_cast<int>(i)), fx::kError), cases[i].error) << cases[i].name;
+    EXPECT_EQ(RD_STRING(r, Section(static_cast<int>(i)), fx::kError), cases[i].error)
+        << cases[i].name;
     EXPECT_EQ(ReadFileBytes(paths[i]), cases[i].bytes) << cases[i].name;
   }
   for (size_t i = 0; i < std::size(more); ++i) {
-    EXPECT_EQ(RD_STRING(r, Section(static_cast<int>(std::size(cases) + i)), fx::kError), more[i].error);
+    EXPECT_EQ(RD_STRING(r, Section(static_cast<int>(std::size(cases) + i)), fx::kError),
+              more[i].error);
   }
   RD_END(r);
   EXPECT_EQ(ReadFileBytes(good), jpeg);
@@ -268,12 +274,12 @@ TEST_F(FixTagTest, BadPhotosGiveClearErrorsAndStayUnchanged) {
 
 TEST_F(FixTagTest, AbsurdMetadataIsNotReported) {
   const CString odd = Photo("odd.jpg", Bytes(kTinyJpeg));
-  ASSERT_TRUE(Exiv2Modify(odd, {"set Exif.GPSInfo.GPSLatitude 300/1 0/1 0/1",
-                                "set Exif.GPSInfo.GPSLongitude 10/1 0/1 0/1",
-                                "set Exif.GPSInfo.GPSAltitude 4000000000/1",
-                                "set Exif.GPSInfo.GPSSpeed 5/0",
-                                "set Exif.Photo.DateTimeOriginal 0000:00:00 00:00:00",
-                                "set Exif.Image.DateTime 2012:02:30 10:00:00"}));
+  ASSERT_TRUE(Exiv2Modify(
+      odd,
+      {"set Exif.GPSInfo.GPSLatitude 300/1 0/1 0/1", "set Exif.GPSInfo.GPSLongitude 10/1 0/1 0/1",
+       "set Exif.GPSInfo.GPSAltitude 4000000000/1", "set Exif.GPSInfo.GPSSpeed 5/0",
+       "set Exif.Photo.DateTimeOriginal 0000:00:00 00:00:00",
+       "set Exif.Image.DateTime 2012:02:30 10:00:00"}));
   const CString longComment = Photo("long.jpg", Bytes(kTinyJpeg));
   const std::wstring text(10000, L'\u00e9');
   {

@@ -1,10 +1,9 @@
 // navmisc photos add|list and navmisc geotag: photos into a trip, placed on its tracks and tagged.
+#include <CLI/CLI.hpp>
 #include <cstdio>
 #include <optional>
 #include <string>
 #include <vector>
-
-#include <CLI/CLI.hpp>
 
 #include "cli.h"
 #include "navmisc/records/trip.h"
@@ -22,7 +21,8 @@ constexpr const char* kAddHelp =
     "PHOTO=TIME works that out from one photo taken at a known TIME (UTC). Lists where each\n"
     "photo landed and which did not fit. Exit code 1 when a file was not a photo.";
 
-constexpr const char* kListHelp = "Lists the trip's photos: camera time, track time, position, track.";
+constexpr const char* kListHelp =
+    "Lists the trip's photos: camera time, track time, position, track.";
 
 constexpr const char* kGeotagHelp =
     "Writes the positions of the trip's placed photos into their copies in the trip (one run of\n"
@@ -42,7 +42,8 @@ struct AddOptions {
 void RunAdd(const AddOptions& o) {
   auto trip = OpenTrip(o.trip);
   trip->ReadAllWaypoint(0);
-  const std::vector<AddedPhoto> added = AddPhotos(*trip, o.files, {o.offset, o.offsetFrom}, o.tolerance);
+  const std::vector<AddedPhoto> added =
+      AddPhotos(*trip, o.files, {o.offset, o.offsetFrom}, o.tolerance);
   PrintAddedPhotos(stdout, added);
   for (const AddedPhoto& a : added) {
     if (!a.photo) Fail("some files were not added");
@@ -65,14 +66,16 @@ void RunGeotag(const GeotagOptions& o) {
   if (o.originals) std::printf(", %d original%s", r.originals, r.originals == 1 ? "" : "s");
   if (r.unplaced) std::printf("; %d without a position left alone", r.unplaced);
   std::printf("\n");
-  for (const std::string& name : r.failed) std::fprintf(stderr, "navmisc geotag: %s was not tagged\n", name.c_str());
+  for (const std::string& name : r.failed)
+    std::fprintf(stderr, "navmisc geotag: %s was not tagged\n", name.c_str());
   if (!r.failed.empty()) Fail("some photos were not tagged");
 }
 
 }  // namespace
 
 void AddPhotosCommand(CLI::App& app) {
-  CLI::App* photos = app.add_subcommand("photos", "add photos to a trip, placed on its tracks; list them");
+  CLI::App* photos =
+      app.add_subcommand("photos", "add photos to a trip, placed on its tracks; list them");
   photos->require_subcommand(1);
   photos->fallthrough();
 
@@ -81,11 +84,12 @@ void AddPhotosCommand(CLI::App& app) {
                              kAddHelp, [add] { RunAdd(*add); });
   cmd->add_option("TRIP", add->trip, "the trip")->required();
   cmd->add_option("FILES", add->files, "the photos")->required();
-  CLI::Option* offset = cmd->add_option("--offset", add->offset, "seconds added to every photo's time")
-                            ->option_text("SECONDS");
-  CLI::Option* from = cmd->add_option("--offset-from", add->offsetFrom,
-                                      "the offset that puts PHOTO at TIME (UTC)")
-                          ->option_text("PHOTO=TIME");
+  CLI::Option* offset =
+      cmd->add_option("--offset", add->offset, "seconds added to every photo's time")
+          ->option_text("SECONDS");
+  CLI::Option* from =
+      cmd->add_option("--offset-from", add->offsetFrom, "the offset that puts PHOTO at TIME (UTC)")
+          ->option_text("PHOTO=TIME");
   offset->excludes(from);
   cmd->add_option("--tolerance", add->tolerance,
                   "how near a track a photo's own position must be, metres (default 50)")
@@ -101,11 +105,13 @@ void AddPhotosCommand(CLI::App& app) {
 
 void AddGeotagCommand(CLI::App& app) {
   auto o = std::make_shared<GeotagOptions>();
-  CLI::App* cmd = AddCommand(app, "geotag", "write the positions of a trip's photos into the photo files",
-                             kGeotagHelp, [o] { RunGeotag(*o); });
+  CLI::App* cmd =
+      AddCommand(app, "geotag", "write the positions of a trip's photos into the photo files",
+                 kGeotagHelp, [o] { RunGeotag(*o); });
   cmd->add_option("TRIP", o->trip, "the trip")->required();
   cmd->add_flag("--originals", o->originals, "also tag the files the photos were imported from");
-  CLI::Option* yes = cmd->add_flag("--yes-to-all", o->yesToAll, "tag every original without asking");
+  CLI::Option* yes =
+      cmd->add_flag("--yes-to-all", o->yesToAll, "tag every original without asking");
   CLI::Option* no = cmd->add_flag("--no-to-all", o->noToAll, "tag no original");
   yes->excludes(no);
 }

@@ -35,9 +35,11 @@ void DemoPhotos(const std::string& tripId) {
     }
     // The camera's clock shows the trip's local time.
     int y, mo, d, h, mi, s;
-    GetDateTimeInfo(first + (last - first) * (1 + 4 * k) / 10 + trip->timeZoneShift, y, mo, d, h, mi, s);
+    GetDateTimeInfo(first + (last - first) * (1 + 4 * k) / 10 + trip->timeZoneShift, y, mo, d, h,
+                    mi, s);
     CExif2 exif;
-    if (!exif.SetCaptureTime(path, FormatString(L"%04d:%02d:%02d %02d:%02d:%02d", y, mo, d, h, mi, s))) {
+    if (!exif.SetCaptureTime(path,
+                             FormatString(L"%04d:%02d:%02d %02d:%02d:%02d", y, mo, d, h, mi, s))) {
       Fail("cannot set the capture time of " + path.ToUtf8() + ": " + exif.GetError());
     }
     files.push_back(path.ToUtf8());
@@ -45,8 +47,9 @@ void DemoPhotos(const std::string& tripId) {
   std::printf("\nPhotos added to \"%s\" (navmisc photos add):\n", trip->name.ToUtf8().c_str());
   PrintAddedPhotos(stdout, AddPhotos(*trip, files, CameraClock(), 50.0));
   const GeotagOutcome tagged = GeotagTrip(*trip, false, IDCANCEL, nullptr);
-  std::printf("Tagged %d of %d photos in the trip (navmisc geotag); the KMZ export below carries them.\n",
-              tagged.tagged, tagged.placed);
+  std::printf(
+      "Tagged %d of %d photos in the trip (navmisc geotag); the KMZ export below carries them.\n",
+      tagged.tagged, tagged.placed);
 }
 
 }  // namespace navmisc::cli

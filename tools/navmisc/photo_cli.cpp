@@ -29,8 +29,9 @@ CString FreeName(const CString& folder, const CString& original) {
   const CString title = PathFileTitle(name), extension = PathExtension(name);
   CString candidate = name;
   for (int n = 2; FileExists(PathJoin(folder, candidate)); ++n) {
-    candidate = extension.IsEmpty() ? FormatString(L"%s-%d", title.c_str(), n)
-                                    : FormatString(L"%s-%d.%s", title.c_str(), n, extension.c_str());
+    candidate = extension.IsEmpty()
+                    ? FormatString(L"%s-%d", title.c_str(), n)
+                    : FormatString(L"%s-%d.%s", title.c_str(), n, extension.c_str());
   }
   return candidate;
 }
@@ -94,7 +95,9 @@ class RecordingView : public COverwriteView {
   COverwriteView* inner_;
 };
 
-bool Placed(const PHOTO_ITEM_INFO& photo) { return photo.latitude != 0.0 || photo.longitude != 0.0; }
+bool Placed(const PHOTO_ITEM_INFO& photo) {
+  return photo.latitude != 0.0 || photo.longitude != 0.0;
+}
 
 // One answer line from stdin, trimmed and in lower case; nullopt at the end of the input.
 std::optional<std::string> ReadAnswer() {
@@ -102,7 +105,8 @@ std::optional<std::string> ReadAnswer() {
   if (!std::getline(std::cin, line)) return std::nullopt;
   std::string out;
   for (char c : line) {
-    if (c != ' ' && c != '\t' && c != '\r') out.push_back(static_cast<char>(std::tolower(static_cast<unsigned char>(c))));
+    if (c != ' ' && c != '\t' && c != '\r')
+      out.push_back(static_cast<char>(std::tolower(static_cast<unsigned char>(c))));
   }
   return out;
 }
@@ -168,8 +172,9 @@ std::vector<AddedPhoto> AddPhotos(BLOG_ITEM_INFO& trip, const std::vector<std::s
       const long wanted = photo->playbackTime;
       added[i].trackTime = wanted;
       if (MappingGPSAndTrack(trip.tracks, tolerance, photo)) {
-        added[i].place = photo->playbackTime == wanted && wanted > 0 ? AddedPhoto::Place::kByTime
-                                                                     : AddedPhoto::Place::kByPosition;
+        added[i].place = photo->playbackTime == wanted && wanted > 0
+                             ? AddedPhoto::Place::kByTime
+                             : AddedPhoto::Place::kByPosition;
       } else if (info.latitude != 0.0 || info.longitude != 0.0) {
         // Not on a track, but the camera knew where it was: that position stays.
         photo->latitude = info.latitude;
@@ -215,7 +220,8 @@ void PrintAddedPhotos(std::FILE* out, const std::vector<AddedPhoto>& added) {
                      p.trackItemId.ToUtf8().c_str(), p.latitude, p.longitude);
         break;
       case AddedPhoto::Place::kOwnPosition:
-        std::fprintf(out, "not on a track; keeps its own position %.6f, %.6f\n", p.latitude, p.longitude);
+        std::fprintf(out, "not on a track; keeps its own position %.6f, %.6f\n", p.latitude,
+                     p.longitude);
         break;
       case AddedPhoto::Place::kNone:
         std::fprintf(out, "not placed: %s\n",
@@ -227,13 +233,15 @@ void PrintAddedPhotos(std::FILE* out, const std::vector<AddedPhoto>& added) {
 
 void PrintPhotoList(std::FILE* out, BLOG_ITEM_INFO& trip) {
   // The camera's clock is local time of no stated zone: it is shown without the "Z" of UTC.
-  auto camera = [](long t) { return t == -1 ? std::string("-") : TimeTToStdStringTime(t).ToUtf8(); };
+  auto camera = [](long t) {
+    return t == -1 ? std::string("-") : TimeTToStdStringTime(t).ToUtf8();
+  };
   std::fprintf(out, "%-24s %-21s %-21s %-12s %-12s %s\n", "photo", "camera time", "track time",
                "latitude", "longitude", "track");
   for (const auto* p : Items<PHOTO_ITEM_INFO>(trip.photos)) {
     if (!p) continue;
-    std::fprintf(out, "%-24s %-21s %-21s ", p->itemName.ToUtf8().c_str(), camera(p->originalTime).c_str(),
-                 TimeText(p->playbackTime).c_str());
+    std::fprintf(out, "%-24s %-21s %-21s ", p->itemName.ToUtf8().c_str(),
+                 camera(p->originalTime).c_str(), TimeText(p->playbackTime).c_str());
     if (Placed(*p)) {
       std::fprintf(out, "%-12.6f %-12.6f %s\n", p->latitude, p->longitude,
                    p->trackItemId.IsEmpty() ? "-" : p->trackItemId.ToUtf8().c_str());
@@ -293,14 +301,16 @@ GeotagOutcome GeotagTrip(BLOG_ITEM_INFO& trip, bool originals, std::optional<int
     const bool agreed = all || (said != recorder.answers.end() &&
                                 (said->second == IDYES || said->second == IDYESTOALL));
     if (said != recorder.answers.end() && said->second == IDYESTOALL) all = true;
-    if (agreed && !p->originalName.IsEmpty() && SamePosition(*p, p->originalName)) ++outcome.originals;
+    if (agreed && !p->originalName.IsEmpty() && SamePosition(*p, p->originalName))
+      ++outcome.originals;
   }
   return outcome;
 }
 
 int TerminalOverwriteView::AskOverwrite(const wchar_t* photoName, bool&) {
   for (;;) {
-    std::fprintf(stderr, "Write the position into the original %s too? [y]es, [n]o, [a]ll, [q] none: ",
+    std::fprintf(stderr,
+                 "Write the position into the original %s too? [y]es, [n]o, [a]ll, [q] none: ",
                  CString(photoName).ToUtf8().c_str());
     std::fflush(stderr);
     const std::optional<std::string> line = ReadAnswer();

@@ -23,10 +23,10 @@ struct CameraClock {
 
 // Where an added photo ended up.
 struct AddedPhoto {
-  std::string file;                 // as given
+  std::string file;                  // as given
   PHOTO_ITEM_INFO* photo = nullptr;  // in the trip (which owns it); null when not added
-  std::string problem;              // why it was not added
-  long trackTime = -1;              // its time on the track clock (UTC), -1 without a capture time
+  std::string problem;               // why it was not added
+  long trackTime = -1;               // its time on the track clock (UTC), -1 without a capture time
   enum class Place { kNone, kByTime, kByPosition, kOwnPosition } place = Place::kNone;
 };
 
@@ -42,10 +42,10 @@ void PrintAddedPhotos(std::FILE* out, const std::vector<AddedPhoto>& added);
 void PrintPhotoList(std::FILE* out, BLOG_ITEM_INFO& trip);
 
 struct GeotagOutcome {
-  int placed = 0;      // photos with a position, offered to the tool
-  int tagged = 0;      // trip copies that now hold their position
-  int originals = 0;   // originals that now hold it
-  int unplaced = 0;    // photos without a position, left alone
+  int placed = 0;                   // photos with a position, offered to the tool
+  int tagged = 0;                   // trip copies that now hold their position
+  int originals = 0;                // originals that now hold it
+  int unplaced = 0;                 // photos without a position, left alone
   std::vector<std::string> failed;  // trip copies the tool could not tag
 };
 

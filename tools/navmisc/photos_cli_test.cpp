@@ -62,8 +62,8 @@ class PhotoCommands : public ::testing::Test {
   }
 
   CommandResult Run(const std::string& args, const std::string& input = "") {
-    return RunCommand("printf '" + input + "' | " + std::string(NAVMISC_TOOL_PATH) + " --data-root " +
-                      ShellQuote(root_.path().ToUtf8()) + " " + args + " 2>&1");
+    return RunCommand("printf '" + input + "' | " + std::string(NAVMISC_TOOL_PATH) +
+                      " --data-root " + ShellQuote(root_.path().ToUtf8()) + " " + args + " 2>&1");
   }
 
   std::unique_ptr<BLOG_ITEM_INFO> Load() {
@@ -78,7 +78,8 @@ class PhotoCommands : public ::testing::Test {
     auto trip = Load();
     double lat = 0, lon = 0, alt = 0;
     long speed = 0;
-    EXPECT_TRUE(static_cast<TRACK_ITEM_INFO*>(trip->tracks.GetHead())->MappingTimeToPoint(time, lat, lon, speed, alt));
+    EXPECT_TRUE(static_cast<TRACK_ITEM_INFO*>(trip->tracks.GetHead())
+                    ->MappingTimeToPoint(time, lat, lon, speed, alt));
     return {lat, lon};
   }
 
@@ -98,10 +99,12 @@ class PhotoCommands : public ::testing::Test {
 TEST_F(PhotoCommands, AddPlacesByTimeAndPositionListsMissesAndGeotagWritesTheCopies) {
   const auto [onLat, onLon] = TrackAt(kStart + 2400);
   const std::string a = Shot("a.jpg", "'-DateTimeOriginal=2024:05:02 10:10:05'");  // 08:10:05 UTC
-  const std::string b = Shot("b.jpg", "'-DateTimeOriginal=2024:05:02 12:30:00'");  // after the track
+  const std::string b =
+      Shot("b.jpg", "'-DateTimeOriginal=2024:05:02 12:30:00'");  // after the track
   char gps[160];
-  std::snprintf(gps, sizeof gps, "-GPSLatitude=%.7f -GPSLatitudeRef=N -GPSLongitude=%.7f -GPSLongitudeRef=E",
-                onLat, onLon);
+  std::snprintf(gps, sizeof gps,
+                "-GPSLatitude=%.7f -GPSLatitudeRef=N -GPSLongitude=%.7f -GPSLongitudeRef=E", onLat,
+                onLon);
   const std::string c = Shot("c.jpg", gps);  // no capture time, but a position on the track
   const std::string d = (camera_ / L"notes.txt").ToUtf8();
   WriteFileBytes(CString::FromUtf8(d), "not a photo");
@@ -109,16 +112,20 @@ TEST_F(PhotoCommands, AddPlacesByTimeAndPositionListsMissesAndGeotagWritesTheCop
   const CommandResult add = Run("photos add PHOTOTRIP " + a + " " + b + " " + c + " " + d);
   EXPECT_EQ(add.status, 1) << add.out;
   const auto [aLat, aLon] = TrackAt(kStart + 605);
-  EXPECT_NE(add.out.find(AddLine("a.jpg", "2024-05-02T08:10:05Z", "placed by time on")), std::string::npos)
+  EXPECT_NE(add.out.find(AddLine("a.jpg", "2024-05-02T08:10:05Z", "placed by time on")),
+            std::string::npos)
       << add.out;
   char at[64];
   std::snprintf(at, sizeof at, "at %.6f, %.6f\n", aLat, aLon);
   EXPECT_NE(add.out.find(at), std::string::npos) << add.out;
-  EXPECT_NE(add.out.find(AddLine("b.jpg", "2024-05-02T10:30:00Z", "not placed: outside the tracks' times")),
-            std::string::npos) << add.out;
+  EXPECT_NE(add.out.find(
+                AddLine("b.jpg", "2024-05-02T10:30:00Z", "not placed: outside the tracks' times")),
+            std::string::npos)
+      << add.out;
   EXPECT_NE(add.out.find("c.jpg"), std::string::npos);
   EXPECT_NE(add.out.find("placed by position"), std::string::npos) << add.out;
-  EXPECT_NE(add.out.find(d + " not added: not a photo of a known format"), std::string::npos) << add.out;
+  EXPECT_NE(add.out.find(d + " not added: not a photo of a known format"), std::string::npos)
+      << add.out;
 
   auto trip = Load();
   ASSERT_EQ(trip->photos.GetCount(), 3);
@@ -138,31 +145,38 @@ TEST_F(PhotoCommands, AddPlacesByTimeAndPositionListsMissesAndGeotagWritesTheCop
   const CommandResult tag = Run("geotag PHOTOTRIP");
   ASSERT_EQ(tag.status, 0) << tag.out;
   EXPECT_NE(tag.out.find("tagged 2 of 2 placed photos"), std::string::npos) << tag.out;
-  const auto read = Exiftool(pa->GetFilePathName(), {"Composite:GPSLatitude", "Composite:GPSLongitude"});
+  const auto read =
+      Exiftool(pa->GetFilePathName(), {"Composite:GPSLatitude", "Composite:GPSLongitude"});
   EXPECT_NEAR(std::atof(read[0].c_str()), aLat, 1e-7);
   EXPECT_NEAR(std::atof(read[1].c_str()), aLon, 1e-7);
-  EXPECT_EQ(Exiftool(CString::FromUtf8(a), {"Composite:GPSLatitude"})[0], "-") << "originals untouched";
+  EXPECT_EQ(Exiftool(CString::FromUtf8(a), {"Composite:GPSLatitude"})[0], "-")
+      << "originals untouched";
   EXPECT_EQ(Exiftool(Photo(*trip, L"b.jpg")->GetFilePathName(), {"Composite:GPSLatitude"})[0], "-");
 
   // Originals on request, asked one by one in the trip's order: a (yes), then c (no).
   const std::string cBefore = ReadFileBytes(CString::FromUtf8(c));
   const CommandResult originals = Run("geotag PHOTOTRIP --originals", "y\\nn\\n");
   ASSERT_EQ(originals.status, 0) << originals.out;
-  EXPECT_NE(originals.out.find("Write the position into the original " + a + " too?"), std::string::npos);
+  EXPECT_NE(originals.out.find("Write the position into the original " + a + " too?"),
+            std::string::npos);
   EXPECT_NE(originals.out.find("1 original"), std::string::npos) << originals.out;
-  EXPECT_NEAR(std::atof(Exiftool(CString::FromUtf8(a), {"Composite:GPSLatitude"})[0].c_str()), aLat, 1e-7);
+  EXPECT_NEAR(std::atof(Exiftool(CString::FromUtf8(a), {"Composite:GPSLatitude"})[0].c_str()), aLat,
+              1e-7);
   EXPECT_EQ(ReadFileBytes(CString::FromUtf8(c)), cBefore);
 }
 
 TEST_F(PhotoCommands, ClockCorrectionsAndUsageErrors) {
   const std::string b = Shot("b.jpg", "'-DateTimeOriginal=2024:05:02 12:30:00'");
-  const CommandResult fixed = Run("photos add PHOTOTRIP " + b + " --offset-from b.jpg=2024-05-02T08:30:00");
+  const CommandResult fixed =
+      Run("photos add PHOTOTRIP " + b + " --offset-from b.jpg=2024-05-02T08:30:00");
   ASSERT_EQ(fixed.status, 0) << fixed.out;
-  EXPECT_NE(fixed.out.find(AddLine("b.jpg", "2024-05-02T08:30:00Z", "placed by time")), std::string::npos)
+  EXPECT_NE(fixed.out.find(AddLine("b.jpg", "2024-05-02T08:30:00Z", "placed by time")),
+            std::string::npos)
       << fixed.out;
   const CommandResult shifted = Run("photos add PHOTOTRIP " + b + " --offset -10800");
   ASSERT_EQ(shifted.status, 0) << shifted.out;
-  EXPECT_NE(shifted.out.find(AddLine("b-2.jpg", "2024-05-02T07:30:00Z", "not placed")), std::string::npos)
+  EXPECT_NE(shifted.out.find(AddLine("b-2.jpg", "2024-05-02T07:30:00Z", "not placed")),
+            std::string::npos)
       << shifted.out;
 
   const struct {
@@ -172,8 +186,10 @@ TEST_F(PhotoCommands, ClockCorrectionsAndUsageErrors) {
   } errors[] = {
       {"photos add PHOTOTRIP", 2, "FILES"},
       {"photos add NOSUCHTRIP " + b, 1, "NOSUCHTRIP"},
-      {"photos add PHOTOTRIP " + b + " --offset-from other.jpg=2024-05-02T08:30:00", 2, "other.jpg"},
-      {"photos add PHOTOTRIP " + b + " --offset 5 --offset-from b.jpg=2024-05-02T08:30:00", 2, "offset"},
+      {"photos add PHOTOTRIP " + b + " --offset-from other.jpg=2024-05-02T08:30:00", 2,
+       "other.jpg"},
+      {"photos add PHOTOTRIP " + b + " --offset 5 --offset-from b.jpg=2024-05-02T08:30:00", 2,
+       "offset"},
       {"geotag PHOTOTRIP --yes-to-all --no-to-all", 2, "yes-to-all"},
       {"photos", 2, ""},
   };
