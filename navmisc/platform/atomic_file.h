@@ -35,6 +35,15 @@ class AtomicFile {
   void SetTimes(const struct timespec& accessed, const struct timespec& modified);
   // Flushes, syncs and renames over the target. False (target untouched) on any failure.
   bool Commit();
+  // The same in two steps, for many files made durable together (one sync of the file system
+  // instead of one per file): Seal writes out and closes the temporary file, waiting for the
+  // disk only when `durable`; Publish renames it over the target and, with `syncFolder`, makes
+  // the rename durable. Between the two, the caller makes the data durable (SyncFileSystem) and
+  // may still Abandon. Both false (target untouched, temporary file removed) on failure.
+  bool Seal(bool durable);
+  bool Publish(bool syncFolder);
+  // The temporary file while the object holds one (for syncing its file system).
+  const std::string& TempPath() const;
   // Removes the temporary file; the target stays as it was.
   void Abandon();
 
@@ -51,6 +60,9 @@ class AtomicFile {
   std::string temp_;
   std::string buffer_;
 };
+
+// Makes the entries of a folder durable (fsync of the folder), after files were renamed into it.
+void SyncFolder(const std::string& folder);
 
 namespace testing {
 // Fault injection for tests: after `bytes` more bytes have been written through AtomicFile in

@@ -495,7 +495,7 @@ bool WriteExifCaptureTime(std::string& photo, const CString& dateTime, std::stri
 #pragma GCC diagnostic pop
 
 template <class Change>
-bool CExif2::Rewrite(const wchar_t* path, Change change) {
+bool CExif2::Stage(const wchar_t* path, navmisc::FileReplaceBatch& batch, Change change) {
   navmisc::FileContent file;
   if (!file.Load(path, navmisc::kMaxPhotoBytes)) {
     error_ = file.error();
@@ -506,12 +506,15 @@ bool CExif2::Rewrite(const wchar_t* path, Change change) {
     return false;
   }
   std::string bytes = file.bytes();
-  if (!change(bytes)) return false;
-  if (!file.Replace(bytes)) {
-    error_ = file.error();
-    return false;
-  }
-  return true;
+  return change(bytes) && batch.Stage(file, bytes, error_);
+}
+
+template <class Change>
+bool CExif2::Rewrite(const wchar_t* path, Change change) {
+  navmisc::FileReplaceBatch batch;
+  if (!Stage(path, batch, change)) return false;
+  error_ = batch.Commit().front();
+  return error_.empty();
 }
 
 bool CExif2::GetExif(const wchar_t* path, navmisc::ExifInfo& info) {
@@ -529,6 +532,11 @@ bool CExif2::SetExif(const wchar_t* path, const navmisc::ExifGeoTag& tag) {
                  [&](std::string& bytes) { return navmisc::WriteExifGeoTag(bytes, tag, error_); });
 }
 
+bool CExif2::StageExif(const wchar_t* path, const navmisc::ExifGeoTag& tag) {
+  return Stage(path, staged_,
+               [&](std::string& bytes) { return navmisc::WriteExifGeoTag(bytes, tag, error_); });
+}
+
 bool CExif2::CopyGps(const wchar_t* from, const wchar_t* to) {
   navmisc::FileContent source;
   if (!source.Load(from, navmisc::kMaxPhotoBytes)) {
@@ -537,6 +545,21 @@ bool CExif2::CopyGps(const wchar_t* from, const wchar_t* to) {
   }
   return Rewrite(
       to, [&](std::string& bytes) { return navmisc::CopyExifGps(source.bytes(), bytes, error_); });
+}
+
+bool CExif2::StageCopyGps(const wchar_t* from, const wchar_t* to) {
+  navmisc::FileContent source;
+  if (!source.Load(from, navmisc::kMaxPhotoBytes)) {
+    error_ = source.error();
+    return false;
+  }
+  return Stage(to, staged_, [&](std::string& bytes) {
+    return navmisc::CopyExifGps(source.bytes(), bytes, error_);
+  });
+}
+
+std::vector<std::string> CExif2::CommitStaged() {
+  return staged_.Commit();
 }
 
 bool CExif2::SetCaptureTime(const wchar_t* path, const CString& dateTime) {

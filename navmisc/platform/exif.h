@@ -9,8 +9,10 @@
 
 #include <string>
 #include <string_view>
+#include <vector>
 
 #include "navmisc/platform/cstring.h"
+#include "navmisc/platform/file_content.h"
 
 namespace navmisc {
 
@@ -71,13 +73,27 @@ bool WriteExifCaptureTime(std::string& photo, const CString& dateTime, std::stri
 class CExif2 {
  public:
   bool GetExif(const wchar_t* path, navmisc::ExifInfo& info);
+  // Changes one photo; the new content is on disk when the call returns.
   bool SetExif(const wchar_t* path, const navmisc::ExifGeoTag& tag);
   bool CopyGps(const wchar_t* from, const wchar_t* to);
   bool SetCaptureTime(const wchar_t* path, const CString& dateTime);
+  // The same for many photos: each change is prepared beside its photo (false, with GetError(),
+  // when that fails), and CommitStaged puts them all in place together, waiting for the disk
+  // once instead of once per photo (see FileReplaceBatch). It returns one text per staged photo
+  // in order, empty when the photo was written.
+  bool StageExif(const wchar_t* path, const navmisc::ExifGeoTag& tag);
+  bool StageCopyGps(const wchar_t* from, const wchar_t* to);
+  std::vector<std::string> CommitStaged();
+
   const std::string& GetError() const { return error_; }
 
  private:
   template <class Change>
+  bool Stage(const wchar_t* path, navmisc::FileReplaceBatch& batch, Change change);
+  // Stages into a batch of its own and commits it.
+  template <class Change>
   bool Rewrite(const wchar_t* path, Change change);
+
+  navmisc::FileReplaceBatch staged_;
   std::string error_;
 };

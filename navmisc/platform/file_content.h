@@ -9,6 +9,7 @@
 #include <cstddef>
 #include <string>
 #include <string_view>
+#include <vector>
 
 #include "navmisc/platform/cstring.h"
 
@@ -34,12 +35,39 @@ class FileContent {
   const std::string& error() const { return error_; }
 
  private:
+  friend class FileReplaceBatch;
   bool Fail(const std::string& what, int err);
+  // Why the file may not be replaced now (see Replace); empty when it may.
+  std::string CheckReplaceable() const;
 
   CString path_;
   std::string bytes_;
   struct stat stat_ {};
   std::string error_;
+};
+
+// The replacement of many loaded files, made durable together: each new content goes to a
+// temporary file beside its file at once; Commit waits for the disk once per file system instead
+// of once per file, then puts the files in place one by one, each checked again as Replace checks
+// it. Files not yet committed stay as they were; staged temporary files of a batch that is never
+// committed are removed.
+class FileReplaceBatch {
+ public:
+  FileReplaceBatch();
+  ~FileReplaceBatch();
+  FileReplaceBatch(const FileReplaceBatch&) = delete;
+  FileReplaceBatch& operator=(const FileReplaceBatch&) = delete;
+
+  // Stages `bytes` as the new content of `file`; false, with `error` set, when `file` may not be
+  // replaced or the temporary file cannot be written. `file` may go away afterwards.
+  bool Stage(const FileContent& file, std::string_view bytes, std::string& error);
+  // Puts every staged file in place. One text per staged file, in the order they were staged:
+  // empty when the file was replaced, else why not.
+  std::vector<std::string> Commit();
+
+ private:
+  struct Staged;
+  std::vector<Staged> staged_;
 };
 
 }  // namespace navmisc

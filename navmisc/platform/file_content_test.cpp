@@ -7,6 +7,7 @@
 #include <unistd.h>
 
 #include <string>
+#include <vector>
 
 #include "navmisc/platform/files.h"
 #include "testutil.h"
@@ -107,6 +108,45 @@ TEST(FileContent, ReplaceLeavesProtectedDeletedAndSwappedFilesAlone) {
     }
     ::chmod(NativePath(path).c_str(), 0644);
   }
+}
+
+TEST(FileReplaceBatch, PutsManyFilesInPlaceTogetherAndSkipsThoseChangedMeanwhile) {
+  TempDir dir;
+  constexpr int kFiles = 8;  // more than are synced one by one
+  navmisc::FileReplaceBatch batch;
+  for (int i = 0; i < kFiles; ++i) {
+    const CString path = dir / FormatString(L"p%d.jpg", i);
+    WriteFileBytes(path, "old " + std::to_string(i));
+    const struct timespec times[2] = {{1300000000, 0}, {1200000000 + i, 0}};
+    ASSERT_EQ(::utimensat(AT_FDCWD, NativePath(path).c_str(), times, 0), 0);
+    FileContent f;
+    ASSERT_TRUE(f.Load(path, 100));
+    std::string error;
+    ASSERT_TRUE(batch.Stage(f, "new " + std::to_string(i), error)) << error;
+    EXPECT_EQ(ReadFileBytes(path), "old " + std::to_string(i)) << "nothing visible before the commit";
+  }
+  ::unlink(NativePath(dir / L"p2.jpg").c_str());
+  WriteFileBytes(dir / L"other", "swapped in");
+  ::rename(NativePath(dir / L"other").c_str(), NativePath(dir / L"p5.jpg").c_str());
+
+  const std::vector<std::string> errors = batch.Commit();
+  ASSERT_EQ(errors.size(), static_cast<size_t>(kFiles));
+  for (int i = 0; i < kFiles; ++i) {
+    const CString path = dir / FormatString(L"p%d.jpg", i);
+    if (i == 2) {
+      EXPECT_EQ(errors[i], "the file was deleted");
+      EXPECT_FALSE(FileExists(path));
+    } else if (i == 5) {
+      EXPECT_EQ(errors[i], "the file was replaced by another");
+      EXPECT_EQ(ReadFileBytes(path), "swapped in");
+    } else {
+      EXPECT_EQ(errors[i], "") << i;
+      EXPECT_EQ(Stat(path).st_mtim.tv_sec, 1200000000 + i);
+      EXPECT_EQ(ReadFileBytes(path), "new " + std::to_string(i));
+    }
+  }
+  CStringList left;
+  EXPECT_EQ(GetContent(dir.path(), L".*", left), 0) << "no temporary file stays behind";
 }
 
 TEST(GetFileBirthTime, RecentForANewFileAndFalseWhenMissing) {

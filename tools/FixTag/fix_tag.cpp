@@ -31,38 +31,40 @@ long long FileSectionIndex(const CString& name) {
 
 class Request {
  public:
-  Request(unsigned long in, unsigned long out, const CString& section)
-      : in_(in), out_(out), section_(section) {}
+  // `exif` collects the photos that write and copy requests change, to be put in place together.
+  Request(unsigned long in, unsigned long out, const CString& section, CExif2& exif)
+      : in_(in), out_(out), section_(section), exif_(exif) {}
 
-  // Carries the request out; false with `error` set when it fails.
-  bool Run(std::string& error) {
+  // Carries a read request out, or stages a write or copy request (true: `staged` set). False
+  // with `error` set when it fails.
+  bool Run(bool& staged, std::string& error) {
+    staged = false;
     const CString photo = RD_STRING(in_, section_, kOldFile, L"");
     WR_STRING(out_, section_, kOldFile, photo);
     if (photo.IsEmpty()) {
       error = "no \"Old File\" given";
       return false;
     }
-    CExif2 exif;
     bool ok = false;
     if (RD_EXISTS(in_, section_, kNewFile)) {
       const CString target = RD_STRING(in_, section_, kNewFile, L"");
       WR_STRING(out_, section_, kNewFile, target);
-      ok = exif.CopyGps(photo, target);
+      ok = staged = exif_.StageCopyGps(photo, target);
     } else if (RD_STRING(in_, section_, kReadOnly, L"").CompareNoCase(kTrue) == 0) {
       WR_STRING(out_, section_, kReadOnly, kTrue);
-      ok = Read(exif, photo);
+      ok = Read(photo);
     } else {
-      ok = Write(exif, photo, error);
+      ok = staged = Write(photo, error);
       if (!error.empty()) return false;
     }
-    if (!ok) error = exif.GetError();
+    if (!ok) error = exif_.GetError();
     return ok;
   }
 
  private:
-  bool Read(CExif2& exif, const CString& photo) {
+  bool Read(const CString& photo) {
     ExifInfo info;
-    if (!exif.GetExif(photo, info)) return false;
+    if (!exif_.GetExif(photo, info)) return false;
     if (info.hasPosition) {
       WR_FLOAT(out_, section_, kLatitude, info.latitude);
       WR_FLOAT(out_, section_, kLongitude, info.longitude);
@@ -83,7 +85,7 @@ class Request {
     return true;
   }
 
-  bool Write(CExif2& exif, const CString& photo, std::string& error) {
+  bool Write(const CString& photo, std::string& error) {
     if (!RD_EXISTS(in_, section_, kLatitude) || !RD_EXISTS(in_, section_, kLongitude)) {
       error = "no position given";
       return false;
@@ -99,11 +101,12 @@ class Request {
     WR_FLOAT(out_, section_, kAltitude, tag.altitude);
     WR_FLOAT(out_, section_, kSpeed, tag.speed);
     WR_STRING(out_, section_, kComment, tag.comment);
-    return exif.SetExif(photo, tag);
+    return exif_.StageExif(photo, tag);
   }
 
   unsigned long in_, out_;
   CString section_;
+  CExif2& exif_;
 };
 
 }  // namespace
@@ -124,18 +127,35 @@ bool RunCommandFile(const wchar_t* path, Outcome& outcome, std::FILE* errors) {
 
   const unsigned long out = WR_BEGIN(path);
   WR_INT(out, kPropSection, kCount, count);
-  for (const long long n : indices) {
-    const CString section = FormatString(kFileSection, static_cast<int>(n));
-    std::string error;
-    if (Request(in, out, section).Run(error)) {
-      ++outcome.done;
-      continue;
-    }
+  CExif2 exif;
+  std::vector<CString> stagedSections;
+  auto failed = [&](const CString& section, const std::string& error) {
     ++outcome.failed;
     WR_STRING(out, section, kError, CString::FromUtf8(error));
     if (errors) {
       std::fprintf(errors, "FixTag.exe: %s: %s\n",
                    RD_STRING(in, section, kOldFile, L"").ToUtf8().c_str(), error.c_str());
+    }
+  };
+  for (const long long n : indices) {
+    const CString section = FormatString(kFileSection, static_cast<int>(n));
+    std::string error;
+    bool staged = false;
+    if (!Request(in, out, section, exif).Run(staged, error)) {
+      failed(section, error);
+    } else if (staged) {
+      stagedSections.push_back(section);
+    } else {
+      ++outcome.done;
+    }
+  }
+  // The changed photos go in place together: one wait for the disk for all of them.
+  const std::vector<std::string> results = exif.CommitStaged();
+  for (size_t i = 0; i < results.size(); ++i) {
+    if (results[i].empty()) {
+      ++outcome.done;
+    } else {
+      failed(stagedSections[i], results[i]);
     }
   }
   RD_END(in);
