@@ -4,6 +4,7 @@
 
 #include <cmath>
 #include <cstdint>
+#include <functional>
 #include <limits>
 #include <string>
 #include <vector>
@@ -122,28 +123,44 @@ void ReadAnswer(unsigned long h, const CString& section, _ExifImageInfo& photo) 
   }
 }
 
-// One read exchange. `photos` holds the entries by their index in the caller's list; null
-// entries are not read but keep their index.
-int ReadPhotos(const std::vector<_ExifImageInfo*>& photos) {
+// One exchange with the tool: the command file cleared, the request written ("Count", then what
+// `request` adds), the tool run, the answers handed to `answers` (when given), the file cleared
+// again. True when the tool could be started.
+bool Exchange(int count, const std::function<void(unsigned long)>& request,
+              const std::function<void(unsigned long)>& answers = {}) {
   const CString file = CommandFilePath();
   ClearTargetFile(file);
   const unsigned long w = WR_BEGIN(file);
-  WR_INT(w, fx::kPropSection, fx::kCount, static_cast<int>(photos.size()));
-  for (size_t i = 0; i < photos.size(); ++i) {
-    if (!photos[i]) continue;
-    const CString section = Section(static_cast<int>(i));
-    WR_STRING(w, section, fx::kOldFile, photos[i]->path);
-    WR_STRING(w, section, fx::kReadOnly, fx::kTrue);
-  }
+  WR_INT(w, fx::kPropSection, fx::kCount, count);
+  request(w);
   WR_END(w);
   const bool started = RunTool(file);
-  const unsigned long r = RD_BEGIN(file);
-  for (size_t i = 0; i < photos.size(); ++i) {
-    if (photos[i]) ReadAnswer(r, Section(static_cast<int>(i)), *photos[i]);
+  if (answers) {
+    const unsigned long r = RD_BEGIN(file);
+    answers(r);
+    RD_END(r);
   }
-  RD_END(r);
   ClearTargetFile(file);
-  return started ? 1 : 0;
+  return started;
+}
+
+// One read exchange. `photos` holds the entries by their index in the caller's list; null
+// entries are not read but keep their index.
+int ReadPhotos(const std::vector<_ExifImageInfo*>& photos) {
+  const auto request = [&photos](unsigned long w) {
+    for (size_t i = 0; i < photos.size(); ++i) {
+      if (!photos[i]) continue;
+      const CString section = Section(static_cast<int>(i));
+      WR_STRING(w, section, fx::kOldFile, photos[i]->path);
+      WR_STRING(w, section, fx::kReadOnly, fx::kTrue);
+    }
+  };
+  const auto answers = [&photos](unsigned long r) {
+    for (size_t i = 0; i < photos.size(); ++i) {
+      if (photos[i]) ReadAnswer(r, Section(static_cast<int>(i)), *photos[i]);
+    }
+  };
+  return Exchange(static_cast<int>(photos.size()), request, answers) ? 1 : 0;
 }
 
 // The description on one line: CR LF, then CR, then LF each become one blank.
@@ -156,24 +173,19 @@ CString OneLine(CString text) {
 
 // One write exchange: the trip's copies of `photos`, all in one command file.
 int WriteCopies(const std::vector<PHOTO_ITEM_INFO*>& photos) {
-  const CString file = CommandFilePath();
-  ClearTargetFile(file);
-  const unsigned long w = WR_BEGIN(file);
-  WR_INT(w, fx::kPropSection, fx::kCount, static_cast<int>(photos.size()));
-  for (size_t i = 0; i < photos.size(); ++i) {
-    const PHOTO_ITEM_INFO& photo = *photos[i];
-    const CString section = Section(static_cast<int>(i));
-    WR_STRING(w, section, fx::kOldFile, photo.GetFilePathName());
-    WR_FLOAT(w, section, fx::kLatitude, photo.latitude);
-    WR_FLOAT(w, section, fx::kLongitude, photo.longitude);
-    WR_FLOAT(w, section, fx::kAltitude, photo.altitude);
-    WR_FLOAT(w, section, fx::kSpeed, photo.speed * 0.001);
-    WR_STRING(w, section, fx::kComment, OneLine(photo.description));
-  }
-  WR_END(w);
-  const bool started = RunTool(file);
-  ClearTargetFile(file);
-  return started ? 1 : 0;
+  const auto request = [&photos](unsigned long w) {
+    for (size_t i = 0; i < photos.size(); ++i) {
+      const PHOTO_ITEM_INFO& photo = *photos[i];
+      const CString section = Section(static_cast<int>(i));
+      WR_STRING(w, section, fx::kOldFile, photo.GetFilePathName());
+      WR_FLOAT(w, section, fx::kLatitude, photo.latitude);
+      WR_FLOAT(w, section, fx::kLongitude, photo.longitude);
+      WR_FLOAT(w, section, fx::kAltitude, photo.altitude);
+      WR_FLOAT(w, section, fx::kSpeed, photo.speed * 0.001);
+      WR_STRING(w, section, fx::kComment, OneLine(photo.description));
+    }
+  };
+  return Exchange(static_cast<int>(photos.size()), request) ? 1 : 0;
 }
 
 bool HasFile(const PHOTO_ITEM_INFO* photo) {
@@ -224,16 +236,11 @@ int WriteGeoTagInfo(PHOTO_ITEM_INFO* photo, bool writeOriginal) {
 }
 
 int CopyExifGeoTagInfo(const wchar_t* from, const wchar_t* to) {
-  const CString file = CommandFilePath();
-  ClearTargetFile(file);
-  const unsigned long w = WR_BEGIN(file);
-  WR_INT(w, fx::kPropSection, fx::kCount, 1);
-  WR_STRING(w, Section(0), fx::kOldFile, from);
-  WR_STRING(w, Section(0), fx::kNewFile, to);
-  WR_END(w);
-  const bool started = RunTool(file);
-  ClearTargetFile(file);
-  return started ? 1 : 0;
+  const auto request = [from, to](unsigned long w) {
+    WR_STRING(w, Section(0), fx::kOldFile, from);
+    WR_STRING(w, Section(0), fx::kNewFile, to);
+  };
+  return Exchange(1, request) ? 1 : 0;
 }
 
 int CheckAndWriteGeoTagInfo(PHOTO_ITEM_INFO* photo, bool& noToAll, bool& yesToAll) {

@@ -114,12 +114,23 @@ char FirstChar(const Exiv2::ExifData& exif, const char* key) {
 }
 
 // The n-th component of a numeric tag when it is a finite number; false otherwise (a zero
-// denominator, a text where a number belongs).
+// denominator, a text where a number belongs). Rationals are divided in double precision:
+// exiv2's own conversion gives a float, 7 digits, too few for a latitude written as one
+// fraction ("473769123/10000000").
 bool Number(const Exiv2::Exifdatum& d, long n, double& out) {
   if (d.count() <= n) return false;
   const Exiv2::Value& v = d.value();
-  out = static_cast<double>(v.toFloat(n));
-  return v.ok() && std::isfinite(out);
+  if (const auto* u = dynamic_cast<const Exiv2::URationalValue*>(&v)) {
+    const Exiv2::URational& r = u->value_.at(static_cast<size_t>(n));
+    out = r.second == 0 ? NAN : static_cast<double>(r.first) / r.second;
+  } else if (const auto* q = dynamic_cast<const Exiv2::RationalValue*>(&v)) {
+    const Exiv2::Rational& r = q->value_.at(static_cast<size_t>(n));
+    out = r.second == 0 ? NAN : static_cast<double>(r.first) / r.second;
+  } else {
+    out = static_cast<double>(v.toFloat(n));
+    if (!v.ok()) return false;
+  }
+  return std::isfinite(out);
 }
 
 // Degrees from the degrees, minutes and seconds of a GPS coordinate (minutes and seconds may be

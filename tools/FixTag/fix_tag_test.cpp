@@ -272,7 +272,7 @@ TEST_F(FixTagTest, BadPhotosGiveClearErrorsAndStayUnchanged) {
   EXPECT_EQ(ReadFileBytes(good), jpeg);
 }
 
-TEST_F(FixTagTest, AbsurdMetadataIsNotReported) {
+TEST_F(FixTagTest, UnusualMetadataIsReadExactlyOrLeftOut) {
   const CString odd = Photo("odd.jpg", Bytes(kTinyJpeg));
   ASSERT_TRUE(Exiv2Modify(
       odd,
@@ -280,6 +280,11 @@ TEST_F(FixTagTest, AbsurdMetadataIsNotReported) {
        "set Exif.GPSInfo.GPSAltitude 4000000000/1", "set Exif.GPSInfo.GPSSpeed 5/0",
        "set Exif.Photo.DateTimeOriginal 0000:00:00 00:00:00",
        "set Exif.Image.DateTime 2012:02:30 10:00:00"}));
+  // Degrees as one fraction with seven decimals, and minutes with a fraction of their own.
+  const CString precise = Photo("precise.jpg", Bytes(kTinyJpeg));
+  ASSERT_TRUE(Exiv2Modify(precise, {"set Exif.GPSInfo.GPSLatitude 473769123/10000000 0/1 0/1",
+                                    "set Exif.GPSInfo.GPSLongitude 8/1 325021/10000 0/1",
+                                    "set Exif.GPSInfo.GPSLongitudeRef W"}));
   const CString longComment = Photo("long.jpg", Bytes(kTinyJpeg));
   const std::wstring text(10000, L'\u00e9');
   {
@@ -299,6 +304,8 @@ TEST_F(FixTagTest, AbsurdMetadataIsNotReported) {
   WR_INT(w, fx::kPropSection, fx::kCount, 2147483647);
   WR_STRING(w, Section(0), fx::kOldFile, odd);
   WR_STRING(w, Section(0), fx::kReadOnly, fx::kTrue);
+  WR_STRING(w, Section(1), fx::kOldFile, precise);
+  WR_STRING(w, Section(1), fx::kReadOnly, fx::kTrue);
   WR_STRING(w, Section(2147483646), fx::kOldFile, longComment);
   WR_STRING(w, Section(2147483646), fx::kReadOnly, fx::kTrue);
   ASSERT_EQ(WR_END(w), 1);
@@ -308,6 +315,8 @@ TEST_F(FixTagTest, AbsurdMetadataIsNotReported) {
                              fx::kDateTimeOriginal, fx::kDateTime}) {
     EXPECT_FALSE(RD_EXISTS(r, Section(0), key)) << CString(key).ToUtf8();
   }
+  EXPECT_NEAR(RD_FLOAT(r, Section(1), fx::kLatitude, 0), 47.3769123, 1e-12);
+  EXPECT_NEAR(RD_FLOAT(r, Section(1), fx::kLongitude, 0), -(8 + 32.5021 / 60), 1e-12);
   EXPECT_EQ(RD_STRING(r, Section(2147483646), fx::kXPComment).str(), text);
   RD_END(r);
 }
