@@ -200,42 +200,6 @@ TEST_F(GeotagTest, WithoutTheToolEntriesGetTheDefaults) {
   EXPECT_FALSE(FileExists(CommandFile()));
 }
 
-TEST_F(GeotagTest, RealToolReadsTagsAndCopies) {
-  if (!HavePhotoReaders()) GTEST_SKIP() << "exiftool and exiv2 are needed (scripts/setup.sh)";
-  ProgPathScope tools(CString::FromUtf8(NAVMISC_TOOLS_DIR));
-  const CString camera = root_ / L"camera.jpg";
-  WriteFileBytes(camera, Bytes(kTinyJpeg));
-  ASSERT_TRUE(ExiftoolWrite(camera,
-                            "'-DateTimeOriginal=2012:05:17 08:30:00' -GPSLatitude=10.5 "
-                            "-GPSLatitudeRef=S -GPSLongitude=20.25 -GPSLongitudeRef=E "
-                            "'-XPComment=from the camera'"));
-  _ExifImageInfo entry;
-  entry.path = camera;
-  ASSERT_EQ(GetPhotoInfor(&entry, false), 1);
-  EXPECT_EQ(entry.time, DateTimeToLong(5, 17, 2012, 8, 30, 0));
-  EXPECT_EQ(entry.latitude, -10.5);
-  EXPECT_EQ(entry.longitude, 20.25);
-  EXPECT_EQ(entry.comment, L"from the camera");
-
-  BLOG_ITEM_INFO trip(GPS_APP_TRIP);
-  PHOTO_ITEM_INFO* photo = AddPhoto(trip, L"p.jpg");
-  photo->latitude = -45.1234567;
-  photo->longitude = 170.7654321;
-  photo->speed = 12345;
-  photo->description = L"Line one\nline two";
-  ASSERT_EQ(WriteGeoTagInfo(photo, false), 1);
-  EXPECT_EQ(
-      Exiftool(photo->GetFilePathName(),
-               {"Composite:GPSLatitude", "Composite:GPSLongitude", "GPS:GPSSpeed", "UserComment"}),
-      (std::vector<std::string>{"-45.1234567", "170.7654321", "12.345", "Line one line two"}));
-
-  const CString copy = root_ / L"copy.jpg";
-  WriteFileBytes(copy, Bytes(kTinyJpeg));
-  ASSERT_EQ(CopyExifGeoTagInfo(photo->GetFilePathName(), copy), 1);
-  EXPECT_EQ(Exiftool(copy, {"Composite:GPSLatitude", "Composite:GPSLongitude"}),
-            (std::vector<std::string>{"-45.1234567", "170.7654321"}));
-}
-
 // A view that answers from a script and records what it was asked.
 class ScriptedView : public COverwriteView {
  public:
