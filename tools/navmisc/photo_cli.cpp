@@ -9,6 +9,7 @@
 
 #include "cli.h"
 #include "navmisc/geo/gps_mapping.h"
+#include "navmisc/geotag/fixtag_format.h"
 #include "navmisc/geotag/geotag.h"
 #include "navmisc/platform/datetime.h"
 #include "navmisc/platform/exif.h"
@@ -95,6 +96,10 @@ class RecordingView : public COverwriteView {
   COverwriteView* inner_;
 };
 
+[[noreturn]] void FailToolStart() {
+  Fail("cannot start the tagging tool " + PathJoin(g_szExecProgPath, fixtag::kProgram).ToUtf8());
+}
+
 bool Placed(const PHOTO_ITEM_INFO& photo) {
   return photo.latitude != 0.0 || photo.longitude != 0.0;
 }
@@ -139,7 +144,7 @@ std::vector<AddedPhoto> AddPhotos(BLOG_ITEM_INFO& trip, const std::vector<std::s
     }
     if (!keepGoing) return;
     if (!list.IsEmpty() && !GetPhotoInfor(list)) {
-      Fail("cannot start the tagging tool " + PathJoin(g_szExecProgPath, L"FixTag.exe").ToUtf8());
+      FailToolStart();
     }
     counter += n;
     const long offset = clock.offsetFrom.empty()
@@ -286,7 +291,7 @@ GeotagOutcome GeotagTrip(BLOG_ITEM_INFO& trip, bool originals, std::optional<int
     Fail("stopped by Ctrl-C; the trip's photos were not tagged", 130);
   }
   if (!started) {
-    Fail("cannot start the tagging tool " + PathJoin(g_szExecProgPath, L"FixTag.exe").ToUtf8());
+    FailToolStart();
   }
   // The originals the user agreed to, in the order they were asked about: after "yes to all"
   // the rest are not asked.
