@@ -548,16 +548,6 @@ bool CExif2::StageExif(const wchar_t* path, const navmisc::ExifGeoTag& tag) {
                [&](std::string& bytes) { return navmisc::WriteExifGeoTag(bytes, tag, error_); });
 }
 
-bool CExif2::CopyGps(const wchar_t* from, const wchar_t* to) {
-  navmisc::FileContent source;
-  if (!source.Load(from, navmisc::kMaxPhotoBytes)) {
-    error_ = source.error();
-    return false;
-  }
-  return Rewrite(
-      to, [&](std::string& bytes) { return navmisc::CopyExifGps(source.bytes(), bytes, error_); });
-}
-
 bool CExif2::StageCopyGps(const wchar_t* from, const wchar_t* to) {
   navmisc::FileContent source;
   if (!source.Load(from, navmisc::kMaxPhotoBytes)) {

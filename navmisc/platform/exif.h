@@ -75,12 +75,12 @@ class CExif2 {
   bool GetExif(const wchar_t* path, navmisc::ExifInfo& info);
   // Changes one photo; the new content is on disk when the call returns.
   bool SetExif(const wchar_t* path, const navmisc::ExifGeoTag& tag);
-  bool CopyGps(const wchar_t* from, const wchar_t* to);
   bool SetCaptureTime(const wchar_t* path, const CString& dateTime);
-  // The same for many photos: each change is prepared beside its photo (false, with GetError(),
-  // when that fails), and CommitStaged puts them all in place together, waiting for the disk
-  // once instead of once per photo (see FileReplaceBatch). It returns one text per staged photo
-  // in order, empty when the photo was written.
+  // Changes for many photos: each is prepared beside its photo (false, with GetError(), when
+  // that fails), and CommitStaged puts them all in place together, waiting for the disk once
+  // instead of once per photo (see FileReplaceBatch). It returns one text per staged photo in
+  // order, empty when the photo was written. StageCopyGps gives `to` the GPS tags of `from`
+  // (CopyExifGps).
   bool StageExif(const wchar_t* path, const navmisc::ExifGeoTag& tag);
   bool StageCopyGps(const wchar_t* from, const wchar_t* to);
   std::vector<std::string> CommitStaged();
