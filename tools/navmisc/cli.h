@@ -65,6 +65,9 @@ void AddExportCommand(CLI::App& app);
 void AddProfileCommand(CLI::App& app);
 void AddTemplatesCommand(CLI::App& app);
 void AddTimeZoneCommand(CLI::App& app);
+// `navmisc photos add|list` and `navmisc geotag` (cmd_photos.cpp).
+void AddPhotosCommand(CLI::App& app);
+void AddGeotagCommand(CLI::App& app);
 // `navmisc help [COMMAND]`: the program's or a command's help.
 void AddHelpCommand(CLI::App& app);
 
