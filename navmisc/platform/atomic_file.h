@@ -47,9 +47,9 @@ class AtomicFile {
 };
 
 namespace testing {
-// Fault injection for tests: after `bytes` more bytes have been written through AtomicFile in
-// this process, every further write fails as a full disk would. A negative value switches the
-// fault off.
+// Fault injection for tests: after `bytes` more bytes have been written through AtomicFile or
+// OutputFile in this process, every further write fails as a full disk would. A negative value
+// switches the fault off.
 void FailAtomicWritesAfter(long long bytes);
 }  // namespace testing
 
