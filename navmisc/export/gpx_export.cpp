@@ -43,14 +43,14 @@ void WriteWaypoint(std::string& out, const PHOTO_ITEM_INFO& item, TimeTextZWrite
 }
 
 // False when the caller stopped the export.
-bool WriteTrack(DocumentWriter& w, const TRACK_ITEM_INFO& track, TimeTextZWriter& times,
+bool WriteTrack(DocumentWriter& w, const TRACK_ITEM_INFO& track, bool fromFile, TimeTextZWriter& times,
                 Progress& progress) {
   std::string& out = w.text();
   out += "\r\n<trk>\r\n<name>";
   out += Utf8Field(track.GetName().view(), kTextBuffer);
   // The document's colour is the same for every track, whatever its colour in the trip.
   out += "</name>\r\n<desc>Color:004000ff</desc>\r\n<trkseg>";
-  for (const WAYPOINT_ITEM_INFO* p : navmisc::Items<WAYPOINT_ITEM_INFO>(track.points)) {
+  const bool finished = navmisc::exportdetail::ForEachPoint(track, fromFile, [&](const WAYPOINT_ITEM_INFO* p) {
     if (p && p->time != -1) {
       out += "\r\n<trkpt lat=\"";
       AppendFixed(out, p->latitude, 6);
@@ -65,8 +65,9 @@ bool WriteTrack(DocumentWriter& w, const TRACK_ITEM_INFO& track, TimeTextZWriter
       out += "</speed>\r\n</trkpt>";
       w.MaybeFlush();
     }
-    if (!progress.Step()) return false;
-  }
+    return progress.Step();
+  });
+  if (!finished) return false;
   out += "\r\n</trkseg>\r\n</trk>";
   return true;
 }
@@ -74,13 +75,18 @@ bool WriteTrack(DocumentWriter& w, const TRACK_ITEM_INFO& track, TimeTextZWriter
 }  // namespace
 
 int ExportGpx(CString path, CPtrList& tracks, CPtrList& items) {
-  return ExportGpx(path, tracks, items, nullptr, nullptr);
+  ExportControl control;
+  return ExportGpx(path, tracks, items, control);
 }
 
-int ExportGpx(CString path, CPtrList& tracks, CPtrList& items, int* counter, bool* keepGoing) {
+int ExportGpx(CString path, CPtrList& tracks, CPtrList& items, ExportControl& control) {
+  control.error.clear();
   DocumentWriter w;
-  if (!w.Open(path)) return 0;
-  Progress progress{counter, keepGoing};
+  if (!w.Open(path)) {
+    control.error = w.error();
+    return 0;
+  }
+  Progress progress{control.counter, control.keepGoing};
   TimeTextZWriter times;
   std::string& out = w.text();
   out += "<?xml version=\"1.0\" encoding=\"UTF-8\" standalone=\"yes\" ?>\r\n<gpx creator=\"Corvane ";
@@ -93,18 +99,15 @@ int ExportGpx(CString path, CPtrList& tracks, CPtrList& items, int* counter, boo
   for (const PHOTO_ITEM_INFO* item : navmisc::Items<PHOTO_ITEM_INFO>(items)) {
     if (item) WriteWaypoint(out, *item, times);
     w.MaybeFlush();
-    if (!progress.Step()) {
-      w.Remove();
-      return 0;
-    }
+    if (!progress.Step()) return navmisc::exportdetail::Stopped(w, control);
   }
   for (const TRACK_ITEM_INFO* track : navmisc::Items<TRACK_ITEM_INFO>(tracks)) {
-    if (track && !WriteTrack(w, *track, times, progress)) {
-      w.Remove();
-      return 0;
+    if (track && !WriteTrack(w, *track, control.pointsFromFiles, times, progress)) {
+      return navmisc::exportdetail::Stopped(w, control);
     }
   }
   out += "\r\n</gpx>";
   w.Close();
+  control.error = w.error();
   return 1;
 }

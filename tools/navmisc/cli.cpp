@@ -12,6 +12,7 @@
 #include "navmisc/platform/console.h"
 #include "navmisc/platform/datetime.h"
 #include "navmisc/platform/files.h"
+#include "navmisc/platform/format.h"
 #include "navmisc/platform/shared_globals.h"
 #include "navmisc/records/trip.h"
 #include "navmisc/records/user_profile.h"
@@ -100,14 +101,72 @@ void SetDataRoot(const std::string& root) {
 
 std::string DataRoot() { return CString(g_szAppDataPath).ToUtf8(); }
 
-std::unique_ptr<BLOG_ITEM_INFO> OpenTrip(const std::string& id) {
-  const CString wid = CString::FromUtf8(id);
-  if (!IsPlainPathComponent(wid)) Fail("'" + id + "' is not a trip id");
-  for (GPS_APP_PROG_TYPE type : {GPS_APP_TRIP, GPS_APP_SPORT, GPS_APP_TRACKER}) {
-    auto trip = std::make_unique<BLOG_ITEM_INFO>(type, wid, 0);
-    if (FileExists(trip->GetBlogItemProfilePathName()) && trip->ReadInfo() == 1) return trip;
+namespace {
+
+// Something the user may name: by its id, the start of its id, or its name.
+struct Candidate {
+  std::string id;
+  std::string name;
+};
+
+// The entry of `all` that `text` names: the one whose id it is, else the only one whose id
+// starts with it or whose name it is. Fails listing the candidates when none or several match.
+size_t PickOne(const std::vector<Candidate>& all, const std::string& text, const std::string& what,
+               const std::string& where) {
+  for (size_t i = 0; i < all.size(); ++i) {
+    if (all[i].id == text) return i;
   }
-  Fail("no trip '" + id + "' under " + DataRoot() + " (see navmisc trips)");
+  std::vector<size_t> hits;
+  for (size_t i = 0; i < all.size(); ++i) {
+    if (!text.empty() && (all[i].id.rfind(text, 0) == 0 || all[i].name == text)) hits.push_back(i);
+  }
+  if (hits.size() == 1) return hits.front();
+  std::string message;
+  if (hits.empty()) {
+    message = "no " + what + " '" + text + "' " + where;
+    for (size_t i = 0; i < all.size(); ++i) hits.push_back(i);
+    message += hits.empty() ? " (there are none)" : "; there are:";
+  } else {
+    message = FormatA("'%s' names %zu %ss %s; give one's id:", text.c_str(), hits.size(), what.c_str(), where.c_str());
+  }
+  constexpr size_t kShown = 20;
+  for (size_t k = 0; k < hits.size() && k < kShown; ++k) {
+    message += FormatA("\n  %-20s %s", all[hits[k]].id.c_str(), all[hits[k]].name.c_str());
+  }
+  if (hits.size() > kShown) message += FormatA("\n  ... and %zu more", hits.size() - kShown);
+  Fail(message);
+}
+
+}  // namespace
+
+std::unique_ptr<BLOG_ITEM_INFO> OpenTrip(const std::string& name) {
+  std::vector<Candidate> all;
+  std::vector<GPS_APP_PROG_TYPE> types;
+  for (GPS_APP_PROG_TYPE type : {GPS_APP_TRIP, GPS_APP_SPORT, GPS_APP_TRACKER}) {
+    CStringList folders;
+    if (GetContent(GetAppDataFolder(type), L"*", folders) < 0) continue;
+    for (const CString& id : folders) {
+      BLOG_ITEM_INFO trip(type, id, 0);
+      if (!FileExists(trip.GetBlogItemProfilePathName()) || trip.ReadInfo() != 1) continue;
+      all.push_back({id.ToUtf8(), trip.name.ToUtf8()});
+      types.push_back(type);
+    }
+  }
+  const size_t i = PickOne(all, name, "trip", "under " + DataRoot());
+  auto trip = std::make_unique<BLOG_ITEM_INFO>(types[i], CString::FromUtf8(all[i].id), 0);
+  if (trip->ReadInfo() != 1) Fail("cannot read trip " + all[i].id);
+  return trip;
+}
+
+TRACK_ITEM_INFO& FindTrack(BLOG_ITEM_INFO& trip, const std::string& name) {
+  std::vector<Candidate> all;
+  std::vector<TRACK_ITEM_INFO*> tracks;
+  for (auto* t : Items<TRACK_ITEM_INFO>(trip.tracks)) {
+    if (!t) continue;
+    all.push_back({t->id.ToUtf8(), t->GetName().ToUtf8()});
+    tracks.push_back(t);
+  }
+  return *tracks[PickOne(all, name, "track", "in trip " + trip.tripId.ToUtf8())];
 }
 
 bool RunWithProgress(const std::string& label, int total, int& counter, bool& keepGoing,

@@ -3,12 +3,15 @@
 
 #include <functional>
 #include <memory>
+#include <optional>
 #include <string>
+#include <vector>
 
 #include "navmisc/platform/cstring.h"
 #include "navmisc/platform/types.h"
 
 class BLOG_ITEM_INFO;
+class TRACK_ITEM_INFO;
 namespace CLI {
 class App;
 }
@@ -39,8 +42,12 @@ std::string TimeText(long time);          // "YYYY-MM-DDThh:mm:ssZ", or "-" for 
 void SetDataRoot(const std::string& root);
 std::string DataRoot();
 
-// Finds and reads the trip whose id is `id`, in any application folder of the data root.
-std::unique_ptr<BLOG_ITEM_INFO> OpenTrip(const std::string& id);
+// Finds and reads (without its points) the trip that `name` names in any application folder of
+// the data root: its id, the start of exactly one trip's id, or exactly one trip's name. Fails
+// listing the candidates when none or several match.
+std::unique_ptr<BLOG_ITEM_INFO> OpenTrip(const std::string& name);
+// The track of `trip` that `name` names, the same way (its id, the start of one id, one name).
+TRACK_ITEM_INFO& FindTrack(BLOG_ITEM_INFO& trip, const std::string& name);
 
 // Runs `work` on a worker thread while a progress bar follows `counter` up to `total` on stderr
 // (only when stderr is a terminal). Ctrl-C clears `keepGoing`, so the work can stop cleanly;
@@ -48,10 +55,19 @@ std::unique_ptr<BLOG_ITEM_INFO> OpenTrip(const std::string& id);
 bool RunWithProgress(const std::string& label, int total, int& counter, bool& keepGoing,
                      const std::function<void()>& work);
 
-// Writes `trip` (points loaded) in one of the export formats; fails with a message. `counter`
-// and `keepGoing` (may be null) follow and stop the export.
-int ExportTrip(BLOG_ITEM_INFO& trip, const std::string& format, const std::string& out, bool metric,
-               int sport, int* counter = nullptr, bool* keepGoing = nullptr);
+// One run of `navmisc export`.
+struct ExportRequest {
+  std::string trip;             // as the user names it (see OpenTrip)
+  std::string out;              // the file to write, or "-" for standard output
+  std::string format;           // gpx, kml, kmz, tcx or csv, any case; empty: out's extension
+  bool metric = false;          // csv only
+  std::optional<int> sport;     // tcx only (default running)
+  std::string track;            // one track (see FindTrack); empty: all
+  std::optional<int> level;     // only the points kept at this display level
+};
+// Writes the document, with a progress bar, beside its target first and then in its place.
+// Returns the files written ("-" for standard output). Fails with a message.
+std::vector<std::string> RunExport(const ExportRequest& request);
 // The demo's last step: every trip of the demo tree in every export format.
 void DemoExports(const std::string& root);
 

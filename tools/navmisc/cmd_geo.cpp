@@ -145,8 +145,8 @@ void RunPlace(const PlaceOptions& o) {
     if (lat == 0.0 && lon == 0.0) Usage("0/0 stands for no position; give another one");
   }
   if (!byTime && !byPosition) Usage("place needs --time or --lat and --lon");
-  CString trackId = CString::FromUtf8(o.track);
   auto trip = OpenTripWithPoints(o.trip);
+  CString trackId = o.track.empty() ? CString() : FindTrack(*trip, o.track).id;
 
   double altitude = 0.0;
   long speed = 0;
@@ -215,7 +215,8 @@ void AddPlaceCommand(CLI::App& app) {
   lon->needs(lat);
   cmd->add_option("--tolerance", o->tolerance, "how near the track must pass, metres (default 50)")
       ->check(CLI::PositiveNumber);
-  cmd->add_option("--track", o->track, "the track to try first")->option_text("ID");
+  cmd->add_option("--track", o->track, "the track to try first: its id, the start of its id, or its name")
+      ->option_text("ID");
 }
 
 }  // namespace navmisc::cli

@@ -15,15 +15,16 @@ void DemoExports(const std::string& root) {
   const CString folder = PathJoin(CString::FromUtf8(root), L"exports");
   if (!MakeDir(folder)) Fail("cannot create " + folder.ToUtf8());
 
-  std::puts("\nExports (navmisc export TRIP --format F -o FILE):");
+  std::puts("\nExports (navmisc export TRIP -o FILE):");
   std::function<void(BLOG_TREE_NODE&)> exportNode = [&](BLOG_TREE_NODE& node) {
     for (auto* trip : Items<BLOG_ITEM_INFO>(node.trips)) {
-      trip->ReadAllWaypoint(0);
       for (const char* format : {"gpx", "kml", "kmz", "tcx", "csv"}) {
-        const std::string out = PathJoin(folder, trip->tripId + L"." + CString::FromUtf8(format)).ToUtf8();
+        ExportRequest request;
+        request.trip = trip->tripId.ToUtf8();
+        request.out = PathJoin(folder, trip->tripId + L"." + CString::FromUtf8(format)).ToUtf8();
         // Metric CSV and running laps, as a sport user would export them.
-        ExportTrip(*trip, format, out, true, 1);
-        std::printf("  %-4s %s\n", format, out.c_str());
+        request.metric = request.out.ends_with(".csv");
+        for (const std::string& file : RunExport(request)) std::printf("  %-4s %s\n", format, file.c_str());
       }
     }
     for (auto* child : Items<BLOG_TREE_NODE>(node.children)) exportNode(*child);

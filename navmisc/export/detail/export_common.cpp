@@ -32,6 +32,16 @@ void DocumentWriter::Remove() {
   DeleteFileRetry(path_);
 }
 
+int Stopped(DocumentWriter& w, ExportControl& control) {
+  w.Remove();
+  control.error = "stopped";
+  return 0;
+}
+
+long long PointCount(const TRACK_ITEM_INFO& track, bool fromFile) {
+  return fromFile ? TrackPointReader::Count(track) : track.points.GetCount();
+}
+
 std::string Utf8Field(std::wstring_view text, size_t bufferSize) {
   std::string out;
   if (bufferSize == 0 || !WideToUtf8(text, out)) return {};
