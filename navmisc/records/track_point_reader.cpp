@@ -19,7 +19,11 @@ bool TrackPointReader::Open(const TRACK_ITEM_INFO& track) {
 bool TrackPointReader::Next(WAYPOINT_ITEM_INFO& p) {
   std::string_view line;
   if (reader_.Next(line)) {
-    p = WAYPOINT_ITEM_INFO(nullptr);
+    // A line that breaks off leaves the fields after the break at their defaults.
+    p.time = -1;
+    p.latitude = p.longitude = p.altitude = 0.0;
+    p.speed = p.type = p.extraA = p.extraB = 0;
+    p.course = -1;
     point_file::ScanPointLine(line, p);
     // Times stored by the old release need the profile's shift; the writer never removes it.
     p.time = static_cast<int32_t>(static_cast<uint32_t>(p.time) + static_cast<uint32_t>(shift_));

@@ -17,9 +17,10 @@ class TrackPointReader {
 
   // Opens `track`'s ".BIN" file. False when there is none (the track then has no points).
   bool Open(const TRACK_ITEM_INFO& track);
-  // Fills `p` with the next point as TRACK_ITEM_INFO::ReadAllWaypoint loads it (every field
-  // reset first; times shifted by the profile; a file of a single point yields that point and
-  // then a copy one second later). False at the end.
+  // Fills `p` with the next point as TRACK_ITEM_INFO::ReadAllWaypoint loads it (times shifted by
+  // the profile; a file of a single point yields that point and then a copy one second later).
+  // False at the end. The fields a line holds are reset before it is read; the others keep what
+  // `p` has, so pass the same default record each time.
   bool Next(WAYPOINT_ITEM_INFO& p);
   // The number of points Next yields for `track`, found by one pass over the file's lines.
   static long long Count(const TRACK_ITEM_INFO& track);
