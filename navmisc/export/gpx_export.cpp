@@ -1,5 +1,8 @@
 #include "navmisc/export/gpx_export.h"
 
+#include <algorithm>
+#include <string_view>
+
 #include "navmisc/export/detail/export_common.h"
 #include "navmisc/platform/format.h"
 #include "navmisc/records/photo.h"
@@ -8,6 +11,7 @@
 namespace {
 
 using navmisc::AppendFixed;
+using navmisc::WriteFixed;
 using navmisc::exportdetail::DocumentWriter;
 using navmisc::exportdetail::Progress;
 using navmisc::exportdetail::TimeTextZWriter;
@@ -52,17 +56,22 @@ bool WriteTrack(DocumentWriter& w, const TRACK_ITEM_INFO& track, bool fromFile, 
   out += "</name>\r\n<desc>Color:004000ff</desc>\r\n<trkseg>";
   const bool finished = navmisc::exportdetail::ForEachPoint(track, fromFile, [&](const WAYPOINT_ITEM_INFO* p) {
     if (p && p->time != -1) {
-      out += "\r\n<trkpt lat=\"";
-      AppendFixed(out, p->latitude, 6);
-      out += "\" lon=\"";
-      AppendFixed(out, p->longitude, 6);
-      out += "\">\r\n<ele>";
-      AppendFixed(out, p->altitude, 6);
-      out += "</ele>\r\n<time>";
-      times.Append(out, p->time);
-      out += "</time>\r\n<speed>";
-      AppendFixed(out, p->speed * kMetresPerHourToMetresPerSecond, 2);
-      out += "</speed>\r\n</trkpt>";
+      // The hot path of a long track: the element is built in place, then appended once.
+      char element[128 + 4 * 340];
+      char* at = element;
+      const auto put = [&at](std::string_view text) { at = std::copy(text.begin(), text.end(), at); };
+      put("\r\n<trkpt lat=\"");
+      at = WriteFixed(at, p->latitude, 6);
+      put("\" lon=\"");
+      at = WriteFixed(at, p->longitude, 6);
+      put("\">\r\n<ele>");
+      at = WriteFixed(at, p->altitude, 6);
+      put("</ele>\r\n<time>");
+      at = times.Write(at, p->time);
+      put("</time>\r\n<speed>");
+      at = WriteFixed(at, p->speed * kMetresPerHourToMetresPerSecond, 2);
+      put("</speed>\r\n</trkpt>");
+      out.append(element, static_cast<size_t>(at - element));
       w.MaybeFlush();
     }
     return progress.Step();

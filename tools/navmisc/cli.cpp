@@ -1,10 +1,11 @@
 #include "cli.h"
 
-#include <atomic>
 #include <chrono>
+#include <condition_variable>
 #include <cmath>
 #include <cstdlib>
 #include <cstdio>
+#include <mutex>
 #include <thread>
 
 #include <CLI/CLI.hpp>
@@ -172,10 +173,14 @@ TRACK_ITEM_INFO& FindTrack(BLOG_ITEM_INFO& trip, const std::string& name) {
 bool RunWithProgress(const std::string& label, int total, int& counter, bool& keepGoing,
                      const std::function<void()>& work) {
   InterruptWatch watch;
-  std::atomic<bool> done{false};
+  std::mutex mutex;
+  std::condition_variable finished;
+  bool done = false;
   std::thread worker([&] {
     work();
+    const std::lock_guard<std::mutex> lock(mutex);
     done = true;
+    finished.notify_one();
   });
   // A bar when the work counts its items, a spinner with the elapsed time otherwise; either only
   // once the work has taken more than a moment.
@@ -184,8 +189,12 @@ bool RunWithProgress(const std::string& label, int total, int& counter, bool& ke
   bool drawn = false;
   bool interrupted = false;
   auto last = std::chrono::steady_clock::now() - std::chrono::seconds(1);
-  while (!done) {
-    std::this_thread::sleep_for(std::chrono::milliseconds(50));
+  for (;;) {
+    {
+      // The end of the work wakes the wait at once; Ctrl-C and the bar are looked at in between.
+      std::unique_lock<std::mutex> lock(mutex);
+      if (finished.wait_for(lock, std::chrono::milliseconds(50), [&] { return done; })) break;
+    }
     if (watch.Interrupted() && !interrupted) {
       interrupted = true;
       keepGoing = false;  // the work looks at the flag between items and stops there

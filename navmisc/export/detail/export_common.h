@@ -107,6 +107,8 @@ std::string StdTimeTextZ(int32_t time);
 class TimeTextZWriter {
  public:
   void Append(std::string& out, int32_t time);
+  // The same text written at `at` (room for 64 bytes); returns the end of it.
+  char* Write(char* at, int32_t time);
 
  private:
   int64_t day_ = INT64_MIN;  // the UTC day whose date part is cached, or none
