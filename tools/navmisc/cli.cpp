@@ -6,6 +6,7 @@
 #include <cstdlib>
 #include <cstdio>
 #include <mutex>
+#include <regex>
 #include <thread>
 
 #include <CLI/CLI.hpp>
@@ -79,13 +80,62 @@ void AddHelpCommand(CLI::App& app) {
   });
 }
 
+namespace {
+
+// True when the fields name a real day and time (no 30th of February).
+bool ValidDateTime(int year, int month, int day, int hour, int minute, int second) {
+  if (year < 1970 || year > 2037 || month < 1 || month > 12 || day < 1 || day > 31 || hour > 23 || minute > 59 ||
+      second > 59) {
+    return false;
+  }
+  int y, mo, d, h, mi, sec;
+  GetDateTimeInfo(DateTimeToLong(month, day, year, hour, minute, second), y, mo, d, h, mi, sec);
+  return y == year && mo == month && d == day;
+}
+
+}  // namespace
+
+Date ParseDate(const std::string& text) {
+  static const std::regex iso(R"((\d{4})-(\d{2})-(\d{2}))");
+  static const std::regex old(R"((\d{1,2})/(\d{1,2})/(\d{4}))");
+  std::smatch m;
+  Date d{};
+  if (std::regex_match(text, m, iso)) {
+    d = {std::stoi(m[1]), std::stoi(m[2]), std::stoi(m[3])};
+  } else if (std::regex_match(text, m, old)) {
+    d = {std::stoi(m[3]), std::stoi(m[1]), std::stoi(m[2])};
+  } else {
+    Usage("'" + text + "' is not a date (YYYY-MM-DD)");
+  }
+  if (!ValidDateTime(d.year, d.month, d.day, 0, 0, 0)) Usage("'" + text + "' is not a date between 1970 and 2037");
+  return d;
+}
+
+std::string DateText(const Date& d) { return FormatA("%04d-%02d-%02d", d.year, d.month, d.day); }
+
 long ParseTime(const std::string& text) {
-  char* end = nullptr;
-  const long v = std::strtol(text.c_str(), &end, 10);
-  if (!text.empty() && !*end) return v;
-  const long t = ConvertStdStringTimeT(CString::FromUtf8(text));
-  if (t == -1) Usage("'" + text + "' is not a time (seconds since 1970 or YYYY-MM-DDThh:mm:ss)");
-  return t;
+  static const std::regex seconds(R"(\d+)");
+  static const std::regex iso(
+      R"((\d{4})-(\d{2})-(\d{2})(?:[T ](\d{2}):(\d{2})(?::(\d{2}))?(Z|([+-])(\d{2}):?(\d{2}))?)?)");
+  std::smatch m;
+  if (std::regex_match(text, m, seconds)) {
+    if (text.size() > 10 || std::stoll(text) > 2147483647LL) Usage("'" + text + "' is too late a time");
+    return std::stol(text);
+  }
+  if (!std::regex_match(text, m, iso)) {
+    Usage("'" + text + "' is not a time (YYYY-MM-DDThh:mm:ss, with Z or an offset such as +02:00 for another zone "
+          "than UTC, or seconds since 1970)");
+  }
+  const auto field = [&m](int i) { return m[i].matched ? std::stoi(m[i]) : 0; };
+  if (!ValidDateTime(field(1), field(2), field(3), field(4), field(5), field(6))) {
+    Usage("'" + text + "' is not a time between 1970 and 2037");
+  }
+  long time = DateTimeToLong(field(2), field(3), field(1), field(4), field(5), field(6));
+  if (m[8].matched) {
+    const long offset = field(9) * 3600L + field(10) * 60L;
+    time += m[8] == "+" ? -offset : offset;
+  }
+  return time;
 }
 
 std::string TimeText(long time) {
@@ -168,6 +218,15 @@ TRACK_ITEM_INFO& FindTrack(BLOG_ITEM_INFO& trip, const std::string& name) {
     tracks.push_back(t);
   }
   return *tracks[PickOne(all, name, "track", "in trip " + trip.tripId.ToUtf8())];
+}
+
+void CheckOutputFolder(const std::string& path) {
+  const CString target = CString::FromUtf8(path);
+  const CString folder = PathFolder(target);
+  if (!folder.IsEmpty() && !IsDirectory(folder)) {
+    Fail(FileExists(folder) ? folder.ToUtf8() + " is not a folder" : "the folder " + folder.ToUtf8() + " does not exist");
+  }
+  if (IsDirectory(target)) Fail(path + " is a folder");
 }
 
 bool RunWithProgress(const std::string& label, int total, int& counter, bool& keepGoing,

@@ -35,8 +35,16 @@ void AddGlobalOptions(CLI::App& app);
 CLI::App* AddCommand(CLI::App& app, const std::string& name, const std::string& description,
                      const std::string& details, std::function<void()> run, bool usesDataRoot = true);
 
-long ParseTime(const std::string& text);  // seconds since 1970 or "YYYY-MM-DDThh:mm:ss[Z]"
-std::string TimeText(long time);          // "YYYY-MM-DDThh:mm:ssZ", or "-" for none
+// Dates and times as the user gives them: ISO 8601 ("2024-05-31", "2024-05-31T14:05:00Z",
+// "2024-05-31T16:05+02:00"; UTC when no zone is given), and the older forms (dates
+// "05/31/2024", times in seconds since 1970). Anything else is a usage error.
+struct Date {
+  int year, month, day;
+};
+Date ParseDate(const std::string& text);
+long ParseTime(const std::string& text);
+std::string DateText(const Date& date);  // "YYYY-MM-DD"
+std::string TimeText(long time);         // "YYYY-MM-DDThh:mm:ssZ", or "-" for none
 
 // Sets the data root (and the program folder) for this run.
 void SetDataRoot(const std::string& root);
@@ -54,6 +62,9 @@ TRACK_ITEM_INFO& FindTrack(BLOG_ITEM_INFO& trip, const std::string& name);
 // returns false when it was interrupted that way.
 bool RunWithProgress(const std::string& label, int total, int& counter, bool& keepGoing,
                      const std::function<void()>& work);
+
+// Fails unless the folder of the output file `path` exists and `path` is not a folder.
+void CheckOutputFolder(const std::string& path);
 
 // One run of `navmisc export`.
 struct ExportRequest {

@@ -183,13 +183,7 @@ std::vector<std::string> RunExport(const ExportRequest& r) {
   CheckOptionsFit(r, format);
   CString target = CString::FromUtf8(r.out);
   const bool toStdout = r.out == "-";
-  if (!toStdout) {
-    const CString folder = PathFolder(target);
-    if (!folder.IsEmpty() && !IsDirectory(folder)) {
-      Fail(FileExists(folder) ? folder.ToUtf8() + " is not a folder" : "the folder " + folder.ToUtf8() + " does not exist");
-    }
-    if (IsDirectory(target)) Fail(r.out + " is a folder");
-  }
+  if (!toStdout) CheckOutputFolder(r.out);
   auto trip = OpenTrip(r.trip);
 
   // Documents of a million points need not hold them: the exporters read them from the point

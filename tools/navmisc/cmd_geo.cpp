@@ -10,9 +10,10 @@
 #include "navmisc/geo/gps_mapping.h"
 #include "navmisc/geo/optimize.h"
 #include "navmisc/geo/track_plot.h"
-#include "navmisc/platform/atomic_file.h"
 #include "navmisc/platform/files.h"
 #include "navmisc/platform/format.h"
+#include "navmisc/platform/output_file.h"
+#include "navmisc/platform/staging_folder.h"
 #include "navmisc/records/trip.h"
 
 namespace navmisc::cli {
@@ -103,14 +104,17 @@ void PrintLevelSummary(std::FILE* out, BLOG_ITEM_INFO& trip) {
 }
 
 void WritePlot(BLOG_ITEM_INFO& trip, const std::string& path, long size) {
-  const CString wpath = CString::FromUtf8(path);
-  const CString folder = PathFolder(wpath);
-  if (!folder.IsEmpty() && !IsDirectory(folder)) Fail("the folder " + folder.ToUtf8() + " does not exist");
+  CheckOutputFolder(path);
   TrackPlotOptions options;
   options.size = size;
   const std::string svg = RenderTrackPlotSvg(trip, options);
-  AtomicFile file;
-  if (!file.Open(wpath) || !file.Write(svg) || !file.Commit()) Fail("cannot write " + path);
+  StagingFolder staging(PathFolder(CString::FromUtf8(path)), PathFileName(CString::FromUtf8(path)));
+  if (staging.path().IsEmpty()) Fail("cannot write " + path + ": " + staging.error());
+  OutputFile file;
+  const bool written = file.Open(PathJoin(staging.path(), PathFileName(CString::FromUtf8(path)))) &&
+                       file.Write(svg) && file.Close();
+  if (!written) Fail("cannot write " + path + ": " + file.error());
+  if (!staging.Publish()) Fail("cannot write " + path + ": " + staging.error());
 }
 
 namespace {
@@ -192,6 +196,8 @@ void AddPlotCommand(CLI::App& app) {
   };
   auto o = std::make_shared<Options>();
   CLI::App* cmd = AddCommand(app, "plot", "draw a trip's tracks, points coloured by level", kPlotHelp, [o] {
+    const std::string extension = PathExtension(CString::FromUtf8(o->out)).ToUtf8();
+    if (extension != "svg" && extension != "SVG") Usage("the plot is an SVG picture: name it FILE.svg");
     auto trip = OpenTripWithPoints(o->trip);
     WritePlot(*trip, o->out, o->size);
     std::printf("%s\n", o->out.c_str());

@@ -5,6 +5,7 @@
 #include <string>
 
 #include "geo_reference.h"
+#include "navmisc/platform/datetime.h"
 #include "navmisc/platform/files.h"
 #include "navmisc/platform/format.h"
 #include "navmisc/records/trip.h"
@@ -102,6 +103,9 @@ TEST_F(GeoCommands, PlaceAnswersByTimeOrPositionAndErrorsSayWhy) {
   const std::string lat = navmisc::FormatA("%.6f", fix->latitude);
   const std::string lon = navmisc::FormatA("%.6f", fix->longitude);
   const std::string place = "place GEOTRIP ";
+  // The fix's time in ISO form, in UTC and as two hours ahead of it.
+  const std::string iso = CString(TimeTToStdStringTime(fix->time)).ToUtf8();
+  const std::string plusTwo = CString(TimeTToStdStringTime(fix->time + 7200)).ToUtf8();
   const struct {
     std::string args;
     int status;
@@ -115,6 +119,11 @@ TEST_F(GeoCommands, PlaceAnswersByTimeOrPositionAndErrorsSayWhy) {
       {place + "--lat 10", 2, "--lat requires --lon"},
       {place + "--lat 0 --lon 0", 2, "0/0 stands for no position"},
       {place + "--time yesterday", 2, "is not a time"},
+      {place + "--time 2024-02-30T10:00:00", 2, "is not a time between 1970 and 2037"},
+      {place + "--time " + navmisc::FormatA("%sZ", iso.c_str()), 0, "latitude   " + lat},
+      {place + "--time " + navmisc::FormatA("%s+02:00", plusTwo.c_str()), 0, "latitude   " + lat},
+      {place + "--time '" + plusTwo.substr(0, 10) + " " + plusTwo.substr(11) + "+0200'", 0, "latitude   " + lat},
+      {"plot GEOTRIP -o x.png", 2, "the plot is an SVG picture: name it FILE.svg"},
       {"optimize NOPE", 1, "no trip 'NOPE'"},
       {"optimize", 2, "TRIP is required"},
       {"plot GEOTRIP", 2, "--output is required"},

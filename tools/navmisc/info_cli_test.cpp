@@ -39,11 +39,21 @@ TEST(InfoCommands, ProfileShowsWhatTheLibraryWrote) {
     sport.SetWeightHeight(6, 1, 2024, 61, 168);
     ASSERT_TRUE(sport.WriteInfo());
   }
-  const CommandResult r = Tool("", "--data-root " + ShellQuote(root.path().ToUtf8()) +
-                                       " profile --app sport --on 05/31/2024");
-  EXPECT_EQ(r.status, 0) << r.out;
-  EXPECT_TRUE(Shows(r, "Zoë (female)")) << r.out;
-  EXPECT_TRUE(Shows(r, "On 05/31/2024:   58.5 kg, 168 cm")) << r.out;
+  const std::string profile = "--data-root " + ShellQuote(root.path().ToUtf8()) + " profile --app sport --on ";
+  // The ISO date and the older month-first form; the answer always in ISO form.
+  for (const char* date : {"2024-05-31", "05/31/2024"}) {
+    const CommandResult r = Tool("", profile + date);
+    EXPECT_EQ(r.status, 0) << r.out;
+    EXPECT_TRUE(Shows(r, "Zoë (female)")) << r.out;
+    EXPECT_TRUE(Shows(r, "On 2024-05-31:   58.5 kg, 168 cm")) << r.out;
+  }
+  // A bad date fails before anything is shown.
+  for (const char* date : {"yesterday", "2024-02-30", "31/05/2024", "2024-5-31"}) {
+    const CommandResult r = Tool("", profile + date);
+    EXPECT_EQ(r.status, 2) << date << "\n" << r.out;
+    EXPECT_TRUE(Shows(r, "is not a date")) << date << "\n" << r.out;
+    EXPECT_FALSE(Shows(r, "File:")) << date << "\n" << r.out;
+  }
 }
 
 TEST(InfoCommands, TemplatesComeFromTheCatalogueBesideTheProgram) {
