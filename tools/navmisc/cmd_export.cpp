@@ -22,7 +22,7 @@
 #include "navmisc/platform/temp_folder.h"
 #include "navmisc/records/track_point_reader.h"
 #include "navmisc/records/trip.h"
-#include "xml_text.h"
+#include "navmisc/util/xml_text.h"
 
 namespace navmisc::cli {
 namespace {

@@ -30,11 +30,12 @@ constexpr const char* kOptimizeHelp =
     "Ctrl-C stops after the current step; the levels set so far are saved (exit code 130).";
 
 constexpr const char* kPlotHelp =
-    "Draws the trip's tracks as an SVG picture, north up: one pixel per metre when the trip\n"
-    "fits into PIXELS (default 800), coarser steps of 0.2 m per pixel until it does. Every point\n"
-    "is a dot coloured by its level: red a bad fix, orange a stop, pale to dark blue levels 0\n"
-    "to 100, black never dropped. A scale bar and a key sit under the drawing. Run\n"
-    "`navmisc optimize TRIP` first to give the points their levels.";
+    "Draws the trip's tracks as a square SVG picture of --size pixels, north up, filled with the\n"
+    "trip: each track's line in its own colour, every point a dot coloured by its level (red a\n"
+    "bad fix, orange a stop, pale to dark blue levels 0 to 100, black never dropped), the start\n"
+    "(green) and the end (dark square) marked, the trip's name and times as the title, a scale\n"
+    "bar and a key underneath. Bad fixes stay out of the frame, so one wild fix cannot shrink\n"
+    "the drawing. Run `navmisc optimize TRIP` first to give the points their levels.";
 
 constexpr const char* kPlaceHelp =
     "Places a photo on the trip's tracks: where the trip was at time T (seconds since 1970 or\n"
@@ -204,8 +205,8 @@ void AddPlotCommand(CLI::App& app) {
   });
   cmd->add_option("TRIP", o->trip, "the trip")->required();
   cmd->add_option("-o,--output", o->out, "the picture to write")->required()->option_text("FILE.svg");
-  cmd->add_option("--size", o->size, "the picture's size in pixels (default 800)")
-      ->check(CLI::Range(16L, 100000L));
+  cmd->add_option("--size", o->size, "the picture's width and height in pixels (default 800)")
+      ->check(CLI::Range(200L, 100000L));
 }
 
 void AddPlaceCommand(CLI::App& app) {

@@ -1,13 +1,13 @@
-// Texts that the exporters write as they are, made safe for XML readers beforehand: the CLI
-// hands the exporters copies of its records with these texts, so that every document it writes
-// is well-formed while the library keeps its documents byte for byte.
+// Text made safe for XML documents. The exporters write some texts as they are (their documents
+// are kept byte for byte); a caller that needs well-formed documents hands them copies of its
+// records with texts made safe here.
 #pragma once
 
 #include <cstddef>
 
 #include "navmisc/platform/cstring.h"
 
-namespace navmisc::cli {
+namespace navmisc {
 
 // `text` as XML character data: "&", "<", ">" and the double quote as entities, a CR LF pair as
 // "&#13;", characters XML cannot hold (control characters other than tab, LF and CR, surrogates,
@@ -18,4 +18,4 @@ CString XmlText(const CString& text, size_t maxBytes);
 // `text` with only the characters XML can hold, for fields that the exporter escapes itself.
 CString XmlCharacters(const CString& text);
 
-}  // namespace navmisc::cli
+}  // namespace navmisc

@@ -1,8 +1,8 @@
-#include "xml_text.h"
+#include "navmisc/util/xml_text.h"
 
 #include <string>
 
-namespace navmisc::cli {
+namespace navmisc {
 namespace {
 
 bool XmlCanHold(wchar_t c) {
@@ -59,4 +59,4 @@ CString XmlCharacters(const CString& text) {
   return CString(std::move(out));
 }
 
-}  // namespace navmisc::cli
+}  // namespace navmisc
