@@ -12,6 +12,7 @@
 #include <CLI/CLI.hpp>
 
 #include "navmisc/platform/console.h"
+#include "navmisc/platform/data_root.h"
 #include "navmisc/platform/datetime.h"
 #include "navmisc/platform/files.h"
 #include "navmisc/platform/format.h"
@@ -144,7 +145,8 @@ std::string TimeText(long time) {
 }
 
 void SetDataRoot(const std::string& root) {
-  SetSharedText(g_szAppDataPath, CString::FromUtf8(root));
+  // Processes on other data roots must never see this run's state, nor it theirs.
+  if (!UseDataRoot(CString::FromUtf8(root))) Fail("'" + root + "' cannot be used as a data folder");
   SetSharedText(g_szExecProgPath, GetCurrentExecPath());
   // Loaded times depend on the profiles' time shift: read them before any trip.
   for (auto* p : {&g_TripMapInfo, &g_SportMapInfo, &g_TrackerMapInfo, &g_WhereMapInfo}) p->ReadInfo();
