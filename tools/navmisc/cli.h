@@ -79,8 +79,8 @@ struct ExportRequest {
 // Writes the document, with a progress bar, beside its target first and then in its place.
 // Returns the files written ("-" for standard output). Fails with a message.
 std::vector<std::string> RunExport(const ExportRequest& request);
-// The demo's last step: every trip of the demo tree in every export format.
-void DemoExports(const std::string& root);
+// The demo's last step: each of the demo's trips (ids) in every export format.
+void DemoExports(const std::string& root, const std::vector<std::string>& trips);
 
 // The commands, each added to the program's parser with its options, help and callback.
 void AddDemoCommand(CLI::App& app);
@@ -95,7 +95,8 @@ void AddTimeZoneCommand(CLI::App& app);
 // `navmisc help [COMMAND]`: the program's or a command's help.
 void AddHelpCommand(CLI::App& app);
 
-// The demo's geometry step (demo_geo.cpp): optimises the sample trips, writes a plot.
-void DemoGeometry();
+// The demo's geometry step (demo_geo.cpp): optimises the demo's trips (ids), draws one and
+// places a photo on it.
+void DemoGeometry(const std::vector<std::string>& trips);
 
 }  // namespace navmisc::cli
