@@ -28,7 +28,7 @@ void Usage(const std::string& message) { throw Failure{message + " (see --help)"
 namespace {
 
 // The data root named on the command line, or the default.
-std::string& ChosenDataRoot() {
+std::string& DataRootOption() {
   static std::string root;
   return root;
 }
@@ -42,8 +42,8 @@ std::string DefaultDataRoot() {
 }  // namespace
 
 void AddGlobalOptions(CLI::App& app) {
-  ChosenDataRoot() = DefaultDataRoot();
-  app.add_option("--data-root", ChosenDataRoot(),
+  DataRootOption() = DefaultDataRoot();
+  app.add_option("--data-root", DataRootOption(),
                  "the data folder (default $XDG_DATA_HOME/navmisc, else ~/.local/share/navmisc)")
       ->option_text("DIR");
   // Subcommands made after this pass options they do not know to the program, so that global
@@ -56,7 +56,7 @@ CLI::App* AddCommand(CLI::App& app, const std::string& name, const std::string& 
   CLI::App* sub = app.add_subcommand(name, description);
   sub->footer(details + (details.empty() ? "" : "\n") + "Global options: --data-root DIR (see navmisc --help)");
   sub->callback([run = std::move(run), usesDataRoot] {
-    if (usesDataRoot) SetDataRoot(ChosenDataRoot());
+    if (usesDataRoot) SetDataRoot(DataRootOption());
     run();
   });
   return sub;

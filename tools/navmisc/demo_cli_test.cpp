@@ -10,6 +10,7 @@
 #include "navmisc/records/trip_tree.h"
 #include "navmisc/records/user_profile.h"
 #include "testutil.h"
+#include "tool_test_support.h"
 
 namespace {
 
@@ -17,13 +18,10 @@ using navmisc::testutil::CommandResult;
 using navmisc::testutil::DataRootScope;
 using navmisc::testutil::ReadFileBytes;
 using navmisc::testutil::RunCommand;
+using navmisc::testutil::RunTool;
 using navmisc::testutil::ShellQuote;
 using navmisc::testutil::TempDir;
 using navmisc::testutil::WriteFileBytes;
-
-CommandResult Tool(const std::string& args) {
-  return RunCommand(ShellQuote(NAVMISC_TOOL_PATH) + " " + args + " 2>&1 </dev/null");
-}
 
 // The first group of `pattern` in `text`, empty when it does not match.
 std::string Find(const std::string& text, const std::string& pattern) {
@@ -34,7 +32,7 @@ std::string Find(const std::string& text, const std::string& pattern) {
 TEST(DemoCommand, ShowsPhotosAndMarkersAndItsExamplesWork) {
   TempDir dir;
   const std::string root = (dir / L"root").ToUtf8();
-  const CommandResult r = Tool("demo " + ShellQuote(root));
+  const CommandResult r = RunTool("demo " + ShellQuote(root));
   ASSERT_EQ(r.status, 0) << r.out;
   const std::string paris = Find(r.out, "My trips +([0-9A-F_]+) +Day out in Paris");
   ASSERT_FALSE(paris.empty()) << r.out;
@@ -63,7 +61,7 @@ TEST(DemoCommand, ShowsPhotosAndMarkersAndItsExamplesWork) {
   // The place example it suggests finds the trip there by time.
   const std::string place = Find(r.out, "Try: navmisc (--data-root .* place .*)\n");
   ASSERT_FALSE(place.empty()) << r.out;
-  const CommandResult placed = Tool(place);
+  const CommandResult placed = RunTool(place);
   EXPECT_EQ(placed.status, 0) << placed.out;
   EXPECT_NE(placed.out.find("placed by time"), std::string::npos) << placed.out;
 }
@@ -98,7 +96,7 @@ TEST(DemoCommand, LeavesAnExistingDataRootsProfilesAndTripsAlone) {
   const std::string suite = ReadFileBytes(suiteFile);
 
   // Without --force it refuses, saying why, and writes nothing.
-  CommandResult r = Tool("demo " + dir);
+  CommandResult r = RunTool("demo " + dir);
   EXPECT_EQ(r.status, 1) << r.out;
   EXPECT_NE(r.out.find(root.path().ToUtf8() + " is not empty (it holds "), std::string::npos) << r.out;
   EXPECT_EQ(ReadFileBytes(treeFile), tree);
@@ -106,20 +104,20 @@ TEST(DemoCommand, LeavesAnExistingDataRootsProfilesAndTripsAlone) {
 
   // With --force a tree that cannot be read whole stops it before anything is written.
   WriteFileBytes(treeFile, "[broken\n");
-  r = Tool("demo --force " + dir);
+  r = RunTool("demo --force " + dir);
   EXPECT_EQ(r.status, 1) << r.out;
   EXPECT_NE(r.out.find("cannot be read whole; the demo leaves this data root alone"), std::string::npos) << r.out;
   EXPECT_FALSE(FileExists(root / L"SportRes"));
   WriteFileBytes(treeFile, tree);
 
   // With --force the demo's trips join the tree; the profile and the trip stay as they were.
-  r = Tool("demo --force " + dir);
+  r = RunTool("demo --force " + dir);
   ASSERT_EQ(r.status, 0) << r.out;
   EXPECT_NE(r.out.find("(kept as it was)"), std::string::npos) << r.out;
   EXPECT_EQ(ReadFileBytes(root / L"Resource/USER_MAP_INFO.INI"), profile);
   EXPECT_EQ(ReadFileBytes(suiteFile), suite);
   EXPECT_EQ(ReadFileBytes(root / CString::FromUtf8("Resource/" + tripId + "/BLOG_ITEM_INFO.INI")), tripFile);
-  const CommandResult trips = Tool("--data-root " + dir + " trips");
+  const CommandResult trips = RunTool("--data-root " + dir + " trips");
   EXPECT_NE(trips.out.find(tripId + " My own trip"), std::string::npos) << trips.out;
   EXPECT_NE(trips.out.find("Day out in Paris"), std::string::npos) << trips.out;
 }

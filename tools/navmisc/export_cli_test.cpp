@@ -7,6 +7,7 @@
 #include "navmisc/platform/files.h"
 #include "navmisc/records/trip.h"
 #include "testutil.h"
+#include "tool_test_support.h"
 
 namespace {
 
@@ -83,8 +84,7 @@ struct SavedTrips {
   }
   // `PREFIX navmisc --data-root ROOT ARGS`, standard error joined to standard output.
   CommandResult Run(const std::string& args, const std::string& prefix = "") const {
-    return RunCommand(prefix + ShellQuote(NAVMISC_TOOL_PATH) + " --data-root " + ShellQuote(root.path().ToUtf8()) +
-                      " " + args + " 2>&1 </dev/null");
+    return navmisc::testutil::RunTool("--data-root " + ShellQuote(root.path().ToUtf8()) + " " + args, prefix);
   }
   std::string Out(const wchar_t* name) const { return ShellQuote((root / name).ToUtf8()); }
   std::string Read(const wchar_t* name) const { return ReadFileBytes(root / name); }

@@ -11,6 +11,7 @@
 #include "navmisc/platform/format.h"
 #include "navmisc/records/trip.h"
 #include "testutil.h"
+#include "tool_test_support.h"
 
 namespace {
 
@@ -50,8 +51,7 @@ class GeoCommands : public ::testing::Test {
 
   // The program on the test's data root with `args`, standard error folded into the output.
   CommandResult RunTool(const std::string& args) {
-    return navmisc::testutil::RunCommand(std::string(NAVMISC_TOOL_PATH) + " --data-root " +
-                                         root.path().ToUtf8() + " " + args + " 2>&1");
+    return navmisc::testutil::RunTool("--data-root " + root.path().ToUtf8() + " " + args);
   }
 
   navmisc::testutil::TempDir root;
