@@ -10,6 +10,7 @@
 #include <atomic>
 #include <cerrno>
 
+#include "navmisc/platform/detail/write_fault.h"
 #include "navmisc/platform/files.h"
 
 namespace navmisc {
@@ -24,25 +25,10 @@ constexpr mode_t kNewFileMode = 0644;
 // while the rest is still being produced and the final fsync has little left to wait for.
 constexpr off_t kWritebackChunk = 8 << 20;
 
-// Bytes that may still be written before the injected fault; negative = no fault.
-std::atomic<long long> g_write_budget{-1};
-
-// How many of `wanted` bytes the fault injection lets through (all of them when it is off).
-size_t TakeWriteBudget(size_t wanted) {
-  long long budget = g_write_budget.load(std::memory_order_relaxed);
-  for (;;) {
-    if (budget < 0) return wanted;
-    const long long granted = std::min<long long>(budget, static_cast<long long>(wanted));
-    if (g_write_budget.compare_exchange_weak(budget, budget - granted, std::memory_order_relaxed)) {
-      return static_cast<size_t>(granted);
-    }
-  }
-}
-
 // Writes everything or fails; retries interrupted and partial writes. A shortened grant from
 // the fault injection writes what it allows and then fails with ENOSPC, like a full disk.
 bool WriteAll(int fd, const char* data, size_t size) {
-  const size_t allowed = TakeWriteBudget(size);
+  const size_t allowed = detail::TakeWriteBudget(size);
   size_t done = 0;
   while (done < allowed) {
     const ssize_t n = ::write(fd, data + done, allowed - done);
@@ -94,7 +80,7 @@ std::string ResolveTarget(const std::string& path) {
 
 namespace testing {
 void FailAtomicWritesAfter(long long bytes) {
-  g_write_budget.store(bytes < 0 ? -1 : bytes, std::memory_order_relaxed);
+  detail::g_write_budget.store(bytes < 0 ? -1 : bytes, std::memory_order_relaxed);
 }
 }  // namespace testing
 

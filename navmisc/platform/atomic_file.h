@@ -65,9 +65,9 @@ class AtomicFile {
 void SyncFolder(const std::string& folder);
 
 namespace testing {
-// Fault injection for tests: after `bytes` more bytes have been written through AtomicFile in
-// this process, every further write fails as a full disk would. A negative value switches the
-// fault off.
+// Fault injection for tests: after `bytes` more bytes have been written through AtomicFile or
+// OutputFile in this process, every further write fails as a full disk would. A negative value
+// switches the fault off.
 void FailAtomicWritesAfter(long long bytes);
 }  // namespace testing
 
