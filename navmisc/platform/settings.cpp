@@ -326,6 +326,10 @@ bool LoadFile(const std::string& path, Index& index) {
   } else if (first.starts_with("\xFE\xFF")) {
     encoding = Encoding::kUtf16Be;
     first.remove_prefix(2);
+  } else if (first.size() >= 2 && (first[0] == '\0') != (first[1] == '\0')) {
+    // Text never holds NUL, so one in the first two bytes can only be half of a UTF-16 code
+    // unit: a file saved as UTF-16 without a byte-order mark.
+    encoding = first[0] == '\0' ? Encoding::kUtf16Be : Encoding::kUtf16Le;
   }
   Utf16Decoder utf16(encoding == Encoding::kUtf16Be);
   std::string decoded;

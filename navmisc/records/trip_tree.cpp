@@ -67,38 +67,58 @@ void BLOG_TREE_NODE::WriteInfo(bool writeTrips, unsigned long handle, const wcha
 }
 
 int BLOG_TREE_NODE::ReadInfo(unsigned long handle, const wchar_t* section) {
-  const bool root = handle == 0;
-  if (root) {
-    readComplete = false;
-    MigrateOldTreeFile();
-    handle = RD_BEGIN(TreeFile());
-    if (!handle) return 0;
-    section = kRootSection;
-  }
-  name = RD_STRING(handle, section, L"tree_node_name", L"");
-  if (name.IsEmpty()) {
-    if (root) RD_END(handle);
+  if (handle != 0) return ReadNode(handle, section, completeRead);
+  completeRead.Begin();
+  MigrateOldTreeFile();
+  handle = RD_BEGIN(TreeFile());
+  if (!handle) {
+    completeRead.Missed(L"the tree file " + TreeFile() + L" cannot be read");
     return 0;
   }
+  const int read = ReadNode(handle, kRootSection, completeRead);
+  RD_END(handle);
+  if (!read) {
+    completeRead.Missed(L"the tree file " + TreeFile() + L" has no tree_node_name");
+    return 0;
+  }
+  completeRead.Finish();
+  return 1;
+}
+
+int BLOG_TREE_NODE::ReadNode(unsigned long handle, const wchar_t* section,
+                             navmisc::CompleteReadGuard& guard) {
+  name = RD_STRING(handle, section, L"tree_node_name", L"");
+  if (name.IsEmpty()) return 0;
   const int tripCount = RD_INT(handle, section, L"trip_item_info_count", 0);
   for (int n = 0; n < tripCount; ++n) {
     const CString id = RD_STRING(handle, section, FormatString(L"trip_item_info_(%d)_resource", n), L"");
     // Only a plain folder name may come from the file; anything else drops out like a trip
     // whose folder is gone.
-    if (!IsPlainPathComponent(id)) continue;
+    if (!IsPlainPathComponent(id)) {
+      guard.Missed(FormatString(L"trip %d of the node \"%s\" has no valid id", n, name.c_str()));
+      continue;
+    }
     auto* trip = new BLOG_ITEM_INFO(GPS_APP_TRIP, id, 0);
-    if (trip->ReadInfo() == 1) trips.AddTail(trip);
-    else delete trip;
+    if (trip->ReadInfo() != 1) {
+      guard.Missed(L"trip " + id + L": its settings file cannot be read or names no trip id");
+      delete trip;
+      continue;
+    }
+    // The folder is the trip's real name; a settings file that says otherwise was damaged or
+    // copied in from another trip.
+    if (trip->tripId != id) guard.Missed(L"trip " + id + L": its settings file names the trip " + trip->tripId);
+    trips.AddTail(trip);
   }
   const int childCount = RD_INT(handle, section, L"trip_tree_node_count", 0);
   for (int n = 0; n < childCount; ++n) {
+    const CString childSection = FormatString(L"%s_%d", section, n);
     auto* child = new BLOG_TREE_NODE(nullptr);
-    if (child->ReadInfo(handle, FormatString(L"%s_%d", section, n)) == 1) children.AddTail(child);
-    else delete child;
-  }
-  if (root) {
-    RD_END(handle);
-    readComplete = true;
+    if (child->ReadNode(handle, childSection, guard) == 1) {
+      children.AddTail(child);
+    } else {
+      guard.Missed(L"the tree node " + childSection + L" has no name");
+      delete child;
+    }
   }
   return 1;
 }
@@ -135,21 +155,8 @@ void BLOG_TREE_NODE::_FindAllUsedResource(CStringList& ids) {
 }
 
 void BLOG_TREE_NODE::RemoveAllUnusedResource() {
-  // Deleting folders on the word of a tree that was not read whole would delete live trips.
-  if (!readComplete) return;
   CStringList used;
   _FindAllUsedResource(used);
-  const CString folder = PathFolder(PathJoin(ResourceFolder(), L"dumy.file"));
-  CStringList entries;
-  if (GetContent(folder, L"*.*", entries) < 0) return;
-  for (const CString& entry : entries) {
-    if (used.Find(entry)) continue;
-    const CString path = PathJoin(folder, entry);
-    // Only folders are trip resources; the tree file and other files stay, and a symbolic link
-    // is never followed into somewhere else.
-    if (!IsDirectory(path)) continue;
-    RemoveDir(path, L"*.*");
-    SleepMs(100);
-    RemoveDir(path, L"*.*");
-  }
+  navmisc::RemoveUnusedResourceFolders(PathFolder(PathJoin(ResourceFolder(), L"dumy.file")), used,
+                                       completeRead);
 }
