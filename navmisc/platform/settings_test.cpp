@@ -257,6 +257,29 @@ TEST(SettingsTest, DamagedFilesReadWhatTheyCan) {
   EXPECT_EQ(RD_BEGIN(dir.path()), 0u) << "a folder is not a settings file";
 }
 
+// Lists are found by the sections and keys present, never by walking a count.
+TEST(SettingsTest, ListIndicesAreTheEntriesPresentBelowTheCount) {
+  TempDir dir;
+  const unsigned long r = ReadBytes(dir,
+                                    "[SECTION_RN(0)]\n[section_rn(2)]\nk=1\n[SECTION_RN(02)]\n"
+                                    "[SECTION_RN(10)]\n[SECTION_RN(2147483648)]\n[SECTION_RN(-1)]\n"
+                                    "[SECTION_RN(3)x]\n[SECTION_0]\n[SECTION_0_4]\n[SECTION_1]\n"
+                                    "[SECTION_0_4_7]\n[S]\nitem_(5)_id=a\nITEM_(1)_ID=b\nitem_(1)=c\n");
+  using navmisc::KeyIndices;
+  using navmisc::SectionIndices;
+  EXPECT_EQ(SectionIndices(r, L"SECTION_RN(%d)", 2147483647), (std::vector<int>{0, 2, 10}));
+  EXPECT_EQ(SectionIndices(r, L"%s_RN(%d)", L"SECTION", 10), (std::vector<int>{0, 2}));
+  EXPECT_EQ(SectionIndices(r, L"%s_%d", L"SECTION", 5), (std::vector<int>{0, 1}));
+  EXPECT_EQ(SectionIndices(r, L"%s_%d", L"SECTION_0", 5), (std::vector<int>{4}));
+  EXPECT_EQ(SectionIndices(r, L"%s_%d", L"section_0_4", 8), (std::vector<int>{7}));
+  EXPECT_EQ(KeyIndices(r, L"s", L"item_(%d)_id", 100), (std::vector<int>{1, 5}));
+  EXPECT_EQ(KeyIndices(r, L"S", L"item_(%d)", 100), (std::vector<int>{1}));
+  for (int count : {0, -5}) EXPECT_TRUE(SectionIndices(r, L"SECTION_RN(%d)", count).empty());
+  EXPECT_TRUE(SectionIndices(r, L"SECTION_RN", 100).empty()) << "no number in the pattern";
+  RD_END(r);
+  EXPECT_TRUE(SectionIndices(r, L"SECTION_RN(%d)", 100).empty()) << "an ended handle";
+}
+
 TEST(SettingsTest, FailedOrUnfinishedWritesLeaveTheOldFile) {
   TempDir dir;
   const CString path = dir / L"keep.ini";

@@ -258,8 +258,9 @@ int BLOG_ITEM_INFO::ReadInfo() {
   netUrl = RD_STRING(h, s, L"net_url", L"");
   tags = RD_STRING(h, s, L"tags", L"");
 
+  // Only the sections present are visited: the count alone could ask for billions.
   const int runnerCount = RD_INT(h, s, L"runner_item_info_count", 0);
-  for (int n = 0; n < runnerCount; ++n) {
+  for (int n : navmisc::SectionIndices(h, L"%s_RN(%d)", kSection, runnerCount)) {
     const CString rs = ListSection(L"%s_RN(%d)", n);
     auto* r = new RUNNER_ITEM_INFO;
     r->userDefined = RD_INT(h, rs, L"userdef", 0) != 0;
@@ -273,7 +274,7 @@ int BLOG_ITEM_INFO::ReadInfo() {
     runners.AddTail(r);
   }
   const int trackCount = RD_INT(h, s, L"track_item_info_count", 0);
-  for (int n = 0; n < trackCount; ++n) {
+  for (int n : navmisc::SectionIndices(h, L"%s_TK(%d)", kSection, trackCount)) {
     auto* t = new TRACK_ITEM_INFO(this);
     t->ReadInfo(h, ListSection(L"%s_TK(%d)", n));
     // A track id names files in this folder; one that could point elsewhere is dropped.
@@ -281,7 +282,7 @@ int BLOG_ITEM_INFO::ReadInfo() {
     else delete t;
   }
   const int photoCount = RD_INT(h, s, L"photo_item_info_count", 0);
-  for (int n = 0; n < photoCount; ++n) {
+  for (int n : navmisc::SectionIndices(h, L"%s_PH(%d)", kSection, photoCount)) {
     auto* p = new PHOTO_ITEM_INFO;
     p->trip = this;
     p->ReadInfo(h, ListSection(L"%s_PH(%d)", n));

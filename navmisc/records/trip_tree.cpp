@@ -1,5 +1,7 @@
 #include "navmisc/records/trip_tree.h"
 
+#include <vector>
+
 #include "navmisc/platform/files.h"
 #include "navmisc/platform/settings.h"
 #include "navmisc/platform/shared_globals.h"
@@ -10,6 +12,9 @@ using navmisc::Items;
 namespace {
 
 constexpr const wchar_t* kRootSection = L"SECTION";
+// Nodes deeper than this are not read (the read is then incomplete): far beyond any folder tree
+// a person builds, and it keeps a hostile file from exhausting the stack.
+constexpr int kMaxDepth = 256;
 
 CString ResourceFolder() { return GetAppDataFolder(GPS_APP_TRIP); }
 CString TreeFile() { return PathJoin(ResourceFolder(), L"RESOURCE_INFO.INI"); }
@@ -67,7 +72,7 @@ void BLOG_TREE_NODE::WriteInfo(bool writeTrips, unsigned long handle, const wcha
 }
 
 int BLOG_TREE_NODE::ReadInfo(unsigned long handle, const wchar_t* section) {
-  if (handle != 0) return ReadNode(handle, section, completeRead);
+  if (handle != 0) return ReadNode(handle, section, completeRead, 0);
   completeRead.Begin();
   MigrateOldTreeFile();
   handle = RD_BEGIN(TreeFile());
@@ -75,7 +80,7 @@ int BLOG_TREE_NODE::ReadInfo(unsigned long handle, const wchar_t* section) {
     completeRead.Missed(L"the tree file " + TreeFile() + L" cannot be read");
     return 0;
   }
-  const int read = ReadNode(handle, kRootSection, completeRead);
+  const int read = ReadNode(handle, kRootSection, completeRead, 0);
   RD_END(handle);
   if (!read) {
     completeRead.Missed(L"the tree file " + TreeFile() + L" has no tree_node_name");
@@ -86,11 +91,18 @@ int BLOG_TREE_NODE::ReadInfo(unsigned long handle, const wchar_t* section) {
 }
 
 int BLOG_TREE_NODE::ReadNode(unsigned long handle, const wchar_t* section,
-                             navmisc::CompleteReadGuard& guard) {
+                             navmisc::CompleteReadGuard& guard, int depth) {
   name = RD_STRING(handle, section, L"tree_node_name", L"");
   if (name.IsEmpty()) return 0;
+  // Only the entries present are visited, and a count that promises more leaves the read
+  // incomplete.
   const int tripCount = RD_INT(handle, section, L"trip_item_info_count", 0);
-  for (int n = 0; n < tripCount; ++n) {
+  const std::vector<int> tripNumbers = navmisc::KeyIndices(handle, section, L"trip_item_info_(%d)_resource", tripCount);
+  if (static_cast<int>(tripNumbers.size()) < tripCount) {
+    guard.Missed(FormatString(L"the node \"%s\" counts %d trips but names %d", name.c_str(), tripCount,
+                              static_cast<int>(tripNumbers.size())));
+  }
+  for (int n : tripNumbers) {
     const CString id = RD_STRING(handle, section, FormatString(L"trip_item_info_(%d)_resource", n), L"");
     // Only a plain folder name may come from the file; anything else drops out like a trip
     // whose folder is gone.
@@ -110,10 +122,19 @@ int BLOG_TREE_NODE::ReadNode(unsigned long handle, const wchar_t* section,
     trips.AddTail(trip);
   }
   const int childCount = RD_INT(handle, section, L"trip_tree_node_count", 0);
-  for (int n = 0; n < childCount; ++n) {
+  const std::vector<int> childNumbers = navmisc::SectionIndices(handle, L"%s_%d", section, childCount);
+  if (static_cast<int>(childNumbers.size()) < childCount) {
+    guard.Missed(FormatString(L"the node \"%s\" counts %d child nodes but holds %d", name.c_str(), childCount,
+                              static_cast<int>(childNumbers.size())));
+  }
+  for (int n : childNumbers) {
     const CString childSection = FormatString(L"%s_%d", section, n);
+    if (depth >= kMaxDepth) {
+      guard.Missed(L"the tree node " + childSection + L" lies too deep");
+      continue;
+    }
     auto* child = new BLOG_TREE_NODE(nullptr);
-    if (child->ReadNode(handle, childSection, guard) == 1) {
+    if (child->ReadNode(handle, childSection, guard, depth + 1) == 1) {
       children.AddTail(child);
     } else {
       guard.Missed(L"the tree node " + childSection + L" has no name");

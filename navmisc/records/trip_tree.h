@@ -43,6 +43,7 @@ class BLOG_TREE_NODE {
   void _FindAllUsedResource(CStringList& ids);
 
  private:
-  // Reads this node's section; every trip or child that drops out is reported to `guard`.
-  int ReadNode(unsigned long handle, const wchar_t* section, navmisc::CompleteReadGuard& guard);
+  // Reads this node's section, `depth` levels below the root; every trip or child that drops
+  // out is reported to `guard`.
+  int ReadNode(unsigned long handle, const wchar_t* section, navmisc::CompleteReadGuard& guard, int depth);
 };

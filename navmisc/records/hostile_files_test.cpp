@@ -1,0 +1,115 @@
+// Files that a careless tool or an attacker put into the data root: reading them must cost time
+// in proportion to the file and end with a clear result.
+#include <gtest/gtest.h>
+
+#include <string>
+#include <vector>
+
+#include "navmisc/platform/files.h"
+#include "navmisc/records/trip.h"
+#include "navmisc/records/trip_tree.h"
+#include "navmisc/records/user_profile.h"
+#include "record_fixture.h"
+
+using navmisc::Items;
+using navmisc::testutil::FinishesWithin;
+using navmisc::testutil::WriteFileBytes;
+
+namespace {
+
+class HostileFiles : public navmisc::testutil::RecordTest {
+ protected:
+  CString Resource() const { return root_ / L"Resource"; }
+  // Writes `settings` as the settings file of the trip folder `id`.
+  void PutTrip(const wchar_t* id, const std::string& settings) {
+    MakeDir(PathJoin(Resource(), id));
+    WriteFileBytes(PathJoin(PathJoin(Resource(), id), L"BLOG_ITEM_INFO.INI"), settings);
+  }
+};
+
+template <class T, class F>
+std::vector<CString> Texts(CPtrList& list, F field) {
+  std::vector<CString> out;
+  for (T* item : Items<T>(list)) out.push_back(field(*item));
+  return out;
+}
+
+// A count says how many sections to look for; only the sections that exist become entries, so
+// a count of a hundred thousand over a file of a few lines gives those few lines.
+TEST_F(HostileFiles, ListsHoldOnlyTheSectionsPresent) {
+  PutTrip(L"T1",
+          "[SECTION]\ntrip_item_id=T1\nrunner_item_info_count=100000\n"
+          "track_item_info_count=100000\nphoto_item_info_count=100000\n"
+          "[SECTION_RN(0)]\nrunner_id=R0\n[SECTION_RN(7)]\nrunner_id=R7\n"
+          "[SECTION_RN(100000)]\nrunner_id=beyond the count\n"
+          "[SECTION_TK(3)]\ntrack_item_id=TK_3\n"
+          "[SECTION_PH(0)]\nphoto_item_name=p.jpg\n");
+  BLOG_ITEM_INFO trip(GPS_APP_TRIP, L"T1", 0);
+  ASSERT_EQ(trip.ReadInfo(), 1);
+  EXPECT_EQ(Texts<RUNNER_ITEM_INFO>(trip.runners, [](auto& r) { return r.id; }),
+            (std::vector<CString>{L"R0", L"R7"}));
+  EXPECT_EQ(Texts<TRACK_ITEM_INFO>(trip.tracks, [](auto& t) { return t.id; }),
+            std::vector<CString>{L"TK_3"});
+  EXPECT_EQ(Texts<PHOTO_ITEM_INFO>(trip.photos, [](auto& p) { return p.itemName; }),
+            std::vector<CString>{L"p.jpg"});
+
+  MakeDir(PathFolder(g_SportMapInfo.GetProfilePathName()));
+  WriteFileBytes(g_SportMapInfo.GetProfilePathName(),
+                 "[SECTION]\nmarker_item_info_count=100000\nrunner_item_info_count=100000\n"
+                 "weightheight_count=100000\n[SECTION_MKR(2)]\nid=M2\n[SECTION_RUN(0)]\nid=R0\n"
+                 "[SECTION_WH(5)]\ndate=01/02/2024\nweight=70.5\n");
+  g_SportMapInfo.ReadInfo();
+  EXPECT_EQ(Texts<MARKER_ITEM_INFO>(g_SportMapInfo.markers, [](auto& m) { return m.id; }),
+            std::vector<CString>{L"M2"});
+  EXPECT_EQ(Texts<RUNNER_ITEM_INFO>(g_SportMapInfo.runners, [](auto& r) { return r.id; }),
+            std::vector<CString>{L"R0"});
+  ASSERT_EQ(g_SportMapInfo.weightHeights.GetCount(), 1);
+  EXPECT_EQ(static_cast<WEIGHT_HEIGHT_INFO*>(g_SportMapInfo.weightHeights.GetHead())->weight, 70.5);
+}
+
+// The largest count there is, in every list of a trip and of the tree at once, with nested
+// nodes that claim as much: the read still ends at once.
+TEST_F(HostileFiles, LargestCountsCostNothing) {
+  const std::string most = "2147483647";
+  PutTrip(L"T1", "[SECTION]\ntrip_item_id=T1\nrunner_item_info_count=" + most +
+                     "\ntrack_item_info_count=" + most + "\nphoto_item_info_count=" + most +
+                     "\n[SECTION_TK(0)]\ntrack_item_id=TK_0\n");
+  std::string tree = "[SECTION]\ntree_node_name=All\ntrip_item_info_count=" + most +
+                     "\ntrip_item_info_(0)_resource=T1\ntrip_tree_node_count=" + most + "\n";
+  for (const char* node : {"SECTION_0", "SECTION_0_0", "SECTION_5"}) {
+    tree += std::string("[") + node + "]\ntree_node_name=" + node + "\ntrip_item_info_count=" +
+            most + "\ntrip_tree_node_count=" + most + "\n";
+  }
+  WriteFileBytes(Resource() + L"/RESOURCE_INFO.INI", tree);
+
+  auto read = [] {
+    BLOG_TREE_NODE root(nullptr);
+    root.ReadInfo(0, nullptr);
+  };
+  ASSERT_TRUE(FinishesWithin(60, read)) << "reading must not walk the counts";
+
+  BLOG_TREE_NODE root(nullptr);
+  ASSERT_EQ(root.ReadInfo(0, nullptr), 1);
+  ASSERT_EQ(root.trips.GetCount(), 1);
+  EXPECT_EQ(static_cast<BLOG_ITEM_INFO*>(root.trips.GetHead())->tracks.GetCount(), 1);
+  ASSERT_EQ(root.children.GetCount(), 2);
+  EXPECT_EQ(static_cast<BLOG_TREE_NODE*>(root.children.GetTail())->name, L"SECTION_5");
+  EXPECT_EQ(static_cast<BLOG_TREE_NODE*>(root.children.GetHead())->children.GetCount(), 1);
+  EXPECT_FALSE(root.completeRead.IsComplete()) << "the counts promise entries that are missing";
+
+  // A chain of nodes deeper than any folder tree stops where the stack is still safe.
+  std::string chain;
+  std::string section = "SECTION";
+  for (int depth = 0; depth < 400; ++depth, section += "_0")
+    chain += "[" + section + "]\ntree_node_name=n\ntrip_tree_node_count=1\n";
+  WriteFileBytes(Resource() + L"/RESOURCE_INFO.INI", chain);
+  BLOG_TREE_NODE deep(nullptr);
+  ASSERT_EQ(deep.ReadInfo(0, nullptr), 1);
+  int levels = 0;
+  for (BLOG_TREE_NODE* n = &deep; !n->children.IsEmpty(); ++levels)
+    n = static_cast<BLOG_TREE_NODE*>(n->children.GetHead());
+  EXPECT_EQ(levels, 256);
+  EXPECT_NE(deep.completeRead.Why().Find(L"too deep"), -1) << deep.completeRead.Why().ToUtf8();
+}
+
+}  // namespace
