@@ -147,6 +147,55 @@ std::string NativePath(const wchar_t* path) {
   return CString(path).ToUtf8();
 }
 
+namespace {
+thread_local std::string t_refusal;
+
+const char* KindOf(mode_t mode) {
+  if (S_ISFIFO(mode)) return "a named pipe";
+  if (S_ISCHR(mode)) return "a character device";
+  if (S_ISBLK(mode)) return "a block device";
+  if (S_ISSOCK(mode)) return "a socket";
+  if (S_ISDIR(mode)) return "a folder";
+  return "not a plain file";
+}
+
+bool RefuseUnlessRegular(const std::string& path, const struct stat& st) {
+  if (S_ISREG(st.st_mode)) return false;
+  NoteFileRefusal(path + " is " + KindOf(st.st_mode) + ", not a regular file");
+  return true;
+}
+}  // namespace
+
+std::string LastFileRefusal() { return t_refusal; }
+void ClearFileRefusal() { t_refusal.clear(); }
+void NoteFileRefusal(std::string why) { t_refusal = std::move(why); }
+
+int OpenRegularFile(const std::string& path, bool followLink) {
+  if (path.empty()) {
+    errno = ENOENT;
+    return -1;
+  }
+  // Opening a device can itself have effects, so its kind is looked at first; the check on the
+  // open descriptor then covers a swap in between, and O_NONBLOCK keeps that open of a pipe
+  // from waiting for a writer.
+  struct stat st;
+  const int looked = followLink ? ::stat(path.c_str(), &st) : ::lstat(path.c_str(), &st);
+  if (looked == 0 && !S_ISLNK(st.st_mode) && RefuseUnlessRegular(path, st)) {
+    errno = EINVAL;
+    return -1;
+  }
+  Fd fd(::open(path.c_str(), O_RDONLY | O_NONBLOCK | O_NOCTTY | O_CLOEXEC | (followLink ? 0 : O_NOFOLLOW)));
+  if (!fd.ok()) return -1;
+  if (::fstat(fd.get(), &st) != 0) return -1;
+  if (RefuseUnlessRegular(path, st)) {
+    errno = EINVAL;
+    return -1;
+  }
+  const int flags = ::fcntl(fd.get(), F_GETFL);
+  if (flags >= 0) ::fcntl(fd.get(), F_SETFL, flags & ~O_NONBLOCK);
+  return fd.release();
+}
+
 }  // namespace navmisc
 
 using navmisc::NativePath;
@@ -206,10 +255,10 @@ bool CopyFile(const wchar_t* from, const wchar_t* to, bool failIfExists) {
   std::string src = NativePath(from);
   std::string dst = NativePath(to);
   if (src.empty() || dst.empty()) return false;
-  Fd in(::open(src.c_str(), O_RDONLY | O_CLOEXEC));
+  Fd in(navmisc::OpenRegularFile(src));
   if (!in.ok()) return false;
   struct stat sst;
-  if (::fstat(in.get(), &sst) != 0 || !S_ISREG(sst.st_mode)) return false;
+  if (::fstat(in.get(), &sst) != 0) return false;
   struct stat dst_st;
   if (::stat(dst.c_str(), &dst_st) == 0) {
     if (failIfExists) return false;

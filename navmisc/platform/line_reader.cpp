@@ -18,7 +18,8 @@ LineReader::~LineReader() { Close(); }
 
 bool LineReader::Open(const wchar_t* path) {
   Close();
-  fd_ = ::open(NativePath(path).c_str(), O_RDONLY | O_CLOEXEC);
+  // Only a regular file: a pipe would block, a device such as /dev/zero would never end.
+  fd_ = OpenRegularFile(NativePath(path));
   if (fd_ < 0) return false;
   buf_.resize(kBufferSize);
   begin_ = end_ = 0;

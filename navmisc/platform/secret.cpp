@@ -51,7 +51,7 @@ std::optional<Key> LoadKey(bool create) {
   const std::string path = NativePath(SecretKeyPath());
   Key key;
   for (int attempt = 0; attempt < 2; ++attempt) {
-    Fd in(::open(path.c_str(), O_RDONLY | O_NOFOLLOW | O_CLOEXEC));
+    Fd in(OpenRegularFile(path, /*followLink=*/false));
     if (in.get() >= 0) {
       if (ReadAll(in.get(), key.data(), key.size())) return key;
       return std::nullopt;  // a damaged key file is never replaced: that would lose the secret

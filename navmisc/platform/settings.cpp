@@ -368,10 +368,8 @@ class Loader {
 // Reads and indexes the file. False when it cannot be opened or read, or is not a regular file
 // (a pipe or a device could block or never end).
 bool LoadFile(const std::string& path, Document& doc) {
-  Fd fd(::open(path.c_str(), O_RDONLY | O_CLOEXEC));
+  Fd fd(navmisc::OpenRegularFile(path));
   if (fd.get() < 0) return false;
-  struct stat st;
-  if (::fstat(fd.get(), &st) != 0 || !S_ISREG(st.st_mode)) return false;
 
   Loader loader(doc);
   std::string chunk(kReadChunk, '\0');

@@ -22,16 +22,14 @@ std::string SystemError(int err) {
 // libzip reads added files only when the archive is written. Opening the file now turns a
 // missing or unreadable file into an error of its own addition rather than of the close.
 bool CheckReadable(const std::string& native, std::string& error) {
-  const int fd = ::open(native.c_str(), O_RDONLY | O_CLOEXEC);
+  ClearFileRefusal();
+  const int fd = OpenRegularFile(native);
   if (fd < 0) {
-    error = SystemError(errno);
+    error = LastFileRefusal().empty() ? SystemError(errno) : "not a regular file";
     return false;
   }
-  struct stat st;
-  const bool regular = ::fstat(fd, &st) == 0 && S_ISREG(st.st_mode);
   ::close(fd);
-  if (!regular) error = "not a regular file";
-  return regular;
+  return true;
 }
 
 }  // namespace

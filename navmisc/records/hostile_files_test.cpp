@@ -1,6 +1,8 @@
 // Files that a careless tool or an attacker put into the data root: reading them must cost time
 // in proportion to the file and end with a clear result.
 #include <gtest/gtest.h>
+#include <sys/stat.h>
+#include <unistd.h>
 
 #include <string>
 #include <vector>
@@ -110,6 +112,65 @@ TEST_F(HostileFiles, LargestCountsCostNothing) {
     n = static_cast<BLOG_TREE_NODE*>(n->children.GetHead());
   EXPECT_EQ(levels, 256);
   EXPECT_NE(deep.completeRead.Why().Find(L"too deep"), -1) << deep.completeRead.Why().ToUtf8();
+}
+
+// Named pipes and devices in place of settings or point files: a read neither blocks nor runs
+// forever, the file counts as missing, and the reason can be told to the user.
+TEST_F(HostileFiles, PipesAndDevicesReadAsMissing) {
+  PutTrip(L"T1", "[SECTION]\ntrip_item_id=T1\ntrack_item_info_count=3\n"
+                 "[SECTION_TK(0)]\ntrack_item_id=TK_FIFO\n[SECTION_TK(1)]\ntrack_item_id=TK_ZERO\n"
+                 "[SECTION_TK(2)]\ntrack_item_id=TK_OK\n");
+  const CString folder = Resource() + L"/T1";
+  WriteFileBytes(folder + L"/TK_OK.BIN", "1000,47.1,8.5,400.0,0,0,-1,0,0\r\n");
+  auto fifo = [](const CString& path) { ASSERT_EQ(mkfifo(navmisc::NativePath(path).c_str(), 0600), 0); };
+  fifo(folder + L"/TK_FIFO.BIN");
+  fifo(folder + L"/TK_OK.HR");
+  ASSERT_EQ(symlink("/dev/zero", navmisc::NativePath(folder + L"/TK_ZERO.BIN").c_str()), 0);
+  PutTrip(L"T2", "");
+  ::unlink(navmisc::NativePath(Resource() + L"/T2/BLOG_ITEM_INFO.INI").c_str());
+  fifo(Resource() + L"/T2/BLOG_ITEM_INFO.INI");
+  fifo(Resource() + L"/RESOURCE_INFO.INI");
+  MakeDir(PathFolder(g_SportMapInfo.GetProfilePathName()));
+  fifo(g_SportMapInfo.GetProfilePathName());
+  fifo(USER_MAP_INFO::GetSuiteSettingsPathName());
+
+  auto readAll = [] {
+    BLOG_ITEM_INFO trip(GPS_APP_TRIP, L"T1", 0);
+    trip.ReadInfo();
+    trip.ReadAllWaypoint(1);
+    BLOG_ITEM_INFO copy(&trip, nullptr, 0);  // copies the point files
+    BLOG_ITEM_INFO(GPS_APP_TRIP, L"T2", 0).ReadInfo();
+    BLOG_TREE_NODE(nullptr).ReadInfo(0, nullptr);
+    g_SportMapInfo.ReadInfo();
+  };
+  ASSERT_TRUE(FinishesWithin(60, readAll)) << "a read blocked or did not end";
+
+  BLOG_ITEM_INFO trip(GPS_APP_TRIP, L"T1", 0);
+  ASSERT_EQ(trip.ReadInfo(), 1);
+  trip.ReadAllWaypoint(1);
+  ASSERT_EQ(trip.tracks.GetCount(), 1) << "the tracks without a readable point file drop out";
+  auto* kept = static_cast<TRACK_ITEM_INFO*>(trip.tracks.GetHead());
+  EXPECT_EQ(kept->id, L"TK_OK");
+  EXPECT_TRUE(kept->heartRates.IsEmpty());
+  EXPECT_NE(navmisc::LastFileRefusal().find("TK_OK.HR is a named pipe"), std::string::npos)
+      << navmisc::LastFileRefusal();
+
+  BLOG_ITEM_INFO copy(&trip, nullptr, 0);
+  EXPECT_FALSE(FileExists(PathJoin(copy.GetResourcePath(), static_cast<TRACK_ITEM_INFO*>(copy.tracks.GetHead())->id + L".HR")));
+
+  trip.tracks.AddTail(new TRACK_ITEM_INFO(&trip));
+  static_cast<TRACK_ITEM_INFO*>(trip.tracks.GetTail())->id = L"TK_ZERO";
+  trip.ReadAllWaypoint(1);
+  EXPECT_EQ(trip.tracks.GetCount(), 1);
+  EXPECT_NE(navmisc::LastFileRefusal().find("TK_ZERO.BIN is a character device"), std::string::npos)
+      << navmisc::LastFileRefusal();
+
+  EXPECT_EQ(BLOG_ITEM_INFO(GPS_APP_TRIP, L"T2", 0).ReadInfo(), 0);
+  BLOG_TREE_NODE tree(nullptr);
+  EXPECT_EQ(tree.ReadInfo(0, nullptr), 0);
+  EXPECT_NE(navmisc::LastFileRefusal().find("RESOURCE_INFO.INI is a named pipe"), std::string::npos);
+  g_SportMapInfo.ReadInfo();
+  EXPECT_EQ(g_SportMapInfo.localize, L"ENG") << "a profile that cannot be read reads as defaults";
 }
 
 }  // namespace

@@ -87,11 +87,13 @@ std::string DataRoot() { return CString(g_szAppDataPath).ToUtf8(); }
 std::unique_ptr<BLOG_ITEM_INFO> OpenTrip(const std::string& id) {
   const CString wid = CString::FromUtf8(id);
   if (!IsPlainPathComponent(wid)) Fail("'" + id + "' is not a trip id");
+  ClearFileRefusal();
   for (GPS_APP_PROG_TYPE type : {GPS_APP_TRIP, GPS_APP_SPORT, GPS_APP_TRACKER}) {
     auto trip = std::make_unique<BLOG_ITEM_INFO>(type, wid, 0);
     if (FileExists(trip->GetBlogItemProfilePathName()) && trip->ReadInfo() == 1) return trip;
   }
-  Fail("no trip '" + id + "' under " + DataRoot() + " (see navmisc trips)");
+  const std::string refused = LastFileRefusal();
+  Fail("no trip '" + id + "' under " + DataRoot() + (refused.empty() ? " (see navmisc trips)" : ": " + refused));
 }
 
 bool RunWithProgress(const std::string& label, int total, int& counter, bool& keepGoing,

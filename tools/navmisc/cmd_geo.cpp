@@ -68,7 +68,8 @@ LevelCounts CountLevels(TRACK_ITEM_INFO& track) {
 std::unique_ptr<BLOG_ITEM_INFO> OpenTripWithPoints(const std::string& id) {
   auto trip = OpenTrip(id);
   trip->ReadAllWaypoint(0);
-  if (trip->tracks.IsEmpty()) Fail("trip '" + id + "' has no track points");
+  const std::string refused = LastFileRefusal();
+  if (trip->tracks.IsEmpty()) Fail("trip '" + id + "' has no track points" + (refused.empty() ? "" : ": " + refused));
   return trip;
 }
 

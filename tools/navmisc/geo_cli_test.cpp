@@ -1,5 +1,7 @@
 // navmisc optimize, plot and place, run as a user runs them.
 #include <gtest/gtest.h>
+#include <sys/stat.h>
+#include <unistd.h>
 
 #include <cstdlib>
 #include <string>
@@ -128,6 +130,18 @@ TEST_F(GeoCommands, PlaceAnswersByTimeOrPositionAndErrorsSayWhy) {
     EXPECT_EQ(r.status, c.status) << c.args << "\n" << r.out;
     EXPECT_NE(r.out.find(c.shows), std::string::npos) << c.args << "\n" << r.out;
   }
+}
+
+TEST_F(GeoCommands, OptimizeSaysWhichFileItCannotRead) {
+  auto trip = Load();
+  for (auto* track : navmisc::Items<TRACK_ITEM_INFO>(trip->tracks)) {
+    const std::string bin = navmisc::NativePath(track->GetFilePathName());
+    ASSERT_EQ(unlink(bin.c_str()), 0);
+    ASSERT_EQ(mkfifo(bin.c_str(), 0600), 0);
+  }
+  const CommandResult r = RunTool("optimize GEOTRIP");
+  EXPECT_EQ(r.status, 1) << r.out;
+  EXPECT_NE(r.out.find(".BIN is a named pipe, not a regular file"), std::string::npos) << r.out;
 }
 
 }  // namespace
