@@ -1,15 +1,21 @@
 #include "navmisc/platform/atomic_file.h"
 
+#include <dirent.h>
 #include <fcntl.h>
 #include <limits.h>
 #include <stdlib.h>
+#include <sys/file.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
 #include <algorithm>
 #include <atomic>
 #include <cerrno>
+#include <cstring>
+#include <vector>
 
+#include "navmisc/platform/data_root.h"
+#include "navmisc/platform/detail/unique_fd.h"
 #include "navmisc/platform/files.h"
 
 namespace navmisc {
@@ -80,7 +86,8 @@ std::string FolderOf(const std::string& path) {
 }
 
 // The file that actually gets replaced: a symbolic link is followed, so that the link stays a
-// link and the file it names receives the new content.
+// link and the file it names receives the new content. (Only links that stay in the data root
+// get here.)
 std::string ResolveTarget(const std::string& path) {
   struct stat st;
   if (::lstat(path.c_str(), &st) == 0 && S_ISLNK(st.st_mode)) {
@@ -88,6 +95,59 @@ std::string ResolveTarget(const std::string& path) {
     if (::realpath(path.c_str(), resolved)) return resolved;
   }
   return path;
+}
+
+std::string ErrorText(int err) {
+  char buf[256];
+  return strerror_r(err, buf, sizeof buf);
+}
+
+// The temporary files of a target are ".<name>.tmp-" and six characters of mkstemp.
+constexpr char kTempMark[] = ".tmp-";
+constexpr size_t kTempSuffix = 6;
+std::string TempPrefix(const std::string& name) { return "." + name.substr(0, 200) + kTempMark; }
+
+// Removes the temporary files that earlier saves of the file `name` in `folder` left behind when
+// they were killed. A save in progress holds a lock on its temporary file (the kernel drops it
+// when the process dies), so only the files nobody holds go.
+void SweepLeftovers(const std::string& folder, const std::string& name) {
+  const std::string prefix = TempPrefix(name);
+  DIR* dir = ::opendir(folder.c_str());
+  if (!dir) return;
+  const int dirfd = ::dirfd(dir);
+  std::vector<std::string> found;
+  while (struct dirent* e = ::readdir(dir)) {
+    const std::string_view entry = e->d_name;
+    if (entry.size() == prefix.size() + kTempSuffix && entry.starts_with(prefix)) found.emplace_back(entry);
+  }
+  for (const std::string& entry : found) {
+    navmisc::detail::UniqueFd fd(::openat(dirfd, entry.c_str(), O_RDONLY | O_NOFOLLOW | O_NONBLOCK | O_CLOEXEC));
+    struct stat st;
+    if (!fd.ok() || ::fstat(fd.get(), &st) != 0 || !S_ISREG(st.st_mode)) continue;
+    if (::flock(fd.get(), LOCK_EX | LOCK_NB) == 0) ::unlinkat(dirfd, entry.c_str(), 0);
+  }
+  ::closedir(dir);
+}
+
+// Creates the locked temporary file for `target`: its descriptor, -1 on failure (errno set).
+int CreateLockedTemp(const std::string& target, std::string& temp) {
+  const size_t slash = target.rfind('/');
+  const size_t name_start = slash == std::string::npos ? 0 : slash + 1;
+  for (int attempt = 0; attempt < 3; ++attempt) {
+    temp = target.substr(0, name_start) + TempPrefix(target.substr(name_start)) + "XXXXXX";
+    const int fd = ::mkostemp(temp.data(), O_CLOEXEC);
+    if (fd < 0) return -1;
+    // Between the creation and the lock another save's sweep may have taken the file away; the
+    // name must still lead to this very file.
+    struct stat mine, named;
+    if (::flock(fd, LOCK_EX | LOCK_NB) == 0 && ::fstat(fd, &mine) == 0 &&
+        ::lstat(temp.c_str(), &named) == 0 && mine.st_ino == named.st_ino && mine.st_dev == named.st_dev) {
+      return fd;
+    }
+    RetryClose(fd);
+  }
+  errno = EAGAIN;
+  return -1;
 }
 
 }  // namespace
@@ -102,19 +162,22 @@ AtomicFile::~AtomicFile() { Abandon(); }
 
 bool AtomicFile::Open(const wchar_t* path) {
   Abandon();
-  if (!path || !*path) return false;
-  target_ = ResolveTarget(NativePath(path));
-  if (target_.empty() || target_.back() == '/') return false;
+  error_.clear();
+  const std::string native = NativePath(path);
+  if (native.empty() || native.back() == '/') return Failed("no file name", ENOENT);
+  if (!StaysInDataRoot(native, true)) {
+    error_ = LastFileRefusal();
+    return false;
+  }
+  target_ = ResolveTarget(native);
 
   // The temporary file sits in the target's folder so that the final rename never crosses a
-  // file system; the leading dot keeps it out of ordinary listings.
-  // The name part is shortened so that the temporary name stays within NAME_MAX.
-  const size_t slash = target_.rfind('/');
-  const size_t name_start = slash == std::string::npos ? 0 : slash + 1;
-  std::string temp = target_.substr(0, name_start) + "." +
-                     target_.substr(name_start, 200) + ".tmp-XXXXXX";
-  const int fd = ::mkostemp(temp.data(), O_CLOEXEC);
-  if (fd < 0) return false;
+  // file system; the leading dot keeps it out of ordinary listings, and the name part is
+  // shortened so that the temporary name stays within NAME_MAX.
+  SweepLeftovers(FolderOf(target_), target_.substr(target_.rfind('/') + 1));
+  std::string temp;
+  const int fd = CreateLockedTemp(target_, temp);
+  if (fd < 0) return Failed("cannot create a temporary file beside " + target_, errno);
 
   // mkostemp creates 0600; a replaced file keeps its permission bits, a new one gets the usual
   // 0644.
@@ -122,9 +185,10 @@ bool AtomicFile::Open(const wchar_t* path) {
   const mode_t mode = (::stat(target_.c_str(), &st) == 0 && S_ISREG(st.st_mode)) ? (st.st_mode & 07777)
                                                                                  : kNewFileMode;
   if (::fchmod(fd, mode) != 0) {
+    const int err = errno;
     RetryClose(fd);
     ::unlink(temp.c_str());
-    return false;
+    return Failed("cannot set the mode of " + temp, err);
   }
   fd_ = fd;
   temp_ = std::move(temp);
@@ -133,6 +197,11 @@ bool AtomicFile::Open(const wchar_t* path) {
   buffer_.clear();
   buffer_.reserve(kBufferSize);
   return true;
+}
+
+bool AtomicFile::Failed(const std::string& what, int err) {
+  if (error_.empty()) error_ = what + ": " + ErrorText(err);
+  return false;
 }
 
 bool AtomicFile::Write(std::string_view bytes) {
@@ -145,7 +214,7 @@ bool AtomicFile::Write(std::string_view bytes) {
   if (!Flush()) return false;
   if (bytes.size() >= kBufferSize) {
     // A large block goes straight to the file rather than through the buffer.
-    if (!WriteAll(fd_, bytes.data(), bytes.size())) failed_ = true;
+    if (!WriteAll(fd_, bytes.data(), bytes.size())) WriteFailed();
     written_ += static_cast<off_t>(bytes.size());
     StartWriteback();
     return !failed_;
@@ -157,7 +226,7 @@ bool AtomicFile::Write(std::string_view bytes) {
 bool AtomicFile::Flush() {
   if (fd_ < 0 || failed_) return false;
   if (!buffer_.empty()) {
-    if (!WriteAll(fd_, buffer_.data(), buffer_.size())) failed_ = true;
+    if (!WriteAll(fd_, buffer_.data(), buffer_.size())) WriteFailed();
     written_ += static_cast<off_t>(buffer_.size());
     buffer_.clear();
     StartWriteback();
@@ -172,15 +241,21 @@ void AtomicFile::StartWriteback() {
   writtenBack_ = written_;
 }
 
+void AtomicFile::WriteFailed() {
+  Failed("cannot write " + target_, errno);
+  failed_ = true;
+}
+
 bool AtomicFile::Commit() {
-  if (fd_ < 0) return false;
+  if (fd_ < 0) return Failed("nothing to commit", EBADF);
   // The data must be on disk before the rename makes it visible, or a crash could leave the
   // target name pointing at an empty or partial file.
-  bool ok = Flush() && FsyncRetry(fd_);
+  bool ok = Flush();
+  if (ok && !FsyncRetry(fd_)) ok = Failed("cannot write " + target_, errno);
   const int fd = fd_;
   fd_ = -1;
-  if (RetryClose(fd) != 0) ok = false;
-  if (ok && ::rename(temp_.c_str(), target_.c_str()) != 0) ok = false;
+  if (RetryClose(fd) != 0 && ok) ok = Failed("cannot write " + target_, errno);
+  if (ok && ::rename(temp_.c_str(), target_.c_str()) != 0) ok = Failed("cannot replace " + target_, errno);
   if (!ok) {
     ::unlink(temp_.c_str());
     temp_.clear();

@@ -15,6 +15,7 @@
 #include <string_view>
 #include <vector>
 
+#include "navmisc/platform/data_root.h"
 #include "navmisc/platform/detail/unique_fd.h"
 
 namespace {
@@ -184,6 +185,10 @@ int OpenRegularFile(const std::string& path, bool followLink) {
     errno = EINVAL;
     return -1;
   }
+  if (!StaysInDataRoot(path, followLink)) {
+    errno = EACCES;
+    return -1;
+  }
   Fd fd(::open(path.c_str(), O_RDONLY | O_NONBLOCK | O_NOCTTY | O_CLOEXEC | (followLink ? 0 : O_NOFOLLOW)));
   if (!fd.ok()) return -1;
   if (::fstat(fd.get(), &st) != 0) return -1;
@@ -202,7 +207,7 @@ using navmisc::NativePath;
 
 bool MakeDir(const wchar_t* path) {
   std::string p = StripTrailingSeparators(NativePath(path));
-  if (p.empty()) return false;
+  if (p.empty() || !navmisc::StaysInDataRoot(p, true)) return false;
   struct stat st;
   if (::stat(p.c_str(), &st) == 0) return S_ISDIR(st.st_mode);
   // Create each level in turn. Failures are not decisive on their own: a level may exist
@@ -218,7 +223,7 @@ bool MakeDir(const wchar_t* path) {
 
 bool RemoveDir(const wchar_t* path, const wchar_t* pattern) {
   std::string p = StripTrailingSeparators(NativePath(path));
-  if (p.empty() || p == "/") return false;
+  if (p.empty() || p == "/" || !navmisc::StaysInDataRoot(p, false)) return false;
   {
     Fd dir(::open(p.c_str(), O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC));
     if (!dir.ok()) {
@@ -254,7 +259,7 @@ int GetContent(const wchar_t* folder, const wchar_t* pattern, CStringList& names
 bool CopyFile(const wchar_t* from, const wchar_t* to, bool failIfExists) {
   std::string src = NativePath(from);
   std::string dst = NativePath(to);
-  if (src.empty() || dst.empty()) return false;
+  if (src.empty() || dst.empty() || !navmisc::StaysInDataRoot(dst, true)) return false;
   Fd in(navmisc::OpenRegularFile(src));
   if (!in.ok()) return false;
   struct stat sst;
@@ -298,7 +303,7 @@ bool CopyFile(const wchar_t* from, const wchar_t* to, bool failIfExists) {
 
 bool DeleteFile(const wchar_t* path) {
   std::string p = NativePath(path);
-  return !p.empty() && ::unlink(p.c_str()) == 0;
+  return !p.empty() && navmisc::StaysInDataRoot(p, false) && ::unlink(p.c_str()) == 0;
 }
 
 int PathStatus(const wchar_t* path) {
@@ -326,8 +331,10 @@ bool IsDirectory(const wchar_t* path) {
 bool SetFileNormal(const wchar_t* path) {
   std::string p = NativePath(path);
   struct stat st;
-  if (p.empty() || ::stat(p.c_str(), &st) != 0) return false;
-  if (st.st_mode & S_IWUSR) return true;
+  if (p.empty() || ::lstat(p.c_str(), &st) != 0) return false;
+  // A link has no mode of its own, and the file it names is not the caller's to change.
+  if (S_ISLNK(st.st_mode) || (st.st_mode & S_IWUSR)) return true;
+  if (!navmisc::StaysInDataRoot(p, false)) return false;
   return ::chmod(p.c_str(), (st.st_mode & 07777) | S_IWUSR) == 0;
 }
 

@@ -1,6 +1,8 @@
 // Files that a careless tool or an attacker put into the data root: reading them must cost time
 // in proportion to the file and end with a clear result.
 #include <gtest/gtest.h>
+#include <fcntl.h>
+#include <sys/file.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
@@ -15,6 +17,8 @@
 
 using navmisc::Items;
 using navmisc::testutil::FinishesWithin;
+using navmisc::testutil::ReadFileBytes;
+using navmisc::testutil::TempDir;
 using navmisc::testutil::WriteFileBytes;
 
 namespace {
@@ -28,6 +32,16 @@ class HostileFiles : public navmisc::testutil::RecordTest {
     WriteFileBytes(PathJoin(PathJoin(Resource(), id), L"BLOG_ITEM_INFO.INI"), settings);
   }
 };
+
+void Link(const CString& target, const CString& link) {
+  ::unlink(navmisc::NativePath(link).c_str());
+  ASSERT_EQ(symlink(navmisc::NativePath(target).c_str(), navmisc::NativePath(link).c_str()), 0);
+}
+
+int Mode(const CString& path) {
+  struct stat st;
+  return stat(navmisc::NativePath(path).c_str(), &st) == 0 ? static_cast<int>(st.st_mode & 07777) : -1;
+}
 
 template <class T, class F>
 std::vector<CString> Texts(CPtrList& list, F field) {
@@ -171,6 +185,83 @@ TEST_F(HostileFiles, PipesAndDevicesReadAsMissing) {
   EXPECT_NE(navmisc::LastFileRefusal().find("RESOURCE_INFO.INI is a named pipe"), std::string::npos);
   g_SportMapInfo.ReadInfo();
   EXPECT_EQ(g_SportMapInfo.localize, L"ENG") << "a profile that cannot be read reads as defaults";
+}
+
+// Links placed in the data root that lead out of it: no write, copy, rename, delete or change of
+// mode goes through them, while links that stay inside keep working.
+TEST_F(HostileFiles, LinksOutOfTheDataRootAreNeverFollowed) {
+  TempDir outside;
+  for (const wchar_t* name : {L"bin", L"ini", L"tree", L"old", L"photo"}) WriteFileBytes(outside / name, "precious");
+  ASSERT_EQ(chmod(navmisc::NativePath(outside / L"old").c_str(), 0400), 0);
+
+  // A saved trip whose point file, settings file and photo are links to files outside.
+  BLOG_ITEM_INFO trip(GPS_APP_TRIP, nullptr, 0);
+  auto* track = new TRACK_ITEM_INFO(&trip);
+  track->points.AddTail(navmisc::testutil::NewPoint(1000, 47.1, 8.5));
+  trip.tracks.AddTail(track);
+  auto* photo = new PHOTO_ITEM_INFO(&trip, L"", L"", L"");
+  photo->itemName = L"p.jpg";
+  trip.photos.AddTail(photo);
+  Link(outside / L"bin", track->GetFilePathName());
+  Link(outside / L"ini", trip.GetBlogItemProfilePathName());
+  Link(outside / L"photo", photo->GetFilePathName());
+  trip.WriteAllWaypoint(1, nullptr, nullptr);
+  trip.WriteInfo(1, nullptr, nullptr);
+  BLOG_ITEM_INFO copy(&trip, nullptr, 0);  // copies the point file and the photo
+  EXPECT_NE(ReadFileBytes(static_cast<TRACK_ITEM_INFO*>(copy.tracks.GetHead())->GetFilePathName()), "precious");
+  EXPECT_NE(ReadFileBytes(PathJoin(copy.GetResourcePath(), L"p.jpg")), "precious");
+  EXPECT_NE(navmisc::LastFileRefusal().find("leads outside the data root"), std::string::npos)
+      << navmisc::LastFileRefusal();
+
+  // The tree file linked outside, with an old-format tree beside it that is a link too: reading
+  // the tree (a read-only listing) must neither copy over nor chmod anything outside.
+  Link(outside / L"tree", Resource() + L"/RESOURCE_INFO.INI");
+  Link(outside / L"old", Resource() + L"/AMBRO_V20.INI");
+  BLOG_TREE_NODE tree(nullptr);
+  tree.ReadInfo(0, nullptr);
+  tree.name = L"All";
+  tree.WriteInfo(false, 0, nullptr);
+
+  // A trip folder that is itself a link to a folder outside.
+  Link(outside.path(), Resource() + L"/T9");
+  BLOG_ITEM_INFO linkedFolder(GPS_APP_TRIP, L"T9", 0);
+  linkedFolder.WriteInfo(1, nullptr, nullptr);
+  EXPECT_FALSE(FileExists(outside / L"BLOG_ITEM_INFO.INI"));
+
+  for (const wchar_t* name : {L"bin", L"ini", L"tree", L"old", L"photo"}) {
+    EXPECT_EQ(ReadFileBytes(outside / name), "precious") << CString(name).ToUtf8();
+  }
+  EXPECT_EQ(Mode(outside / L"old"), 0400);
+
+  // A link that stays inside the data root is followed as before.
+  BLOG_ITEM_INFO other(GPS_APP_TRIP, nullptr, 0);
+  const CString otherBin = PathJoin(other.GetResourcePath(), L"TK_OTHER.BIN");
+  WriteFileBytes(otherBin, "");
+  Link(otherBin, track->GetFilePathName());
+  trip.WriteAllWaypoint(1, nullptr, nullptr);
+  EXPECT_EQ(ReadFileBytes(otherBin).rfind("1000,", 0), 0u);
+}
+
+// A save killed half-way leaves its temporary file beside the target; the next save of that file
+// removes it, unless a live save still holds it.
+TEST_F(HostileFiles, LeftoverTemporaryFilesGoWithTheNextSave) {
+  BLOG_ITEM_INFO trip(GPS_APP_TRIP, nullptr, 0);
+  const CString folder = trip.GetResourcePath();
+  const CString killed = folder + L"/.BLOG_ITEM_INFO.INI.tmp-AbC123";
+  const CString live = folder + L"/.BLOG_ITEM_INFO.INI.tmp-LiVe99";
+  const CString otherFile = folder + L"/.MAP_PROFILE.INI.tmp-XyZ789";
+  for (const CString& path : {killed, live, otherFile}) WriteFileBytes(path, "half");
+  const int held = ::open(navmisc::NativePath(live).c_str(), O_RDONLY | O_CLOEXEC);
+  ASSERT_GE(held, 0);
+  ASSERT_EQ(flock(held, LOCK_EX), 0);  // as a save in progress holds its file
+
+  trip.WriteInfo(1, nullptr, nullptr);
+  EXPECT_FALSE(FileExists(killed));
+  EXPECT_TRUE(FileExists(live));
+  EXPECT_TRUE(FileExists(otherFile)) << "only the saved file's leftovers go";
+  ::close(held);
+  trip.WriteInfo(1, nullptr, nullptr);
+  EXPECT_FALSE(FileExists(live));
 }
 
 }  // namespace
