@@ -15,7 +15,9 @@
 #include <vector>
 
 #include "navmisc/platform/data_root.h"
+#include "navmisc/platform/detail/temp_files.h"
 #include "navmisc/platform/detail/unique_fd.h"
+#include "navmisc/platform/file_transaction.h"
 #include "navmisc/platform/files.h"
 
 namespace navmisc {
@@ -32,6 +34,10 @@ constexpr off_t kWritebackChunk = 8 << 20;
 
 // Bytes that may still be written before the injected fault; negative = no fault.
 std::atomic<long long> g_write_budget{-1};
+// Renames that may still succeed before the injected fault; negative = no fault.
+std::atomic<int> g_rename_budget{-1};
+
+
 
 // How many of `wanted` bytes the fault injection lets through (all of them when it is off).
 size_t TakeWriteBudget(size_t wanted) {
@@ -103,15 +109,14 @@ std::string ErrorText(int err) {
 }
 
 // The temporary files of a target are ".<name>.tmp-" and six characters of mkstemp.
-constexpr char kTempMark[] = ".tmp-";
 constexpr size_t kTempSuffix = 6;
-std::string TempPrefix(const std::string& name) { return "." + name.substr(0, 200) + kTempMark; }
+using detail::TempFilePrefix;
 
 // Removes the temporary files that earlier saves of the file `name` in `folder` left behind when
 // they were killed. A save in progress holds a lock on its temporary file (the kernel drops it
 // when the process dies), so only the files nobody holds go.
 void SweepLeftovers(const std::string& folder, const std::string& name) {
-  const std::string prefix = TempPrefix(name);
+  const std::string prefix = TempFilePrefix(name);
   DIR* dir = ::opendir(folder.c_str());
   if (!dir) return;
   const int dirfd = ::dirfd(dir);
@@ -134,7 +139,7 @@ int CreateLockedTemp(const std::string& target, std::string& temp) {
   const size_t slash = target.rfind('/');
   const size_t name_start = slash == std::string::npos ? 0 : slash + 1;
   for (int attempt = 0; attempt < 3; ++attempt) {
-    temp = target.substr(0, name_start) + TempPrefix(target.substr(name_start)) + "XXXXXX";
+    temp = target.substr(0, name_start) + TempFilePrefix(target.substr(name_start)) + "XXXXXX";
     const int fd = ::mkostemp(temp.data(), O_CLOEXEC);
     if (fd < 0) return -1;
     // Between the creation and the lock another save's sweep may have taken the file away; the
@@ -152,9 +157,30 @@ int CreateLockedTemp(const std::string& target, std::string& temp) {
 
 }  // namespace
 
+namespace detail {
+
+std::string TempFilePrefix(const std::string& name) { return "." + name.substr(0, 200) + ".tmp-"; }
+
+int RenameIntoPlace(const std::string& from, const std::string& to) {
+  int budget = g_rename_budget.load(std::memory_order_relaxed);
+  while (budget >= 0) {
+    if (budget == 0) {
+      errno = EIO;
+      return -1;
+    }
+    if (g_rename_budget.compare_exchange_weak(budget, budget - 1, std::memory_order_relaxed)) break;
+  }
+  return ::rename(from.c_str(), to.c_str());
+}
+
+}  // namespace detail
+
 namespace testing {
 void FailAtomicWritesAfter(long long bytes) {
   g_write_budget.store(bytes < 0 ? -1 : bytes, std::memory_order_relaxed);
+}
+void FailAtomicRenamesAfter(int renames) {
+  g_rename_budget.store(renames < 0 ? -1 : renames, std::memory_order_relaxed);
 }
 }  // namespace testing
 
@@ -165,10 +191,7 @@ bool AtomicFile::Open(const wchar_t* path) {
   error_.clear();
   const std::string native = NativePath(path);
   if (native.empty() || native.back() == '/') return Failed("no file name", ENOENT);
-  if (!StaysInDataRoot(native, true)) {
-    error_ = LastFileRefusal();
-    return false;
-  }
+  if (!StaysInDataRoot(native, true)) return Report(LastFileRefusal());
   target_ = ResolveTarget(native);
 
   // The temporary file sits in the target's folder so that the final rename never crosses a
@@ -199,8 +222,12 @@ bool AtomicFile::Open(const wchar_t* path) {
   return true;
 }
 
-bool AtomicFile::Failed(const std::string& what, int err) {
-  if (error_.empty()) error_ = what + ": " + ErrorText(err);
+bool AtomicFile::Failed(const std::string& what, int err) { return Report(what + ": " + ErrorText(err)); }
+
+bool AtomicFile::Report(const std::string& why) {
+  if (error_.empty()) error_ = why;
+  // A file that fails inside a transaction fails the whole save.
+  if (FileTransaction* tx = FileTransaction::Current()) tx->Fail(error_);
   return false;
 }
 
@@ -255,7 +282,13 @@ bool AtomicFile::Commit() {
   const int fd = fd_;
   fd_ = -1;
   if (RetryClose(fd) != 0 && ok) ok = Failed("cannot write " + target_, errno);
-  if (ok && ::rename(temp_.c_str(), target_.c_str()) != 0) ok = Failed("cannot replace " + target_, errno);
+  if (FileTransaction* tx = FileTransaction::Current(); tx && ok) {
+    // Complete and on disk: the transaction puts it into place together with the others.
+    tx->Stage(std::move(temp_), target_);
+    temp_.clear();
+    return true;
+  }
+  if (ok && detail::RenameIntoPlace(temp_, target_) != 0) ok = Failed("cannot replace " + target_, errno);
   if (!ok) {
     ::unlink(temp_.c_str());
     temp_.clear();
@@ -278,6 +311,8 @@ void AtomicFile::Abandon() {
   if (fd_ >= 0) {
     RetryClose(fd_);
     fd_ = -1;
+    // Given up before it was complete: a save that counted on it is not complete either.
+    if (FileTransaction* tx = FileTransaction::Current()) tx->Fail(error_.empty() ? "gave up writing " + target_ : error_);
   }
   if (!temp_.empty()) {
     ::unlink(temp_.c_str());

@@ -1,7 +1,8 @@
 // Writing a file so that readers see either the old content or the whole new one: the bytes go
 // to a temporary file in the same folder, which is flushed and renamed over the target on
 // Commit. Destroying an uncommitted AtomicFile removes the temporary file and leaves the target
-// as it was. A target under the data root that a symbolic link leads out of it is refused.
+// as it was. Inside a FileTransaction, Commit only stages the complete file and the transaction
+// puts it into place with the others. A target under the data root that a symbolic link leads out of it is refused.
 // Temporary files that a killed save of the same target left behind are removed on Open (see
 // docs/data-root-safety.md).
 #pragma once
@@ -42,6 +43,7 @@ class AtomicFile {
  private:
   bool Flush();
   bool Failed(const std::string& what, int err);  // records the first failure; false
+  bool Report(const std::string& why);            // the same with the words given
   void WriteFailed();
   void StartWriteback();
   int fd_ = -1;
@@ -59,6 +61,8 @@ namespace testing {
 // this process, every further write fails as a full disk would. A negative value switches the
 // fault off.
 void FailAtomicWritesAfter(long long bytes);
+// After `renames` more renames into place, every further one fails (EIO). Negative: off.
+void FailAtomicRenamesAfter(int renames);
 }  // namespace testing
 
 }  // namespace navmisc

@@ -12,6 +12,7 @@
 #include <gtest/gtest.h>
 
 #include "navmisc/platform/atomic_file.h"
+#include "navmisc/platform/file_transaction.h"
 #include "navmisc/platform/files.h"
 #include "testutil.h"
 
@@ -389,6 +390,45 @@ TEST(AtomicFileTest, FailuresAndAbandonLeaveTargetAndNoTemporaryFile) {
   navmisc::AtomicFile f;
   EXPECT_FALSE(f.Open(dir / L"missing/t.txt"));
   EXPECT_FALSE(f.Open(L""));
+}
+
+TEST(AtomicFileTest, TransactionsPutFilesInPlaceTogetherOnCommit) {
+  TempDir dir;
+  auto write = [&](const wchar_t* name, const std::string& text) {
+    navmisc::AtomicFile f;
+    return f.Open(dir / name) && f.Write(text) && f.Commit();
+  };
+  {
+    navmisc::FileTransaction outer;
+    ASSERT_TRUE(write(L"a", "first"));
+    {
+      navmisc::FileTransaction inner;  // joins the outer one
+      ASSERT_TRUE(write(L"b", "b"));
+      ASSERT_TRUE(write(L"a", "second"));  // the same target again: the later text wins
+      EXPECT_TRUE(inner.Commit());
+    }
+    EXPECT_FALSE(FileExists(dir / L"a")) << "nothing is in place before the outer Commit";
+    ASSERT_TRUE(outer.Commit());
+  }
+  EXPECT_EQ(ReadFileBytes(dir / L"a"), "second");
+  EXPECT_EQ(ReadFileBytes(dir / L"b"), "b");
+  EXPECT_EQ(FolderEntries(dir.path()).size(), 2u) << "no temporary file is left";
+
+  {  // a file given up half-way fails the whole transaction
+    navmisc::FileTransaction tx;
+    ASSERT_TRUE(write(L"a", "third"));
+    navmisc::AtomicFile unfinished;
+    ASSERT_TRUE(unfinished.Open(dir / L"b"));
+    unfinished.Abandon();
+    EXPECT_FALSE(tx.Commit());
+    EXPECT_NE(tx.error().find("gave up writing"), std::string::npos) << tx.error();
+  }
+  {  // without Commit nothing happens
+    navmisc::FileTransaction tx;
+    ASSERT_TRUE(write(L"a", "fourth"));
+  }
+  EXPECT_EQ(ReadFileBytes(dir / L"a"), "second");
+  EXPECT_EQ(FolderEntries(dir.path()).size(), 2u);
 }
 
 }  // namespace

@@ -4,6 +4,7 @@
 #include <map>
 
 #include "navmisc/platform/datetime.h"
+#include "navmisc/platform/file_transaction.h"
 #include "navmisc/platform/files.h"
 #include "navmisc/platform/resources.h"
 #include "navmisc/platform/settings.h"
@@ -294,6 +295,22 @@ int BLOG_ITEM_INFO::ReadInfo() {
 
 void BLOG_ITEM_INFO::WriteAllWaypoint(int write, int* counter, bool* keepGoing) {
   for (auto* t : Items<TRACK_ITEM_INFO>(tracks)) t->WriteAllWaypoint(write, counter, keepGoing);
+}
+
+bool BLOG_ITEM_INFO::SaveAll(int* counter, bool* keepGoing, CString* why) {
+  navmisc::FileTransaction save;
+  auto stopped = [&] {
+    if (keepGoing && !*keepGoing) save.Fail("stopped before the trip was saved");
+    return keepGoing && !*keepGoing;
+  };
+  // The settings file comes last, so that even the order of the renames never shows settings
+  // that name tracks whose files are not in place yet.
+  if (!stopped()) WriteAllWaypoint(1, counter, keepGoing);
+  if (!stopped()) WriteInfo(1, counter, keepGoing);
+  stopped();
+  const bool saved = save.Commit();
+  if (!saved && why) *why = CString::FromUtf8(save.error());
+  return saved;
 }
 
 void BLOG_ITEM_INFO::ReadAllWaypoint(int force) {
