@@ -205,7 +205,7 @@ int OpenRegularFile(const std::string& path, bool followLink) {
 
 using navmisc::NativePath;
 
-bool MakeDir(const wchar_t* path) {
+bool MakeDir(const wchar_t* path, unsigned mode) {
   std::string p = StripTrailingSeparators(NativePath(path));
   if (p.empty() || !navmisc::StaysInDataRoot(p, true)) return false;
   struct stat st;
@@ -215,7 +215,7 @@ bool MakeDir(const wchar_t* path) {
   // at the end says whether the whole path is there.
   for (size_t pos = p.find('/', 1);; pos = p.find('/', pos + 1)) {
     std::string part = p.substr(0, pos);
-    if (!part.empty() && part.back() != '/') ::mkdir(part.c_str(), 0777);
+    if (!part.empty() && part.back() != '/') ::mkdir(part.c_str(), static_cast<mode_t>(mode));
     if (pos == std::string::npos) break;
   }
   return ::stat(p.c_str(), &st) == 0 && S_ISDIR(st.st_mode);

@@ -4,8 +4,9 @@
 #include "navmisc/platform/cstring.h"
 #include "navmisc/platform/lists.h"
 
-// Creates the folder and every missing parent. True when the folder exists afterwards.
-bool MakeDir(const wchar_t* path);
+// Creates the folder and every missing parent, those it creates with `mode` (narrowed by the
+// umask); folders that exist keep theirs. True when the folder exists afterwards.
+bool MakeDir(const wchar_t* path, unsigned mode = 0777);
 // Removes the entries of `path` that match `pattern` ("*.*" or "*" = all) with everything in
 // them, then the folder itself when it is empty. Symbolic links are removed as links, never
 // followed; nothing outside `path` is touched. When `path` itself is a symbolic link nothing is
