@@ -66,7 +66,11 @@ bool HasControl(std::string_view s) {
 // never occur inside a multi-byte sequence. Other letters match only as written, so that the
 // result never depends on the process locale.
 void FoldInto(std::string& out, std::string_view s) {
-  for (char c : s) out.push_back((c >= 'A' && c <= 'Z') ? static_cast<char>(c - 'A' + 'a') : c);
+  const size_t start = out.size();
+  out.append(s);
+  for (size_t i = start; i < out.size(); ++i) {
+    if (out[i] >= 'A' && out[i] <= 'Z') out[i] = static_cast<char>(out[i] - 'A' + 'a');
+  }
 }
 
 // Index key of one entry. Names never hold control characters, so NUL cannot be part of
@@ -407,11 +411,17 @@ bool SplitAtLastNumber(std::string_view name, std::string_view& before, int& num
 struct Reader {
   Document doc;
 
-  // The stored value of section/key, or null.
+  // The stored value of section/key, or null. Lookups are the hot path of reading a trip, so
+  // the key is built in buffers that the thread keeps.
   const std::string* Find(const wchar_t* section, const wchar_t* key) const {
-    std::string s, k;
-    if (!NameToUtf8(section, s) || !NameToUtf8(key, k)) return nullptr;
-    const auto it = doc.index.find(EntryKey(s, k));
+    thread_local std::string name, entry;
+    entry.clear();
+    if (!NameToUtf8(section, name)) return nullptr;
+    FoldInto(entry, name);
+    entry.push_back('\0');
+    if (!NameToUtf8(key, name)) return nullptr;
+    FoldInto(entry, name);
+    const auto it = doc.index.find(entry);
     return it == doc.index.end() ? nullptr : &it->second;
   }
 
@@ -680,6 +690,36 @@ std::vector<int> navmisc::KeyIndices(unsigned long handle, const wchar_t* sectio
                                      int count) {
   const auto reader = Readers().Get(handle);
   return reader && section ? reader->Indices(section, pattern, count) : std::vector<int>();
+}
+
+unsigned long navmisc::ReadSettingsFromMemory(std::string_view bytes) {
+  auto reader = std::make_shared<Reader>();
+  Loader loader(reader->doc);
+  loader.Feed(bytes);
+  loader.Finish();
+  return Readers().Add(std::move(reader));
+}
+
+std::vector<navmisc::SettingsEntry> navmisc::SettingsEntries(unsigned long handle) {
+  std::vector<SettingsEntry> out;
+  const auto reader = Readers().Get(handle);
+  if (!reader) return out;
+  out.reserve(reader->doc.index.size());
+  for (const auto& [entry, value] : reader->doc.index) {
+    const std::string_view name = entry;
+    const size_t nul = name.find('\0');
+    out.push_back({CString(FromUtf8Lossy(name.substr(0, nul))), CString(FromUtf8Lossy(name.substr(nul + 1))),
+                   CString(FromUtf8Lossy(value))});
+  }
+  return out;
+}
+
+bool navmisc::EndSettingsToMemory(unsigned long handle, std::string& document) {
+  const auto writer = Writers().Take(handle);
+  if (!writer) return false;
+  std::lock_guard lock(writer->mu);
+  document = writer->Serialize();
+  return true;
 }
 
 unsigned long WR_BEGIN(const wchar_t* path) {

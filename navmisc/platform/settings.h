@@ -8,6 +8,8 @@
 // The format is described in docs/settings-format.md.
 #pragma once
 
+#include <string>
+#include <string_view>
 #include <vector>
 
 #include "navmisc/platform/cstring.h"
@@ -47,5 +49,19 @@ std::vector<int> SectionIndices(unsigned long handle, const wchar_t* pattern, in
 // `pattern` "%s_RN(%d)" with `parent` "SECTION" looks for SECTION_RN(0), SECTION_RN(1), ...
 std::vector<int> SectionIndices(unsigned long handle, const wchar_t* pattern, const wchar_t* parent, int count);
 std::vector<int> KeyIndices(unsigned long handle, const wchar_t* section, const wchar_t* pattern, int count);
+
+
+// Settings documents in memory, read and written exactly as files are (for tests and fuzzing):
+// a reader over `bytes` as RD_BEGIN over a file holding them (release it with RD_END), and the
+// end of a writer that hands over the document WR_END would write. False for an unknown handle.
+unsigned long ReadSettingsFromMemory(std::string_view bytes);
+bool EndSettingsToMemory(unsigned long handle, std::string& document);
+// Every entry a reader holds, its section and key with ASCII letters in lower case and its
+// value as RD_STRING gives it, in no particular order.
+struct SettingsEntry {
+  CString section, key, value;
+  friend bool operator==(const SettingsEntry&, const SettingsEntry&) = default;
+};
+std::vector<SettingsEntry> SettingsEntries(unsigned long handle);
 
 }  // namespace navmisc

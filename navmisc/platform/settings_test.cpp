@@ -2,11 +2,13 @@
 
 #include <sys/stat.h>
 
+#include <algorithm>
 #include <cfloat>
 #include <climits>
 #include <cmath>
 #include <filesystem>
 #include <string>
+#include <tuple>
 #include <vector>
 
 #include <gtest/gtest.h>
@@ -279,6 +281,38 @@ TEST(SettingsTest, ListIndicesAreTheEntriesPresentBelowTheCount) {
   EXPECT_TRUE(SectionIndices(r, L"SECTION_RN", 100).empty()) << "no number in the pattern";
   RD_END(r);
   EXPECT_TRUE(SectionIndices(r, L"SECTION_RN(%d)", 100).empty()) << "an ended handle";
+}
+
+// Documents in memory (what the fuzz targets use) read and write exactly as files do.
+TEST(SettingsTest, MemoryDocumentsMatchFiles) {
+  TempDir dir;
+  for (const std::string& bytes : {std::string("[S]\nk=1\nK=2\n[t]\nv=\" x\"\n"), std::string("\xEF\xBB\xBF[S]\r\nk=\xC3(\r\n"),
+                                  std::string("[\0S\0]\0\n\0k\0=\0\xE9\0", 16), std::string()}) {
+    const unsigned long file = ReadBytes(dir, bytes), memory = navmisc::ReadSettingsFromMemory(bytes);
+    auto sorted = [](std::vector<navmisc::SettingsEntry> v) {
+      std::sort(v.begin(), v.end(), [](const auto& a, const auto& b) {
+        return std::tie(a.section, a.key) < std::tie(b.section, b.key);
+      });
+      return v;
+    };
+    const auto entries = sorted(navmisc::SettingsEntries(file));
+    EXPECT_EQ(entries, sorted(navmisc::SettingsEntries(memory)));
+    EXPECT_EQ(entries.empty(), bytes.empty());
+    for (const auto& e : entries) EXPECT_EQ(RD_STRING(memory, e.section, e.key), e.value);
+    RD_END(file);
+    RD_END(memory);
+  }
+  const CString path = dir / L"out.ini";
+  const unsigned long toFile = WR_BEGIN(path), toMemory = WR_BEGIN(L"unused");
+  for (unsigned long w : {toFile, toMemory}) {
+    WR_STRING(w, L"S", L"text", L" padded ");
+    WR_FLOAT(w, L"S", L"x", 0.1);
+  }
+  std::string document;
+  ASSERT_EQ(WR_END(toFile), 1);
+  ASSERT_TRUE(navmisc::EndSettingsToMemory(toMemory, document));
+  EXPECT_EQ(ReadFileBytes(path), document);
+  EXPECT_FALSE(navmisc::EndSettingsToMemory(toMemory, document)) << "the handle is gone";
 }
 
 TEST(SettingsTest, FailedOrUnfinishedWritesLeaveTheOldFile) {
