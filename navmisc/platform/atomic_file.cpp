@@ -84,12 +84,6 @@ bool FsyncRetry(int fd) {
   }
 }
 
-std::string FolderOf(const std::string& path) {
-  const size_t slash = path.rfind('/');
-  if (slash == std::string::npos) return ".";
-  if (slash == 0) return "/";
-  return path.substr(0, slash);
-}
 
 // The file that actually gets replaced: a symbolic link is followed, so that the link stays a
 // link and the file it names receives the new content. (Only links that stay in the data root
@@ -103,10 +97,6 @@ std::string ResolveTarget(const std::string& path) {
   return path;
 }
 
-std::string ErrorText(int err) {
-  char buf[256];
-  return strerror_r(err, buf, sizeof buf);
-}
 
 // The temporary files of a target are ".<name>.tmp-" and six characters of mkstemp.
 constexpr size_t kTempSuffix = 6;
@@ -161,6 +151,25 @@ namespace detail {
 
 std::string TempFilePrefix(const std::string& name) { return "." + name.substr(0, 200) + ".tmp-"; }
 
+std::string FolderOf(const std::string& path) {
+  const size_t slash = path.rfind('/');
+  if (slash == std::string::npos) return ".";
+  if (slash == 0) return "/";
+  return path.substr(0, slash);
+}
+
+void SyncFolder(const std::string& folder) {
+  const int dir = ::open(folder.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC);
+  if (dir < 0) return;
+  FsyncRetry(dir);
+  RetryClose(dir);
+}
+
+std::string ErrorText(int err) {
+  char buf[256];
+  return strerror_r(err, buf, sizeof buf);
+}
+
 int RenameIntoPlace(const std::string& from, const std::string& to) {
   int budget = g_rename_budget.load(std::memory_order_relaxed);
   while (budget >= 0) {
@@ -197,7 +206,7 @@ bool AtomicFile::Open(const wchar_t* path) {
   // The temporary file sits in the target's folder so that the final rename never crosses a
   // file system; the leading dot keeps it out of ordinary listings, and the name part is
   // shortened so that the temporary name stays within NAME_MAX.
-  SweepLeftovers(FolderOf(target_), target_.substr(target_.rfind('/') + 1));
+  SweepLeftovers(detail::FolderOf(target_), target_.substr(target_.rfind('/') + 1));
   std::string temp;
   const int fd = CreateLockedTemp(target_, temp);
   if (fd < 0) return Failed("cannot create a temporary file beside " + target_, errno);
@@ -222,7 +231,7 @@ bool AtomicFile::Open(const wchar_t* path) {
   return true;
 }
 
-bool AtomicFile::Failed(const std::string& what, int err) { return Report(what + ": " + ErrorText(err)); }
+bool AtomicFile::Failed(const std::string& what, int err) { return Report(what + ": " + detail::ErrorText(err)); }
 
 bool AtomicFile::Report(const std::string& why) {
   if (error_.empty()) error_ = why;
@@ -299,11 +308,7 @@ bool AtomicFile::Commit() {
   temp_.clear();
   // Make the rename itself durable. The new content is in place either way, so a folder that
   // cannot be synced does not fail the commit.
-  const int dir = ::open(FolderOf(target_).c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC);
-  if (dir >= 0) {
-    FsyncRetry(dir);
-    RetryClose(dir);
-  }
+  detail::SyncFolder(detail::FolderOf(target_));
   return true;
 }
 

@@ -1,11 +1,9 @@
 #include "navmisc/platform/file_transaction.h"
 
-#include <fcntl.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
 #include <cerrno>
-#include <cstring>
 #include <random>
 #include <set>
 
@@ -15,17 +13,6 @@ namespace navmisc {
 namespace {
 
 thread_local FileTransaction* t_current = nullptr;
-
-std::string ErrorText(int err) {
-  char buf[256];
-  return strerror_r(err, buf, sizeof buf);
-}
-
-std::string FolderOf(const std::string& path) {
-  const size_t slash = path.rfind('/');
-  if (slash == std::string::npos) return ".";
-  return slash == 0 ? "/" : path.substr(0, slash);
-}
 
 // A second name for the file at `target`, in the form of its temporary files, so that a backup
 // left by a crash is removed by the file's next save like any other leftover. Empty when the
@@ -44,24 +31,16 @@ std::string LinkBackup(const std::string& target) {
   return {};
 }
 
-void SyncFolder(const std::string& folder) {
-  const int dir = ::open(folder.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC);
-  if (dir < 0) return;
-  while (::fsync(dir) != 0 && errno == EINTR) {
-  }
-  ::close(dir);
-}
-
 }  // namespace
 
-FileTransaction::FileTransaction() : outer_(t_current), previous_(t_current) {
+FileTransaction::FileTransaction() : outer_(t_current) {
   if (!outer_) t_current = this;
 }
 
 FileTransaction::~FileTransaction() {
   if (!outer_) {
     if (!done_) Drop();
-    t_current = previous_;
+    t_current = nullptr;
   }
 }
 
@@ -115,7 +94,7 @@ bool FileTransaction::Commit() {
   size_t renamed = 0;
   for (; renamed < staged_.size(); ++renamed) {
     if (detail::RenameIntoPlace(staged_[renamed].temp, staged_[renamed].target) != 0) {
-      Fail("cannot replace " + staged_[renamed].target + ": " + ErrorText(errno));
+      Fail("cannot replace " + staged_[renamed].target + ": " + detail::ErrorText(errno));
       break;
     }
   }
@@ -129,11 +108,11 @@ bool FileTransaction::Commit() {
   std::set<std::string> folders;
   for (size_t i = 0; i < staged_.size(); ++i) {
     if (!undo[i].backup.empty()) ::unlink(undo[i].backup.c_str());
-    folders.insert(FolderOf(staged_[i].target));
+    folders.insert(detail::FolderOf(staged_[i].target));
   }
   staged_.clear();
   // Make the renames themselves durable (either way round).
-  for (const std::string& folder : folders) SyncFolder(folder);
+  for (const std::string& folder : folders) detail::SyncFolder(folder);
   return !failed_;
 }
 

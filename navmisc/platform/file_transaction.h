@@ -44,8 +44,7 @@ class FileTransaction {
   };
   void Drop();
 
-  FileTransaction* outer_ = nullptr;
-  FileTransaction* previous_ = nullptr;
+  FileTransaction* outer_ = nullptr;  // the transaction this one joined
   bool failed_ = false;
   bool done_ = false;
   std::string error_;

@@ -8,16 +8,13 @@
 #include <cerrno>
 #include <cstring>
 
+#include "navmisc/platform/detail/temp_files.h"
 #include "navmisc/platform/files.h"
 #include "navmisc/platform/textconv.h"
 
 namespace navmisc {
 namespace {
 
-std::string SystemError(int err) {
-  char buf[256];
-  return strerror_r(err, buf, sizeof buf);
-}
 
 // libzip reads added files only when the archive is written. Opening the file now turns a
 // missing or unreadable file into an error of its own addition rather than of the close.
@@ -25,7 +22,7 @@ bool CheckReadable(const std::string& native, std::string& error) {
   ClearFileRefusal();
   const int fd = OpenRegularFile(native);
   if (fd < 0) {
-    error = LastFileRefusal().empty() ? SystemError(errno) : "not a regular file";
+    error = LastFileRefusal().empty() ? detail::ErrorText(errno) : "not a regular file";
     return false;
   }
   ::close(fd);
