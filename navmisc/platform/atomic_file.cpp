@@ -37,8 +37,6 @@ std::atomic<long long> g_write_budget{-1};
 // Renames that may still succeed before the injected fault; negative = no fault.
 std::atomic<int> g_rename_budget{-1};
 
-
-
 // How many of `wanted` bytes the fault injection lets through (all of them when it is off).
 size_t TakeWriteBudget(size_t wanted) {
   long long budget = g_write_budget.load(std::memory_order_relaxed);
@@ -84,7 +82,6 @@ bool FsyncRetry(int fd) {
   }
 }
 
-
 // The file that actually gets replaced: a symbolic link is followed, so that the link stays a
 // link and the file it names receives the new content. (Only links that stay in the data root
 // get here.)
@@ -96,7 +93,6 @@ std::string ResolveTarget(const std::string& path) {
   }
   return path;
 }
-
 
 // The temporary files of a target are ".<name>.tmp-" and six characters of mkstemp.
 constexpr size_t kTempSuffix = 6;

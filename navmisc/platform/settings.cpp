@@ -3,15 +3,13 @@
 
 #include "navmisc/platform/settings.h"
 
-#include <fcntl.h>
-#include <sys/stat.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <cerrno>
 #include <charconv>
-#include <cstdint>
-#include <algorithm>
 #include <climits>
+#include <cstdint>
 #include <memory>
 #include <mutex>
 #include <string>
