@@ -287,7 +287,7 @@ TEST(SettingsTest, ListIndicesAreTheEntriesPresentBelowTheCount) {
 TEST(SettingsTest, MemoryDocumentsMatchFiles) {
   TempDir dir;
   for (const std::string& bytes : {std::string("[S]\nk=1\nK=2\n[t]\nv=\" x\"\n"), std::string("\xEF\xBB\xBF[S]\r\nk=\xC3(\r\n"),
-                                  std::string("[\0S\0]\0\n\0k\0=\0\xE9\0", 16), std::string()}) {
+                                  std::string("[\0S\0]\0\n\0k\0=\0\xE9\0", 14), std::string()}) {
     const unsigned long file = ReadBytes(dir, bytes), memory = navmisc::ReadSettingsFromMemory(bytes);
     auto sorted = [](std::vector<navmisc::SettingsEntry> v) {
       std::sort(v.begin(), v.end(), [](const auto& a, const auto& b) {
