@@ -57,12 +57,13 @@ void BLOG_TREE_NODE::WriteInfo(bool writeTrips, unsigned long handle, const wcha
     section = kRootSection;
   }
   WR_STRING(handle, section, L"tree_node_name", name);
-  WR_INT(handle, section, L"trip_item_info_count", trips.GetCount());
+  WR_INT(handle, section, L"trip_item_info_count", trips.GetCount() + unreadTrips.GetCount());
   int n = 0;
   for (auto* t : Items<BLOG_ITEM_INFO>(trips)) {
     WR_STRING(handle, section, FormatString(L"trip_item_info_(%d)_resource", n++), t->tripId);
     if (writeTrips) t->WriteInfo(1, nullptr, nullptr);
   }
+  for (const CString& id : unreadTrips) WR_STRING(handle, section, FormatString(L"trip_item_info_(%d)_resource", n++), id);
   WR_INT(handle, section, L"trip_tree_node_count", children.GetCount());
   n = 0;
   for (auto* c : Items<BLOG_TREE_NODE>(children)) {
@@ -111,15 +112,19 @@ int BLOG_TREE_NODE::ReadNode(unsigned long handle, const wchar_t* section,
       continue;
     }
     auto* trip = new BLOG_ITEM_INFO(GPS_APP_TRIP, id, 0);
-    if (trip->ReadInfo() != 1) {
-      guard.Missed(L"trip " + id + L": its settings file cannot be read or names no trip id");
-      delete trip;
-      continue;
-    }
-    // The folder is the trip's real name; a settings file that says otherwise was damaged or
-    // copied in from another trip.
-    if (trip->tripId != id) guard.Missed(L"trip " + id + L": its settings file names the trip " + trip->tripId);
-    trips.AddTail(trip);
+    const bool read = trip->ReadInfo() == 1;
+    // The folder is the trip's real name; a settings file that names another trip was damaged or
+    // copied in from elsewhere.
+    const CString problem = !read ? CString(L"its settings file cannot be read or names no trip id")
+                                  : trip->tripId != id ? L"its settings file names the trip " + trip->tripId
+                                                       : CString();
+    if (read) trips.AddTail(trip);
+    else delete trip;
+    // A folder that is gone holds nothing a clean-up could delete. One that is there but did not
+    // read stays named in the tree file, so that no later clean-up takes it for unused.
+    if (problem.IsEmpty() || !IsDirectory(PathJoin(ResourceFolder(), id))) continue;
+    unreadTrips.AddTail(id);
+    guard.Missed(L"trip " + id + L": " + problem);
   }
   const int childCount = RD_INT(handle, section, L"trip_tree_node_count", 0);
   const std::vector<int> childNumbers = navmisc::SectionIndices(handle, L"%s_%d", section, childCount);
@@ -172,6 +177,7 @@ bool BLOG_TREE_NODE::ReplaceBlogItem(BLOG_ITEM_INFO* old, BLOG_ITEM_INFO* replac
 
 void BLOG_TREE_NODE::_FindAllUsedResource(CStringList& ids) {
   for (auto* t : Items<BLOG_ITEM_INFO>(trips)) ids.AddTail(t->tripId);
+  ids.AddTail(&unreadTrips);
   for (auto* c : Items<BLOG_TREE_NODE>(children)) c->_FindAllUsedResource(ids);
 }
 

@@ -36,6 +36,9 @@ class BLOG_TREE_NODE {
   int32_t value2 = 0;
   CPtrList trips;     // BLOG_ITEM_INFO*, owned
   CPtrList children;  // BLOG_TREE_NODE*, owned
+  // Ids the tree file names whose folders exist but did not read as that trip. They are written
+  // back after the trips, so that the file keeps naming them until they are repaired.
+  CStringList unreadTrips;
   // Whether the last root ReadInfo saw every trip and node the tree file names.
   navmisc::CompleteReadGuard completeRead;
 

@@ -198,6 +198,30 @@ TEST_F(TripTree, CleanUpRemovesNothingAfterATripOrNodeDroppedOut) {
     EXPECT_EQ(read.completeRead.IsComplete(), c.readable);
     // The caller can tell the user what kept the clean-up back.
     EXPECT_EQ(read.completeRead.Why().IsEmpty(), c.readable) << read.completeRead.Why().ToUtf8();
+
+    // Written again and read back, the tree still names the trip that did not read, so a later
+    // clean-up does not take its folder for unused either.
+    read.WriteInfo(false, 0, nullptr);
+    BLOG_TREE_NODE again(nullptr);
+    ASSERT_EQ(again.ReadInfo(0, nullptr), 1);
+    again.RemoveAllUnusedResource();
+    EXPECT_TRUE(IsDirectory(folder));
+  }
+
+  // A trip whose folder is gone has nothing a clean-up could delete: it drops out, and the read
+  // is still complete.
+  {
+    TempDir root;
+    navmisc::testutil::DataRootScope scope(root.path());
+    BLOG_TREE_NODE saved(nullptr);
+    saved.name = L"All";
+    saved.trips.AddTail(NewTrip(L"gone"));
+    saved.WriteInfo(false, 0, nullptr);
+    ASSERT_TRUE(RemoveDir(static_cast<BLOG_ITEM_INFO*>(saved.trips.GetHead())->GetResourcePath()));
+    BLOG_TREE_NODE read(nullptr);
+    ASSERT_EQ(read.ReadInfo(0, nullptr), 1);
+    EXPECT_TRUE(read.trips.IsEmpty());
+    EXPECT_TRUE(read.completeRead.IsComplete()) << read.completeRead.Why().ToUtf8();
   }
 }
 
