@@ -29,6 +29,8 @@ int PathStatus(const wchar_t* path);
 bool FileExists(const wchar_t* path);
 // True when the path leads to a folder, following symbolic links.
 bool IsDirectory(const wchar_t* path);
+// True when the path itself is a folder: a symbolic link, even to a folder, is not one.
+bool IsRealDirectory(const wchar_t* path);
 // Makes the file writable by its owner ("attributes normal").
 bool SetFileNormal(const wchar_t* path);
 // The clearing of an export's target: up to 3 attempts; stop when the file-name part is empty or

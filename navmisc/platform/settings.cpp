@@ -15,6 +15,7 @@
 #include <string>
 #include <string_view>
 #include <unordered_map>
+#include <unordered_set>
 #include <utility>
 #include <vector>
 
@@ -556,6 +557,16 @@ CString RD_STRING(unsigned long handle, const wchar_t* section, const wchar_t* k
 bool RD_EXISTS(unsigned long handle, const wchar_t* section, const wchar_t* key) {
   const auto reader = Readers().Get(handle);
   return reader && reader->Find(section, key) != nullptr;
+}
+
+void RD_SECTIONS(unsigned long handle, CStringList& names) {
+  const auto reader = Readers().Get(handle);
+  if (!reader) return;
+  std::unordered_set<std::string_view> seen;
+  for (const auto& entry : reader->index) {
+    const std::string_view section(entry.first.data(), entry.first.find('\0'));
+    if (seen.insert(section).second) names.AddTail(CString(navmisc::FromUtf8Lossy(section)));
+  }
 }
 
 void RD_END(unsigned long handle) { Readers().Take(handle); }

@@ -1,0 +1,133 @@
+#include "navmisc/activity/summary.h"
+
+#include <algorithm>
+#include <climits>
+
+namespace navmisc::activity {
+namespace {
+
+// Ascent and descent of the sport store ignore altitude changes smaller than this (metres):
+// barometric and GPS altitudes wobble by about as much while the ground is flat.
+constexpr double kClimbHysteresis = 2.0;
+// An altitude at or above this is no altitude at all.
+constexpr double kNoAltitude = 99999999.0;
+
+int32_t ClampToInt32(double v) {
+  if (v >= static_cast<double>(INT32_MAX)) return INT32_MAX;
+  if (v <= static_cast<double>(INT32_MIN)) return INT32_MIN;
+  return static_cast<int32_t>(v);
+}
+
+bool Has(const WAYPOINT_ITEM_INFO& p, uint8_t bit) { return p.flags[WAYPOINT_ITEM_INFO::kFlagPresence] & bit; }
+
+}  // namespace
+
+void Summarize(PointVector& points, const std::vector<double>& legKm, long start, long end, long timeShift,
+               SummaryRules rules, MovingTotals moving, TrackerFigures& out) {
+  static_cast<TrackerFigures&>(out) = TrackerFigures{};
+  const bool sport = rules == SummaryRules::kSport;
+  const IndexRange range = FindRange(points, start, end, true);
+
+  if (!range.empty) {
+    const WAYPOINT_ITEM_INFO& head = points[range.first];
+    points[range.first].workDistance = 0.0;
+    double distance = 0.0;
+    double maxSpeed = 0.0;
+    double minAlt = head.altitude < kNoAltitude ? head.altitude : kNoAltitude;
+    double maxAlt = head.altitude <= 0 ? head.altitude : 0.0;
+    double reference = head.altitude;
+    double ascent = 0.0, descent = 0.0;
+    long previousStep = 0;  // the time step of the pair before the current one
+    for (size_t i = range.first + 1; i <= range.last; ++i) {
+      const WAYPOINT_ITEM_INFO& prev = points[i - 1];
+      WAYPOINT_ITEM_INFO& cur = points[i];
+      const long step = static_cast<long>(cur.time) - prev.time;
+
+      double km;
+      if (!sport || Has(cur, WAYPOINT_ITEM_INFO::kHasPosition)) {
+        km = legKm[i];
+      } else if (Has(cur, WAYPOINT_ITEM_INFO::kHasSpeed) && cur.workSpeed >= 0) {
+        // The step of the previous pair, not of this one: the sport application has always
+        // measured sensor-only legs so, and its stored figures depend on it.
+        km = static_cast<double>(previousStep) * cur.workSpeed * 0.001;
+      } else if (Has(prev, WAYPOINT_ITEM_INFO::kHasSpeed)) {
+        km = 0.0;
+      } else {
+        km = legKm[i];
+      }
+      distance += km * 1000.0;
+      cur.workDistance = distance;
+      previousStep = step;
+
+      if (sport) {
+        double speed = cur.speed;
+        if (!(Has(cur, WAYPOINT_ITEM_INFO::kHasPosition) && cur.speed != 0) &&
+            Has(cur, WAYPOINT_ITEM_INFO::kHasSpeed) && cur.workSpeed >= 0) {
+          speed = static_cast<double>(static_cast<long long>(cur.workSpeed * 3600.0));
+        }
+        maxSpeed = std::max(maxSpeed, speed);
+      }
+
+      const double alt = cur.altitude;
+      if (alt <= minAlt) minAlt = alt;
+      if (alt >= maxAlt) maxAlt = alt;
+      if (sport) {
+        if (alt < reference && reference - alt >= kClimbHysteresis) {
+          descent += reference - alt;
+          reference = alt;
+        } else if (alt > reference && alt - reference >= kClimbHysteresis) {
+          ascent += alt - reference;
+          reference = alt;
+        }
+      } else {
+        if (alt > prev.altitude) ascent += alt - prev.altitude;
+        else descent += prev.altitude - alt;
+      }
+    }
+    if (!sport) {
+      // The tracker takes the largest logger speed of every point in range, the first too.
+      maxSpeed = head.speed;
+      for (size_t i = range.first; i <= range.last; ++i) maxSpeed = std::max<double>(maxSpeed, points[i].speed);
+    }
+    out.distance = distance;
+    out.maxSpeed = maxSpeed;
+    out.minAltitude = minAlt;
+    out.maxAltitude = maxAlt;
+    out.ascent = ascent;
+    out.descent = descent;
+  }
+
+  out.startTime = ClampToInt32(static_cast<double>(start + timeShift));
+  out.endTime = ClampToInt32(static_cast<double>(end + timeShift));
+  // A backwards range lasts nothing rather than a negative time.
+  out.duration = std::max(0, ClampToInt32(static_cast<double>(out.endTime) - out.startTime));
+  out.avgSpeed = out.duration != 0 ? out.distance / out.duration * 3600.0 : 0.0;
+  out.movingTime = std::min(moving.time, std::max(out.duration, 0));
+  out.movingDistance = moving.distance;
+  out.pace = out.movingDistance != 0.0 ? ClampToInt32(out.movingTime / (out.movingDistance * 0.001)) : 0;
+}
+
+void SummarizeSensors(const PointVector& points, long start, long end, SportFigures& out) {
+  out.movingAvgSpeed = out.movingTime != 0 ? out.movingDistance / out.movingTime * 3600.0 : 0.0;
+  out.maxHeartRate = out.avgHeartRate = out.maxCadence = out.avgCadence = 0;
+  const IndexRange range = FindRange(points, start, end, false);
+  if (range.empty) return;
+  long long hrSum = 0, hrCount = 0, cadSum = 0, cadCount = 0;
+  for (size_t i = range.first; i <= range.last; ++i) {
+    const WAYPOINT_ITEM_INFO& p = points[i];
+    if (Has(p, WAYPOINT_ITEM_INFO::kHasHeartRate)) {
+      hrSum += p.workHeartRate;
+      ++hrCount;
+      out.maxHeartRate = std::max(out.maxHeartRate, p.workHeartRate);
+    }
+    if (Has(p, WAYPOINT_ITEM_INFO::kHasCadence)) {
+      cadSum += p.workCadence;
+      ++cadCount;
+      out.maxCadence = std::max(out.maxCadence, p.workCadence);
+    }
+  }
+  out.avgHeartRate = hrCount ? static_cast<int32_t>(hrSum / hrCount) : 0;
+  out.avgCadence = cadCount ? static_cast<int32_t>(cadSum / cadCount) : 0;
+}
+
+}  // namespace navmisc::activity
