@@ -63,7 +63,9 @@ void ActivityItem<Figures>::PrepareSummaryData(CPtrList* heartRates, CPtrList* c
   Update(utcStart_, utcEnd_, SumMovingSegments(segments), whole);
   const long start = selStartTime - TimeShift();
   const long end = selEndTime - TimeShift();
-  Update(start, end, SumMovingSegments(segments, start, end), selected);
+  // Most selections are the whole activity; its figures need no second walk.
+  if (start == utcStart_ && end == utcEnd_) selected = whole;
+  else Update(start, end, SumMovingSegments(segments, start, end), selected);
 }
 
 template <class Figures>

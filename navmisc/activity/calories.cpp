@@ -130,10 +130,10 @@ long ExerciseEnergy(const PointVector& points, IndexRange range, int sportType, 
   const int threshold = static_cast<int>(0.65 * MaxHeartRate(person) + 0.5);
   double sum = 0.0;
   for (size_t i = range.first + 1; i <= range.last; ++i) {
-    const WAYPOINT_ITEM_INFO& cur = points[i];
-    const bool hasHr = cur.flags[WAYPOINT_ITEM_INFO::kFlagPresence] & WAYPOINT_ITEM_INFO::kHasHeartRate;
-    if (hasHr && cur.workHeartRate >= threshold) {
-      sum += HeartRateEnergy(person, cur.workHeartRate);
+    const ActivityPoint& cur = points[i];
+    const bool hasHr = cur.Has(WAYPOINT_ITEM_INFO::kHasHeartRate);
+    if (hasHr && cur.heartRate >= threshold) {
+      sum += HeartRateEnergy(person, cur.heartRate);
     } else {
       const long step = static_cast<long>(cur.time) - points[i - 1].time;
       sum += MovingEnergy(sportType, person.weight, step, cur.speed * 0.001);

@@ -105,10 +105,10 @@ TEST(Calories, ExerciseEnergyTakesTheHeartRateFormulaPerSampleAboveTheThreshold)
   for (int i = 0; i < 4; ++i) points[i].time = 10 * i;
   points[1].speed = 10000;  // no heart rate: 10 s at 10 km/h, MET 11
   points[2].speed = 10000;
-  points[2].workHeartRate = 150;  // above: one sample's worth, not ten seconds'
+  points[2].heartRate = 150;  // above: one sample's worth, not ten seconds'
   points[3].speed = 12000;
-  points[3].workHeartRate = 120;  // below the threshold: by speed, MET 15
-  for (int i : {2, 3}) points[i].flags[WAYPOINT_ITEM_INFO::kFlagPresence] = WAYPOINT_ITEM_INFO::kHasHeartRate;
+  points[3].heartRate = 120;  // below the threshold: by speed, MET 15
+  for (int i : {2, 3}) points[i].present = WAYPOINT_ITEM_INFO::kHasHeartRate;
   EXPECT_EQ(ExerciseEnergy(points, FindRange(points, 0, 30, true), 1, man), 5293);  // 5292.59
   EXPECT_EQ(ExerciseEnergy(points, FindRange(points, 100, 200, true), 1, man), 0);
   EXPECT_EQ(ExerciseEnergy(points, FindRange(points, 10, 10, true), 1, man), 0);  // one point, no pair

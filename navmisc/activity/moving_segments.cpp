@@ -14,20 +14,20 @@ constexpr uint8_t kSpeed = WAYPOINT_ITEM_INFO::kHasSpeed;
 // Yield the processor after this many pairs.
 constexpr size_t kYieldEvery = 1 << 16;
 
-bool Fixed(const WAYPOINT_ITEM_INFO& p) { return p.flags[WAYPOINT_ITEM_INFO::kFlagPresence] & kPosition; }
+bool Fixed(const ActivityPoint& p) { return p.Has(kPosition); }
 
 // The speed a point reports by itself, metres per hour: the wheel sensor when there is one,
 // else the logger's own.
-double ReportedSpeed(const WAYPOINT_ITEM_INFO& p) {
-  if (p.flags[WAYPOINT_ITEM_INFO::kFlagPresence] & kSpeed) return p.workSpeed * 3600.0;
+double ReportedSpeed(const ActivityPoint& p) {
+  if (p.Has(kSpeed)) return p.speedReading * 3600.0;
   return p.speed;
 }
 
 // Straight-line distance in metres on a local flat approximation: for the short spans of the
 // speed window, where it agrees with the great circle to far better than the fixes do.
-double FlatMetres(const WAYPOINT_ITEM_INFO& a, const WAYPOINT_ITEM_INFO& b) {
+double FlatMetres(const ActivityPoint& a, const ActivityPoint& b) {
   using navmisc::geo::kDegToRad;
-  const double x = (b.longitude - a.longitude) * std::cos((a.latitude + b.latitude) * 0.5 * kDegToRad);
+  const double x = (b.longitude - a.longitude) * (a.cosLatitude + b.cosLatitude) * 0.5;
   const double y = b.latitude - a.latitude;
   return std::sqrt(x * x + y * y) * kDegToRad * navmisc::geo::kEarthRadiusKm * 1000.0;
 }
@@ -35,16 +35,23 @@ double FlatMetres(const WAYPOINT_ITEM_INFO& a, const WAYPOINT_ITEM_INFO& b) {
 }  // namespace
 
 int32_t SamplingInterval(const PointVector& points) {
-  std::vector<int32_t> steps;
-  steps.reserve(points.size());
+  // The median by counting: steps beyond the longest gap all count as one long step, which
+  // gives the same gap limit as their true length would.
+  std::vector<uint32_t> counts(kMaxGap + 2, 0);
+  size_t steps = 0;
   for (size_t i = 1; i < points.size(); ++i) {
     const int64_t dt = static_cast<int64_t>(points[i].time) - points[i - 1].time;
-    if (dt > 0) steps.push_back(static_cast<int32_t>(std::min<int64_t>(dt, INT32_MAX)));
+    if (dt <= 0) continue;
+    ++counts[static_cast<size_t>(std::min<int64_t>(dt, kMaxGap + 1))];
+    ++steps;
   }
-  if (steps.empty()) return 1;
-  auto mid = steps.begin() + static_cast<long>(steps.size() / 2);
-  std::nth_element(steps.begin(), mid, steps.end());
-  return *mid;
+  if (steps == 0) return 1;
+  size_t seen = 0;
+  for (size_t dt = 1; dt < counts.size(); ++dt) {
+    seen += counts[dt];
+    if (seen > steps / 2) return static_cast<int32_t>(dt);
+  }
+  return kMaxGap + 1;
 }
 
 std::vector<MovingSegment> BuildMovingSegments(const PointVector& points, const std::vector<double>& legKm) {
@@ -62,23 +69,23 @@ std::vector<MovingSegment> BuildMovingSegments(const PointVector& points, const 
   runEnd.back() = static_cast<uint32_t>(kept.size() - 1);
   for (size_t j = kept.size() - 1; j-- > 0;) runEnd[j] = splits(j + 1) ? static_cast<uint32_t>(j) : runEnd[j + 1];
 
-  CGPSHelper helper;
   bool inSegment = false;
   size_t runStart = 0, lo = 0, hi = 0;  // the speed window, indexes into `kept`
   for (size_t j = 1; j < kept.size(); ++j) {
     if (j % kYieldEvery == 0) std::this_thread::yield();
     const size_t ia = kept[j - 1], ib = kept[j];
-    const WAYPOINT_ITEM_INFO& a = points[ia];
-    const WAYPOINT_ITEM_INFO& b = points[ib];
+    const ActivityPoint& a = points[ia];
+    const ActivityPoint& b = points[ib];
     const int64_t dt = step(j);
 
     // How far the pair went: along the great circle between two fixes, else by the speed the
     // point reports.
     double metres;
     if (Fixed(a) && Fixed(b)) {
-      metres = (ia + 1 == ib) ? legKm[ib] * 1000.0
-                              : helper.GetDistance(a.latitude, a.longitude, b.latitude, b.longitude,
-                                                   CGPSHelper::DIS_METER);
+      metres = 1000.0 * ((ia + 1 == ib) ? legKm[ib]
+                                         : navmisc::geo::HaversineAngle(a.latitude, a.longitude, a.cosLatitude,
+                                                                        b.latitude, b.longitude, b.cosLatitude) *
+                                               navmisc::geo::kEarthRadiusKm);
     } else {
       metres = ReportedSpeed(b) * static_cast<double>(dt) / 3600.0;
     }
@@ -100,8 +107,8 @@ std::vector<MovingSegment> BuildMovingSegments(const PointVector& points, const 
       while (lo + 1 < j && 2 * static_cast<int64_t>(points[kept[lo]].time) < twice - kSpeedWindow) ++lo;
       hi = std::max(hi, j);
       while (hi < runEnd[j] && 2 * static_cast<int64_t>(points[kept[hi + 1]].time) <= twice + kSpeedWindow) ++hi;
-      const WAYPOINT_ITEM_INFO& w = points[kept[lo]];
-      const WAYPOINT_ITEM_INFO& e = points[kept[hi]];
+      const ActivityPoint& w = points[kept[lo]];
+      const ActivityPoint& e = points[kept[hi]];
       const double speed = (Fixed(w) && Fixed(e))
                                ? FlatMetres(w, e) / static_cast<double>(e.time - w.time) * 3600.0
                                : ReportedSpeed(b);

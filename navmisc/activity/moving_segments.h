@@ -29,7 +29,8 @@ inline constexpr int32_t kSpeedWindow = 20;         // seconds around a pair ove
 // then, so that a long list does not hog it.
 std::vector<MovingSegment> BuildMovingSegments(const PointVector& points, const std::vector<double>& legKm);
 
-// The typical time between two fixes: the median of the positive steps, 1 when there are none.
+// The typical time between two fixes: the median of the positive steps (all steps longer than
+// kMaxGap counting as kMaxGap + 1), 1 when there are none.
 int32_t SamplingInterval(const PointVector& points);
 
 struct MovingTotals {

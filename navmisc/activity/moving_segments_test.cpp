@@ -5,8 +5,10 @@
 #include <cmath>
 #include <cstdio>
 #include <random>
+#include <tuple>
 
 #include "navmisc/export/gpx_export.h"
+#include "navmisc/geo/gps_helper.h"
 #include "navmisc/records/track.h"
 #include "testutil.h"
 
@@ -52,13 +54,14 @@ class Recorder {
     auto draw = [&](double sigma) { return noise_ > 0 ? std::normal_distribution<double>(0.0, sigma * noise_)(rng_) : 0.0; };
     driftN_ = 0.95 * driftN_ + draw(0.3);
     driftE_ = 0.95 * driftE_ + draw(0.3);
-    WAYPOINT_ITEM_INFO& p = points.emplace_back();
+    ActivityPoint& p = points.emplace_back();
     p.time = time_;
     p.latitude = lat_ + (driftN_ + draw(0.12)) / kMetresPerDegree;
     p.longitude = lon_ + (driftE_ + draw(0.12)) / (kMetresPerDegree * std::cos(lat_ * 0.0174533));
+    p.cosLatitude = std::cos(p.latitude * navmisc::geo::kDegToRad);
     p.altitude = 410.0 + draw(0.5);
     p.speed = static_cast<int32_t>(mps * 3600);
-    p.flags[WAYPOINT_ITEM_INFO::kFlagPresence] = WAYPOINT_ITEM_INFO::kHasPosition;
+    p.present = WAYPOINT_ITEM_INFO::kHasPosition;
   }
 
   double noise_;
@@ -135,7 +138,12 @@ TEST(MovingSegments, AWalkWithStopsAgainstTheTruthAndGpxpy) {
   if (python.empty()) GTEST_SKIP() << "python3-gpxpy is not installed (scripts/setup.sh installs it)";
   TempDir dir;
   TRACK_ITEM_INFO track(nullptr);
-  for (const WAYPOINT_ITEM_INFO& p : r.points) track.points.AddTail(new WAYPOINT_ITEM_INFO(p));
+  for (const ActivityPoint& p : r.points) {
+    auto* w = new WAYPOINT_ITEM_INFO;
+    std::tie(w->time, w->latitude, w->longitude, w->altitude, w->speed) =
+        std::tie(p.time, p.latitude, p.longitude, p.altitude, p.speed);
+    track.points.AddTail(w);
+  }
   CPtrList tracks, none;
   tracks.AddTail(&track);
   ASSERT_EQ(ExportGpx(dir / L"walk.gpx", tracks, none), 1);

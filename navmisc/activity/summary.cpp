@@ -18,8 +18,6 @@ int32_t ClampToInt32(double v) {
   return static_cast<int32_t>(v);
 }
 
-bool Has(const WAYPOINT_ITEM_INFO& p, uint8_t bit) { return p.flags[WAYPOINT_ITEM_INFO::kFlagPresence] & bit; }
-
 }  // namespace
 
 void Summarize(PointVector& points, const std::vector<double>& legKm, long start, long end, long timeShift,
@@ -29,8 +27,8 @@ void Summarize(PointVector& points, const std::vector<double>& legKm, long start
   const IndexRange range = FindRange(points, start, end, true);
 
   if (!range.empty) {
-    const WAYPOINT_ITEM_INFO& head = points[range.first];
-    points[range.first].workDistance = 0.0;
+    const ActivityPoint& head = points[range.first];
+    points[range.first].distance = 0.0;
     double distance = 0.0;
     double maxSpeed = 0.0;
     double minAlt = head.altitude < kNoAltitude ? head.altitude : kNoAltitude;
@@ -39,31 +37,31 @@ void Summarize(PointVector& points, const std::vector<double>& legKm, long start
     double ascent = 0.0, descent = 0.0;
     long previousStep = 0;  // the time step of the pair before the current one
     for (size_t i = range.first + 1; i <= range.last; ++i) {
-      const WAYPOINT_ITEM_INFO& prev = points[i - 1];
-      WAYPOINT_ITEM_INFO& cur = points[i];
+      const ActivityPoint& prev = points[i - 1];
+      ActivityPoint& cur = points[i];
       const long step = static_cast<long>(cur.time) - prev.time;
 
       double km;
-      if (!sport || Has(cur, WAYPOINT_ITEM_INFO::kHasPosition)) {
+      if (!sport || cur.Has(WAYPOINT_ITEM_INFO::kHasPosition)) {
         km = legKm[i];
-      } else if (Has(cur, WAYPOINT_ITEM_INFO::kHasSpeed) && cur.workSpeed >= 0) {
+      } else if (cur.Has(WAYPOINT_ITEM_INFO::kHasSpeed) && cur.speedReading >= 0) {
         // The step of the previous pair, not of this one: the sport application has always
         // measured sensor-only legs so, and its stored figures depend on it.
-        km = static_cast<double>(previousStep) * cur.workSpeed * 0.001;
-      } else if (Has(prev, WAYPOINT_ITEM_INFO::kHasSpeed)) {
+        km = static_cast<double>(previousStep) * cur.speedReading * 0.001;
+      } else if (prev.Has(WAYPOINT_ITEM_INFO::kHasSpeed)) {
         km = 0.0;
       } else {
         km = legKm[i];
       }
       distance += km * 1000.0;
-      cur.workDistance = distance;
+      cur.distance = distance;
       previousStep = step;
 
       if (sport) {
         double speed = cur.speed;
-        if (!(Has(cur, WAYPOINT_ITEM_INFO::kHasPosition) && cur.speed != 0) &&
-            Has(cur, WAYPOINT_ITEM_INFO::kHasSpeed) && cur.workSpeed >= 0) {
-          speed = static_cast<double>(static_cast<long long>(cur.workSpeed * 3600.0));
+        if (!(cur.Has(WAYPOINT_ITEM_INFO::kHasPosition) && cur.speed != 0) &&
+            cur.Has(WAYPOINT_ITEM_INFO::kHasSpeed) && cur.speedReading >= 0) {
+          speed = static_cast<double>(static_cast<long long>(cur.speedReading * 3600.0));
         }
         maxSpeed = std::max(maxSpeed, speed);
       }
@@ -114,16 +112,16 @@ void SummarizeSensors(const PointVector& points, long start, long end, SportFigu
   if (range.empty) return;
   long long hrSum = 0, hrCount = 0, cadSum = 0, cadCount = 0;
   for (size_t i = range.first; i <= range.last; ++i) {
-    const WAYPOINT_ITEM_INFO& p = points[i];
-    if (Has(p, WAYPOINT_ITEM_INFO::kHasHeartRate)) {
-      hrSum += p.workHeartRate;
+    const ActivityPoint& p = points[i];
+    if (p.Has(WAYPOINT_ITEM_INFO::kHasHeartRate)) {
+      hrSum += p.heartRate;
       ++hrCount;
-      out.maxHeartRate = std::max(out.maxHeartRate, p.workHeartRate);
+      out.maxHeartRate = std::max<int32_t>(out.maxHeartRate, p.heartRate);
     }
-    if (Has(p, WAYPOINT_ITEM_INFO::kHasCadence)) {
-      cadSum += p.workCadence;
+    if (p.Has(WAYPOINT_ITEM_INFO::kHasCadence)) {
+      cadSum += p.cadence;
       ++cadCount;
-      out.maxCadence = std::max(out.maxCadence, p.workCadence);
+      out.maxCadence = std::max<int32_t>(out.maxCadence, p.cadence);
     }
   }
   out.avgHeartRate = hrCount ? static_cast<int32_t>(hrSum / hrCount) : 0;

@@ -46,7 +46,7 @@ enum class SummaryRules {
 
 // Computes `out` over the UTC range [start, end] of `points` (in time order; `legKm` from
 // LegLengthsKm) with `moving` summed from the moving segments. Writes each point's cumulative
-// distance (workDistance) over the range. `timeShift` (seconds) turns the range into the local
+// distance (distance) over the range. `timeShift` (seconds) turns the range into the local
 // start and end of the figures. `moving.time` is capped at the duration.
 void Summarize(PointVector& points, const std::vector<double>& legKm, long start, long end, long timeShift,
                SummaryRules rules, MovingTotals moving, TrackerFigures& out);

@@ -1,7 +1,9 @@
+#include <cstdio>
 #include <string>
 
 #include <gtest/gtest.h>
 
+#include "navmisc/export/detail/test_support.h"
 #include "navmisc/platform/files.h"
 #include "navmisc/records/trip.h"
 #include "testutil.h"
@@ -86,7 +88,20 @@ TEST(ExportCommand, WritesEachFormatOrSaysWhyNot) {
     }
   }
   // The options reach the writers: the sport, and metric figures (an altitude of 100 m).
-  EXPECT_NE(ReadFileBytes(s.root / L"t.tcx").find("<Activity Sport=\"Biking\">"), std::string::npos);
+  const std::string tcx = ReadFileBytes(s.root / L"t.tcx");
+  EXPECT_NE(tcx.find("<Activity Sport=\"Biking\">"), std::string::npos);
+  // The lap carries its calories: a default profile (60 kg, 170 cm, age unknown) standing for
+  // 40 s on a bike, 4 * 10 s at MET 3.0, plus 40 s at rest: 2000 + 806 small calories.
+  EXPECT_NE(tcx.find("<Calories>3</Calories>"), std::string::npos) << tcx;
+  // So the document is valid TCX.
+  if (navmisc::testutil::HaveProgram("xmllint") && !navmisc::exporttest::SchemaDir().empty()) {
+    const auto valid = RunCommand("xmllint --noout --nonet --schema " +
+                                  ShellQuote(navmisc::exporttest::SchemaDir() + "/tcx2-with-ax2.xsd") + " " +
+                                  s.Out(L"t.tcx") + " 2>&1");
+    EXPECT_EQ(valid.status, 0) << valid.out;
+  } else {
+    std::printf("note: t.tcx not validated: xmllint or the schema folder is missing\n");
+  }
   EXPECT_NE(ReadFileBytes(s.root / L"t.csv").find("47.374000, 8.540000, 100.00,  0.00"), std::string::npos);
 }
 

@@ -23,6 +23,9 @@ class PerSecond {
 
   // Adds the samples of `samples` (Sample*); records without a time are ignored.
   void Add(const CPtrList& samples) {
+    size_t more = 0;
+    for (const Sample* s : navmisc::Items<Sample>(samples)) more += (s && s->time != -1) ? s->UsedCount() : 0;
+    values_.reserve(values_.size() + more);
     for (const Sample* s : navmisc::Items<Sample>(samples)) {
       if (!s || s->time == -1) continue;
       const int used = s->UsedCount();
