@@ -19,7 +19,7 @@ command -v gpsbabel >/dev/null || { echo "gpsbabel is not installed (scripts/set
 
 work=$(mktemp -d "${TMPDIR:-/tmp}/navmisc-vs-gpsbabel-XXXXXX")
 trap 'rm -rf "$work"' EXIT
-export NAVMISC_SHM_NAME=private  # keep the run's shared state to itself
+unset NAVMISC_DATA_ROOT  # the runs choose their own data root
 
 trip=$("$bench" --write-trip="$work/root")
 export_cmd="'$navmisc' --data-root '$work/root' export $trip --format gpx -o '$work/same.gpx'"

@@ -5,8 +5,8 @@
 // Every block is plain data: no virtual functions, no pointers, trivially copyable and of
 // standard layout, so it can live in shared memory and travel through the channel as bytes.
 // Fields have their natural alignment; the layout is the same for every program built for one
-// platform (docs/shared-state.md lists it). Changing a block changes the shared block's layout
-// version.
+// platform (docs/shared-state.md lists it). Changing a block changes the device state block's
+// layout version.
 #pragma once
 
 #include <cstdint>

@@ -15,40 +15,47 @@
 
 #include <gtest/gtest.h>
 
-#include "navmisc/platform/detail/shared_block.h"
+#include "navmisc/platform/data_root.h"
+#include "navmisc/platform/detail/shared_globals_block.h"
 #include "navmisc/platform/shared_memory.h"
 #include "testutil.h"
 
 namespace {
 
+using navmisc::SharedBlockOrigin;
 using navmisc::SharedMemory;
-using navmisc::detail::SharedBlockData;
-using navmisc::detail::SharedBlockOrigin;
+using navmisc::detail::SharedGlobals;
+using navmisc::detail::SharedGlobalsBlock;
 using navmisc::testutil::CommandResult;
 using navmisc::testutil::RunCommand;
 using navmisc::testutil::ShellQuote;
+using navmisc::testutil::TempDir;
 
 // ---- the child side: runs only when started by the tests below -------------------------------
 
 const char* Role() { return std::getenv("NAVMISC_TEST_SHM_ROLE"); }
 
+// The child's data root comes from NAVMISC_DATA_ROOT, read when the library is loaded.
 TEST(SharedGlobalsChild, DISABLED_Role) {
   const std::string role = Role() ? Role() : "";
   if (role.empty()) GTEST_SKIP() << "started by SharedGlobals tests only";
-  const SharedBlockOrigin origin = navmisc::detail::SharedBlockSource();
+  const int value = std::atoi(std::getenv("NAVMISC_TEST_SHM_VALUE"));
   if (role == "write") {
-    ASSERT_EQ(origin, SharedBlockOrigin::kNamedObject);
-    navmisc::SetSharedText(g_szAppDataPath, L"/home/user/.local/share/navmisc");
-    std::tie(g_nProductId, g_devConfig.nInterval, g_devConfig11.NAVI[28799], g_dDeviceVersion,
-             g_bDeviceConnected, g_nScanProgress) =
-        std::tuple(GPS_APP_SPORT, 5, 0xAB, 1.25, true, 77);
+    ASSERT_EQ(SharedGlobals().origin(), SharedBlockOrigin::kNamedObject);
+    std::tie(g_nProductId, g_sVersionInfo.nBuild) = std::tuple(GPS_APP_PROG_TYPE(value), value);
+    navmisc::SetSharedText(g_szGapiInfo, std::to_wstring(value).c_str());
+  } else if (role == "read") {
+    ASSERT_EQ(SharedGlobals().origin(), SharedBlockOrigin::kNamedObject);
+    EXPECT_EQ(std::tuple(int{g_nProductId}, g_sVersionInfo.nBuild), std::tuple(value, value));
+    EXPECT_EQ(CString(g_szGapiInfo), CString(std::to_wstring(value).c_str()));
+    EXPECT_EQ(CString(g_szAppDataPath), CString::FromUtf8(navmisc::ChosenDataRoot()));
   } else if (role == "mark") {
-    ASSERT_EQ(origin, SharedBlockOrigin::kNamedObject);
-    g_devConfig11.NAVI[std::atoi(std::getenv("NAVMISC_TEST_SHM_INDEX"))] = 1;
+    ASSERT_EQ(SharedGlobals().origin(), SharedBlockOrigin::kNamedObject);
+    g_szGapiInfo[value] = L'x';
   } else if (role == "fallback") {
-    EXPECT_EQ(origin, SharedBlockOrigin::kFallback);
-    g_nScanProgress = 99;  // must land in the private block
-    EXPECT_EQ(g_nScanProgress, 99);
+    EXPECT_EQ(SharedGlobals().origin(), SharedBlockOrigin::kFallback);
+    g_sVersionInfo.nBuild = value;  // must land in the private block
+    EXPECT_EQ(g_sVersionInfo.nBuild, value);
   } else {
     FAIL() << "unknown role " << role;
   }
@@ -56,86 +63,91 @@ TEST(SharedGlobalsChild, DISABLED_Role) {
 
 // ---- the parent side ----------------------------------------------------------------------
 
-std::string UniqueName(const char* what) {
-  static int counter = 0;
-  return "/navmisc-test-" + std::string(what) + "-" + std::to_string(::getpid()) + "-" +
-         std::to_string(++counter);
-}
-
 // Runs this test program again in `count` processes started together, each running only the
-// child test, with `role`, the object's name and its own index in its environment. Status 0 when
-// every child passed; the output is theirs.
-CommandResult RunChildren(const std::string& shm_name, const std::string& role, int count = 1) {
+// child test with `role`, the data root `root` inherited through the environment and `value`
+// (plus its own index, when `indexed`). Status 0 when every child passed; the output is theirs.
+CommandResult RunChildren(const CString& root, const std::string& role, int value, int count = 1,
+                          bool indexed = false) {
   const std::string child =
-      "NAVMISC_SHM_NAME=" + ShellQuote(shm_name) + " NAVMISC_TEST_SHM_ROLE=" + role +
-      " NAVMISC_TEST_SHM_INDEX=$i " + ShellQuote(std::filesystem::read_symlink("/proc/self/exe")) +
-      " --gtest_filter=SharedGlobalsChild.DISABLED_Role --gtest_also_run_disabled_tests";
+      "NAVMISC_DATA_ROOT=" + ShellQuote(root.ToUtf8()) + " NAVMISC_TEST_SHM_ROLE=" + role +
+      " NAVMISC_TEST_SHM_VALUE=$((" + std::to_string(value) + (indexed ? " + i" : "") + ")) " +
+      ShellQuote(std::filesystem::read_symlink("/proc/self/exe")) +
+      " --gtest_filter=SharedGlobalsChild.DISABLED_Role --gtest_also_run_disabled_tests 2>&1";
   return RunCommand("i=0; pids=; while [ $i -lt " + std::to_string(count) + " ]; do " + child +
                     " & pids=\"$pids $!\"; i=$((i + 1)); done; failed=0;"
                     " for p in $pids; do wait $p || failed=1; done; exit $failed");
 }
 
-// Removes the object when the test ends, however it ends.
-struct Unlinker {
-  std::string name;
-  ~Unlinker() { ::shm_unlink(name.c_str()); }
+// A data root whose shared objects are removed when the test ends, however it ends.
+struct RootWithObjects {
+  TempDir dir;
+  ~RootWithObjects() { navmisc::RemovePerRootObjects(dir.path()); }
+  std::string ObjectName() const {
+    return navmisc::PerRootObjectName("globals", navmisc::CanonicalDataRoot(dir.path())) + "-v" +
+           std::to_string(navmisc::detail::kSharedGlobalsType.layoutVersion);
+  }
 };
 
-TEST(SharedGlobals, SeenByOtherProcesses) {
-  const std::string name = UniqueName("share");
-  Unlinker unlink{name};
-  const CommandResult child = RunChildren(name, "write");
-  ASSERT_EQ(child.status, 0) << child.out;
+TEST(SharedGlobals, EachDataRootItsOwn) {
+  RootWithObjects a, b;
+  // What one process writes on root A, a later process on A sees, and one on B never does:
+  // a run on B must not redirect a run on A.
+  ASSERT_EQ(RunChildren(a.dir.path(), "write", 22).status, 0);
+  ASSERT_EQ(RunChildren(b.dir.path(), "write", 55).status, 0);
+  const CommandResult readA = RunChildren(a.dir.path(), "read", 22);
+  EXPECT_EQ(readA.status, 0) << readA.out;
+  const CommandResult readB = RunChildren(b.dir.path(), "read", 55);
+  EXPECT_EQ(readB.status, 0) << readB.out;
 
-  // The object outlives the writer, readable only by its owner, and holds what it wrote.
-  int fd = ::shm_open(name.c_str(), O_RDONLY, 0);
-  ASSERT_GE(fd, 0);
+  // The objects outlive their writers, readable only by their owner.
+  int fd = ::shm_open(a.ObjectName().c_str(), O_RDONLY, 0);
+  ASSERT_GE(fd, 0) << a.ObjectName();
   struct stat st;
   ASSERT_EQ(::fstat(fd, &st), 0);
   ::close(fd);
   EXPECT_EQ(std::tuple(st.st_mode & 0777, st.st_uid, static_cast<size_t>(st.st_size)),
-            std::tuple(0600u, ::geteuid(), sizeof(SharedBlockData)));
+            std::tuple(0600u, ::geteuid(), sizeof(SharedGlobalsBlock)));
 
-  std::error_code ec;
-  SharedMemory mem = SharedMemory::OpenExisting(name, ec);
-  ASSERT_TRUE(mem) << ec.message();
-  const auto& block = *static_cast<const SharedBlockData*>(mem.data());
-  using namespace navmisc::detail;
-  EXPECT_EQ(std::tuple(block.state, block.magic, block.layoutVersion),
-            std::tuple(kSharedBlockReady, kSharedBlockMagic, kSharedLayoutVersion));
-  EXPECT_EQ(std::tuple(int{block.nProductId}, block.nScanProgress, block.devConfig.nInterval,
-                       int{block.devConfig11.NAVI[28799]}, block.dDeviceVersion,
-                       block.bDeviceConnected),
-            std::tuple(int{GPS_APP_SPORT}, 77, 5, 0xAB, 1.25, true));
-  EXPECT_STREQ(block.szAppDataPath, L"/home/user/.local/share/navmisc");
+  // This process moves between the roots through the same references; another spelling of a
+  // root (through a link, with "..") is the same root.
+  const CString link = b.dir / L"link-to-a";
+  ASSERT_EQ(::symlink(a.dir.path().ToUtf8().c_str(), link.ToUtf8().c_str()), 0);
+  const GPS_APP_PROG_TYPE& product = g_nProductId;
+  for (const auto& [root, expected] :
+       {std::pair{b.dir.path(), 55}, {link, 22}, {b.dir / L"x/..", 55}}) {
+    ASSERT_TRUE(navmisc::UseDataRoot(root)) << root.ToUtf8();
+    EXPECT_EQ(std::tuple(int{product}, g_sVersionInfo.nBuild), std::tuple(expected, expected));
+    EXPECT_EQ(std::getenv(navmisc::kDataRootVariable), navmisc::ChosenDataRoot());
+  }
+  EXPECT_EQ(CString(g_szAppDataPath), b.dir.path());
+  EXPECT_FALSE(navmisc::UseDataRoot(L""));
 }
 
 TEST(SharedGlobals, ProcessesStartingTogetherInitialiseOnce) {
   // Had a late process initialised the block again, it would wipe the marks made before it.
-  const std::string name = UniqueName("race");
-  Unlinker unlink{name};
+  RootWithObjects root;
   constexpr int kChildren = 8;
-  const CommandResult children = RunChildren(name, "mark", kChildren);
+  const CommandResult children = RunChildren(root.dir.path(), "mark", 0, kChildren, true);
   EXPECT_EQ(children.status, 0) << children.out;
   std::error_code ec;
-  SharedMemory mem = SharedMemory::OpenExisting(name, ec);
+  SharedMemory mem = SharedMemory::OpenExisting(root.ObjectName(), ec);
   ASSERT_TRUE(mem) << ec.message();
-  const auto& block = *static_cast<const SharedBlockData*>(mem.data());
-  for (int i = 0; i < kChildren; ++i) EXPECT_EQ(block.devConfig11.NAVI[i], 1) << "mark " << i;
+  const auto& block = *static_cast<const SharedGlobalsBlock*>(mem.data());
+  for (int i = 0; i < kChildren; ++i) EXPECT_EQ(block.szGapiInfo[i], L'x') << "mark " << i;
 }
 
 TEST(SharedGlobals, ForeignObjectIsLeftAlone) {
-  const std::string name = UniqueName("foreign");
-  Unlinker unlink{name};
+  RootWithObjects root;
+  const std::string name = root.ObjectName();
   int fd = ::shm_open(name.c_str(), O_RDWR | O_CREAT | O_EXCL, 0600);
   ASSERT_GE(fd, 0);
   ASSERT_EQ(::ftruncate(fd, 100), 0);
   ASSERT_EQ(::write(fd, "foreign data", 12), 12);
 
   std::error_code ec;
-  EXPECT_FALSE(SharedMemory::OpenOrCreate(name, sizeof(SharedBlockData), ec));
+  EXPECT_FALSE(SharedMemory::OpenOrCreate(name, sizeof(SharedGlobalsBlock), ec));
   EXPECT_EQ(ec, std::errc::invalid_argument);
-  const CommandResult child = RunChildren(name, "fallback");
+  const CommandResult child = RunChildren(root.dir.path(), "fallback", 9);
   EXPECT_EQ(child.status, 0) << child.out;
   char bytes[13] = {};
   ASSERT_EQ(::pread(fd, bytes, 12, 0), 12);
@@ -152,24 +164,27 @@ TEST(SharedGlobals, ForeignObjectIsLeftAlone) {
 }
 
 TEST(SharedGlobals, JoinOrInitialiseByState) {
-  using namespace navmisc::detail;
+  using namespace navmisc;
+  constexpr SharedBlockType type = detail::kSharedGlobalsType;
   // A ready block of another layout is refused untouched; an initialiser that died half-way is
   // taken over after the bounded wait.
   const std::tuple<uint32_t, uint32_t, uint32_t, bool> cases[] = {
-      {kSharedBlockReady, kSharedBlockMagic, kSharedLayoutVersion + 1, false},
+      {kSharedBlockReady, type.magic, type.layoutVersion + 1, false},
       {kSharedBlockInitialising, 0, 0, true},
   };
   for (const auto& [state, magic, version, usable] : cases) {
-    auto block = std::make_unique<SharedBlockData>();
+    auto block = std::make_unique<SharedGlobalsBlock>();
     std::memset(static_cast<void*>(block.get()), 0, sizeof *block);
-    std::tie(block->state, block->magic, block->layoutVersion) = std::tuple(state, magic, version);
-    block->blockSize = sizeof *block;
-    block->nScanProgress = 42;
-    EXPECT_EQ(JoinOrInitialiseBlock(*block), usable) << state;
-    EXPECT_EQ(block->nScanProgress, usable ? 0 : 42) << state;
+    std::tie(block->header.state, block->header.magic, block->header.layoutVersion) =
+        std::tuple(state, magic, version);
+    block->header.blockSize = sizeof *block;
+    block->sVersionInfo.nBuild = 42;
+    bool fresh = false;
+    EXPECT_EQ(JoinOrInitialiseBlock(block->header, type, fresh), usable) << state;
+    EXPECT_EQ(std::tuple(fresh, block->sVersionInfo.nBuild), std::tuple(usable, usable ? 0 : 42));
     if (usable) {
-      EXPECT_EQ(std::tuple(block->state, block->magic),
-                std::tuple(kSharedBlockReady, kSharedBlockMagic));
+      EXPECT_EQ(std::tuple(block->header.state, block->header.magic),
+                std::tuple(kSharedBlockReady, type.magic));
     }
   }
 }

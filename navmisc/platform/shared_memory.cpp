@@ -14,8 +14,8 @@ namespace {
 
 std::error_code LastError() { return std::error_code(errno, std::generic_category()); }
 
-void* MapFd(int fd, size_t size, std::error_code& ec) {
-  void* p = ::mmap(nullptr, size, PROT_READ | PROT_WRITE, MAP_SHARED, fd, 0);
+void* MapFd(int fd, size_t size, std::error_code& ec, void* at) {
+  void* p = ::mmap(at, size, PROT_READ | PROT_WRITE, MAP_SHARED | (at ? MAP_FIXED : 0), fd, 0);
   if (p == MAP_FAILED) {
     ec = LastError();
     return nullptr;
@@ -55,7 +55,7 @@ SharedMemory& SharedMemory::operator=(SharedMemory&& other) noexcept {
 }
 
 SharedMemory SharedMemory::OpenOrCreate(const std::string& name, size_t size,
-                                        std::error_code& ec) {
+                                        std::error_code& ec, void* at) {
   ec.clear();
   if (size == 0) {
     ec = std::make_error_code(std::errc::invalid_argument);
@@ -89,7 +89,7 @@ SharedMemory SharedMemory::OpenOrCreate(const std::string& name, size_t size,
     ec = std::make_error_code(std::errc::invalid_argument);
     return {};
   }
-  void* p = MapFd(fd, size, ec);
+  void* p = MapFd(fd, size, ec, at);
   return p ? SharedMemory(p, size) : SharedMemory();
 }
 
@@ -111,13 +111,14 @@ SharedMemory SharedMemory::OpenExisting(const std::string& name, std::error_code
     return {};
   }
   const size_t size = static_cast<size_t>(st.st_size);
-  void* p = MapFd(fd, size, ec);
+  void* p = MapFd(fd, size, ec, nullptr);
   return p ? SharedMemory(p, size) : SharedMemory();
 }
 
-SharedMemory SharedMemory::Anonymous(size_t size, std::error_code& ec) {
+SharedMemory SharedMemory::Anonymous(size_t size, std::error_code& ec, void* at) {
   ec.clear();
-  void* p = ::mmap(nullptr, size, PROT_READ | PROT_WRITE, MAP_SHARED | MAP_ANONYMOUS, -1, 0);
+  void* p = ::mmap(at, size, PROT_READ | PROT_WRITE,
+                   MAP_SHARED | MAP_ANONYMOUS | (at ? MAP_FIXED : 0), -1, 0);
   if (p == MAP_FAILED) {
     ec = LastError();
     return {};

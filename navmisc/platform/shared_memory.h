@@ -21,12 +21,15 @@ class SharedMemory {
   // missing. An existing object is accepted only when it belongs to the effective user, grants
   // nothing to group and others (errc::permission_denied otherwise) and has exactly `size`
   // bytes, or none yet because its creator has not sized it (errc::invalid_argument otherwise).
-  // A new object reads as zeros.
-  static SharedMemory OpenOrCreate(const std::string& name, size_t size, std::error_code& ec);
+  // A new object reads as zeros. With `at`, the mapping replaces whatever this process has
+  // mapped at that page-aligned address (which must span `size` bytes and belong to the caller).
+  static SharedMemory OpenOrCreate(const std::string& name, size_t size, std::error_code& ec,
+                                   void* at = nullptr);
   // Maps the whole of an existing object; errc::no_such_file_or_directory when it is missing.
   static SharedMemory OpenExisting(const std::string& name, std::error_code& ec);
   // `size` bytes of zeros shared with the children this process forks, and with nobody else.
-  static SharedMemory Anonymous(size_t size, std::error_code& ec);
+  // `at` as for OpenOrCreate.
+  static SharedMemory Anonymous(size_t size, std::error_code& ec, void* at = nullptr);
   // Removes the name; mappings that exist stay valid.
   static bool Unlink(const std::string& name, std::error_code& ec);
 
