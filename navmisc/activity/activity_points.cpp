@@ -6,8 +6,19 @@
 #include "navmisc/activity/detail/per_second.h"
 #include "navmisc/geo/gps_helper.h"
 #include "navmisc/records/track.h"
+#include "navmisc/records/trip.h"
 
 namespace navmisc::activity {
+
+namespace {
+
+// Whether the trip's optimisation settings hide a point of mark `type`.
+bool Hidden(const BLOG_ITEM_INFO* trip, int32_t type) {
+  if (!trip || !trip->optOptimize) return false;
+  return (type == -2 && trip->optRevise) || (type == -1 && trip->optRedundance);
+}
+
+}  // namespace
 
 bool HasFix(const WAYPOINT_ITEM_INFO& p) {
   return !((p.latitude == 0.0 && p.longitude == 0.0) || (p.latitude == 45.0 && p.longitude == 45.0));
@@ -34,7 +45,7 @@ void MergePoints(const CPtrList& tracks, const CPtrList* heartRates, const CPtrL
       if (!p || p->time == -1) continue;
       ActivityPoint& a = out.emplace_back();
       a.time = p->time;
-      a.type = p->type;
+      a.type = Hidden(t->trip, p->type) ? p->type : 0;
       a.latitude = p->latitude;
       a.longitude = p->longitude;
       a.cosLatitude = std::cos(p->latitude * navmisc::geo::kDegToRad);
@@ -82,7 +93,8 @@ double SmallAsin(double x) {
 }
 constexpr double kSeriesLimit = 1e-3;
 
-// CGPSHelper::GetDistance in kilometres between two points whose latitude cosines are known.
+}  // namespace
+
 double LegKm(const ActivityPoint& a, const ActivityPoint& b) {
   using navmisc::geo::kDegToRad;
   using navmisc::geo::kEarthRadiusKm;
@@ -98,8 +110,6 @@ double LegKm(const ActivityPoint& a, const ActivityPoint& b) {
   // Less than a centimetre is rounding noise of the inputs, not a distance.
   return c * 6371000.0 < 0.01 ? 0.0 : c * kEarthRadiusKm;
 }
-
-}  // namespace
 
 std::vector<double> LegLengthsKm(const PointVector& points) {
   std::vector<double> legs(points.size(), 0.0);

@@ -36,8 +36,10 @@ using PointVector = std::vector<ActivityPoint>;
 bool HasFix(const WAYPOINT_ITEM_INFO& p);
 
 // Replaces `out` by the points of `tracks` (TRACK_ITEM_INFO*) that have a time, ordered by
-// time (stable, so equal times keep track order). Each point's `present` bits say which
-// readings it holds:
+// time (stable, so equal times keep track order). A point keeps its optimisation mark as its
+// state when its trip hides points so marked (the trip's optimise switch and its revise switch
+// for -2, its redundance switch for -1); otherwise its state is 0. Each point's `present` bits
+// say which readings it holds:
 //  - kHasPosition: the track has GPS data and the point is not at 0/0 or 45/45;
 //  - kHasHeartRate: a heart-rate sample above 0 at the point's second;
 //  - kHasCadence: a cadence sample at that second;
@@ -47,9 +49,11 @@ bool HasFix(const WAYPOINT_ITEM_INFO& p);
 void MergePoints(const CPtrList& tracks, const CPtrList* heartRates, const CPtrList* cadences,
                  PointVector& out);
 
+// CGPSHelper::GetDistance in kilometres between two points (to within 1e-15 of it).
+double LegKm(const ActivityPoint& a, const ActivityPoint& b);
+
 // Length in kilometres of the leg that ends at each point: element i is the great-circle
-// distance from point i-1 to point i (whatever their flags), as CGPSHelper::GetDistance gives
-// it (to within 1e-15 of it); element 0 is 0.
+// distance from point i-1 to point i (whatever their flags), by LegKm; element 0 is 0.
 std::vector<double> LegLengthsKm(const PointVector& points);
 
 // Indexes [first, last] of the points inside a time range; empty when none.

@@ -129,13 +129,17 @@ long ExerciseEnergy(const PointVector& points, IndexRange range, int sportType, 
   if (range.empty) return 0;
   const int threshold = static_cast<int>(0.65 * MaxHeartRate(person) + 0.5);
   double sum = 0.0;
+  size_t prevIndex = range.first;
   for (size_t i = range.first + 1; i <= range.last; ++i) {
     const ActivityPoint& cur = points[i];
+    if (cur.type < 0) continue;  // left out, as in the summary
+    const ActivityPoint& prev = points[prevIndex];
+    prevIndex = i;
     const bool hasHr = cur.Has(WAYPOINT_ITEM_INFO::kHasHeartRate);
     if (hasHr && cur.heartRate >= threshold) {
       sum += HeartRateEnergy(person, cur.heartRate);
     } else {
-      const long step = static_cast<long>(cur.time) - points[i - 1].time;
+      const long step = static_cast<long>(cur.time) - prev.time;
       sum += MovingEnergy(sportType, person.weight, step, cur.speed * 0.001);
     }
   }

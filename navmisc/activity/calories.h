@@ -52,7 +52,8 @@ double HeartRateEnergy(const Person& person, int heartRate);
 // t / 3600 * MET * 1000 * W: moving `seconds` at `kmh`.
 double MovingEnergy(int sportType, double weightKg, long seconds, double kmh);
 
-// The exercise energy over the pairs of `points` from range.first to range.last: per pair the
+// The exercise energy over the pairs of `points` from range.first to range.last (points with a
+// negative state are stepped over, as the summaries do): per pair the
 // heart-rate energy when the later point has a heart rate of at least round(0.65 * maximum),
 // otherwise the moving energy of the pair's time step at the later point's logger speed.
 // Summed, plus 0.5, truncated. 0 for an empty range.

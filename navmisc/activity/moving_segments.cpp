@@ -82,10 +82,7 @@ std::vector<MovingSegment> BuildMovingSegments(const PointVector& points, const 
     // point reports.
     double metres;
     if (Fixed(a) && Fixed(b)) {
-      metres = 1000.0 * ((ia + 1 == ib) ? legKm[ib]
-                                         : navmisc::geo::HaversineAngle(a.latitude, a.longitude, a.cosLatitude,
-                                                                        b.latitude, b.longitude, b.cosLatitude) *
-                                               navmisc::geo::kEarthRadiusKm);
+      metres = 1000.0 * (ia + 1 == ib ? legKm[ib] : LegKm(a, b));
     } else {
       metres = ReportedSpeed(b) * static_cast<double>(dt) / 3600.0;
     }

@@ -251,6 +251,40 @@ TEST_F(SportStore, RoundTripOfTheStoreFile) {
   EXPECT_EQ(std::tuple(walk->GetTotalCalorie(), walk->GetSelectedCalorie()), std::tuple(0L, 0L));
 }
 
+TEST_F(SportStore, MergedPointsCarryReadingsAndTheTripsMarks) {
+  std::unique_ptr<BLOG_ITEM_INFO> trip(NewTrip(GPS_APP_SPORT, {{30, 47.0, 8.0, 0, 0, -1}, {10, 45.0, 45.0, 0, 0, -2},
+                                                               {-1, 47.0, 8.0}, {20, 0.0, 0.0}}));
+  auto* track = static_cast<TRACK_ITEM_INFO*>(trip->tracks.GetHead());
+  track->heartRates.AddTail(navmisc::activitytest::HeartRates(10, {0, 0, 140}));  // 0: no reading
+  auto* wheel = new WHEEL_SPEED_ITEM_INFO;
+  wheel->time = 20;
+  wheel->values[0] = 4.5;
+  track->wheelSpeeds.AddTail(wheel);
+  navmisc::activitytest::AddTrack(*trip, {{20, 47.1, 8.1, 0, 0, -2}})->hasGpsData = false;
+
+  auto merged = [&](const CPtrList* hr) {
+    navmisc::activity::PointVector points;
+    navmisc::activity::MergePoints(trip->tracks, hr, nullptr, points);
+    std::vector<std::tuple<int32_t, int32_t, int, int, double>> out;  // time, state, flags, bpm, m/s
+    for (const auto& p : points) out.emplace_back(p.time, p.type, p.present, p.heartRate, p.speedReading);
+    return out;
+  };
+  using Merged = std::vector<std::tuple<int32_t, int32_t, int, int, double>>;
+  // In time order (the second track's point after the first's of the same second); the untimed
+  // point gone; no position at 45/45, 0/0 or on a track without GPS data.
+  EXPECT_EQ(merged(nullptr), (Merged{{10, -2, 0, 0, 0.0}, {20, 0, 8, 0, 4.5}, {20, -2, 8, 0, 4.5}, {30, -1, 1, 0, 0.0}}));
+  CPtrList other;  // heart rate from a list of the caller's instead of the tracks'
+  std::unique_ptr<HEARTRATE_ITEM_INFO> hr(navmisc::activitytest::HeartRates(30, {150}));
+  other.AddTail(hr.get());
+  EXPECT_EQ(std::get<3>(merged(&other)[3]), 150);
+  EXPECT_EQ(std::get<2>(merged(&other)[3]), 3);
+  // Marks count only where the trip's settings hide them.
+  trip->optRedundance = false;
+  EXPECT_EQ(std::get<1>(merged(nullptr)[3]), 0);
+  trip->optOptimize = false;
+  EXPECT_EQ(std::get<1>(merged(nullptr)[0]), 0);
+}
+
 // The store file of the clean-up tests: `sections` follow the head.
 void WriteStoreFile(const std::string& head, const std::string& sections) {
   MakeDir(GetAppDataFolder(GPS_APP_SPORT));

@@ -36,14 +36,23 @@ void Summarize(PointVector& points, const std::vector<double>& legKm, long start
     double reference = head.altitude;
     double ascent = 0.0, descent = 0.0;
     long previousStep = 0;  // the time step of the pair before the current one
+    // Pairs join consecutive points that take part: a point left out of the statistics is
+    // stepped over, so that a wild fix or the wander of a stop adds nothing.
+    size_t prevIndex = range.first;
     for (size_t i = range.first + 1; i <= range.last; ++i) {
-      const ActivityPoint& prev = points[i - 1];
       ActivityPoint& cur = points[i];
+      if (cur.type < 0) {
+        cur.distance = distance;
+        continue;
+      }
+      const ActivityPoint& prev = points[prevIndex];
+      const double leg = prevIndex + 1 == i ? legKm[i] : LegKm(prev, cur);
+      prevIndex = i;
       const long step = static_cast<long>(cur.time) - prev.time;
 
       double km;
       if (!sport || cur.Has(WAYPOINT_ITEM_INFO::kHasPosition)) {
-        km = legKm[i];
+        km = leg;
       } else if (cur.Has(WAYPOINT_ITEM_INFO::kHasSpeed) && cur.speedReading >= 0) {
         // The step of the previous pair, not of this one: the sport application has always
         // measured sensor-only legs so, and its stored figures depend on it.
@@ -51,7 +60,7 @@ void Summarize(PointVector& points, const std::vector<double>& legKm, long start
       } else if (prev.Has(WAYPOINT_ITEM_INFO::kHasSpeed)) {
         km = 0.0;
       } else {
-        km = legKm[i];
+        km = leg;
       }
       distance += km * 1000.0;
       cur.distance = distance;
@@ -85,7 +94,8 @@ void Summarize(PointVector& points, const std::vector<double>& legKm, long start
     if (!sport) {
       // The tracker takes the largest logger speed of every point in range, the first too.
       maxSpeed = head.speed;
-      for (size_t i = range.first; i <= range.last; ++i) maxSpeed = std::max<double>(maxSpeed, points[i].speed);
+      for (size_t i = range.first; i <= range.last; ++i)
+        if (points[i].type >= 0) maxSpeed = std::max<double>(maxSpeed, points[i].speed);
     }
     out.distance = distance;
     out.maxSpeed = maxSpeed;

@@ -45,7 +45,8 @@ enum class SummaryRules {
 };
 
 // Computes `out` over the UTC range [start, end] of `points` (in time order; `legKm` from
-// LegLengthsKm) with `moving` summed from the moving segments. Writes each point's cumulative
+// LegLengthsKm) with `moving` summed from the moving segments. The pairs join consecutive
+// points whose state is 0 or more; points with a negative state are stepped over. Writes each point's cumulative
 // distance (distance) over the range. `timeShift` (seconds) turns the range into the local
 // start and end of the figures. `moving.time` is capped at the duration.
 void Summarize(PointVector& points, const std::vector<double>& legKm, long start, long end, long timeShift,

@@ -87,7 +87,8 @@ TEST(Summary, SensorLegsUseThePreviousPairsTimeStep) {
 
 TEST(Summary, EmptyRangesAndZeroDivisorsGiveZeros) {
   PointVector points = Northwards({10, 10, 10});
-  points[1].type = -1;  // left out at either end of a range, not inside it
+  points[1].type = -1;  // left out: a wild fix a kilometre off
+  points[1].latitude += 0.01;
   SportFigures f;
   // No points in range; a single point; a range of no time; no moving distance; no heart rate.
   for (auto [start, end] : {std::pair{0L, 999L}, std::pair{1010L, 1015L}, std::pair{1020L, 1020L}}) {
@@ -101,7 +102,7 @@ TEST(Summary, EmptyRangesAndZeroDivisorsGiveZeros) {
   // The selected moving time never exceeds the selection; pace follows it.
   Summarize(points, LegLengthsKm(points), 1000, 1020, 0, SummaryRules::kSport, {500, 100.0}, f);
   EXPECT_EQ(std::tuple(f.movingTime, f.pace), std::tuple(20, 200));
-  EXPECT_NEAR(f.distance, 22.24, 0.01);  // through the left-out middle point
+  EXPECT_NEAR(f.distance, 22.24, 0.01);  // straight past the left-out point
 
   // Heart rate and cadence count every point of the range, left out or not.
   points[1].present |= kHr;

@@ -97,6 +97,7 @@ void RunDemo(std::string root) {
   std::printf("  (tracker day: %ld cell fixes, %ld help points)\n", cells, help);
   DemoGeometry();
   DemoExports(root);
+  DemoActivities(run->tripId, tracker.tripId);
   std::printf("\nTry: navmisc --data-root %s trips\n", root.c_str());
 }
 
