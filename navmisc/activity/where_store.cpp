@@ -1,5 +1,6 @@
 #include "navmisc/activity/where_store.h"
 
+#include "navmisc/activity/store_file.h"
 #include "navmisc/platform/atomic_file.h"
 #include "navmisc/platform/files.h"
 #include "navmisc/platform/format.h"
@@ -69,17 +70,13 @@ bool WHEREIAM_DATA_NODE::AddWhereItem(WHERE_ITEM_TYPE type, long time, double lo
 
 int WHEREIAM_DATA_NODE::ReadInfo(unsigned long handle, const wchar_t* section) {
   readGuard.Begin();
-  const bool own = handle == 0;
-  if (own) {
-    handle = RD_BEGIN(GetStorePathName());
-    if (!handle) {
-      readGuard.End(false);
-      return 0;
-    }
-    section = L"SECTION";
+  navmisc::activity::StoreFileReader file(handle, section, GetStorePathName());
+  if (!file.ok()) {
+    readGuard.End(false);
+    return 0;
   }
-  const auto type = static_cast<WHERE_ITEM_TYPE>(RD_INT(handle, section, L"whereiam_item_type", 0));
-  const CString id = RD_STRING(handle, section, L"whereiam_item_info", L"");
+  const auto type = static_cast<WHERE_ITEM_TYPE>(RD_INT(file.handle(), file.section(), L"whereiam_item_type", 0));
+  const CString id = RD_STRING(file.handle(), file.section(), L"whereiam_item_info", L"");
   if (!id.IsEmpty()) {
     auto* trip = IsPlainPathComponent(id) ? new BLOG_ITEM_INFO(GPS_APP_WHEREAMI, id, 0) : nullptr;
     if (trip && trip->ReadInfo() == 1) {
@@ -89,25 +86,19 @@ int WHEREIAM_DATA_NODE::ReadInfo(unsigned long handle, const wchar_t* section) {
       readGuard.Dropped();
     }
   }
-  if (own) RD_END(handle);
   readGuard.End(true);
   return 1;
 }
 
 bool WHEREIAM_DATA_NODE::WriteInfo(bool writeTrip, unsigned long handle, const wchar_t* section) {
-  const bool own = handle == 0;
-  if (own) {
-    MakeDir(GetAppDataFolder(GPS_APP_WHEREAMI));
-    handle = WR_BEGIN(GetStorePathName());
-    if (!handle) return false;
-    section = L"SECTION";
-  }
+  navmisc::activity::StoreFileWriter file(handle, section, GetStorePathName());
+  if (!file.ok()) return false;
   if (item) {
-    WR_INT(handle, section, L"whereiam_item_type", itemType);
-    WR_STRING(handle, section, L"whereiam_item_info", item->tripId);
+    WR_INT(file.handle(), file.section(), L"whereiam_item_type", itemType);
+    WR_STRING(file.handle(), file.section(), L"whereiam_item_info", item->tripId);
     if (writeTrip) item->WriteInfo(1, nullptr, nullptr);
   }
-  return own ? WR_END(handle) == 1 : true;
+  return file.Finish();
 }
 
 void WHEREIAM_DATA_NODE::_FindAllUsedResource(CStringList& ids) {

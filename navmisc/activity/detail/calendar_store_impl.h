@@ -8,6 +8,7 @@
 
 #include "navmisc/activity/calendar_store.h"
 #include "navmisc/activity/calories.h"
+#include "navmisc/activity/store_file.h"
 #include "navmisc/platform/files.h"
 #include "navmisc/platform/settings.h"
 #include "navmisc/platform/shared_globals.h"
@@ -186,25 +187,16 @@ typename CalendarStore<Item, Store>::Month* CalendarStore<Item, Store>::GetRecen
 template <class Item, class Store>
 int CalendarStore<Item, Store>::ReadInfo(unsigned long handle, const wchar_t* section) {
   readGuard.Begin();
-  const bool own = handle == 0;
-  if (own) {
-    handle = RD_BEGIN(GetStorePathName());
-    if (!handle) {
-      readGuard.End(false);
-      return 0;
-    }
-    section = L"SECTION";
+  StoreFileReader file(handle, section, GetStorePathName());
+  const CString name = file.ok() ? RD_STRING(file.handle(), file.section(), L"user_name", L"") : CString();
+  if (name.IsEmpty()) {
+    readGuard.End(false);
+    return 0;
   }
-  auto finish = [&](bool ok) {
-    if (own) RD_END(handle);
-    readGuard.End(ok);
-    return ok ? 1 : 0;
-  };
-  const CString name = RD_STRING(handle, section, L"user_name", L"");
-  if (name.IsEmpty()) return finish(false);
+  handle = file.handle();
+  section = file.section();
   Clear();
   userName = name;
-
   const CString prefix = Item::kKeyPrefix;
   const long long count = std::max(RD_INT(handle, section, prefix + L"_count", 0), 0);
   // Only the sections the file holds are visited: a count of two thousand million costs no
@@ -218,7 +210,7 @@ int CalendarStore<Item, Store>::ReadInfo(unsigned long handle, const wchar_t* se
     const CString digits = s.Mid(head.GetLength(), s.GetLength() - head.GetLength() - 1);
     if (digits.GetLength() > 10) continue;
     const long long n = wcstoll(digits, nullptr, 10);
-    if (n < count && FormatString(L"%s_(%lld)", static_cast<const wchar_t*>(prefix), n) == s) {
+    if (n >= 0 && n < count && FormatString(L"%s_(%lld)", static_cast<const wchar_t*>(prefix), n) == s) {
       numbers.push_back(static_cast<int>(n));
     }
   }
@@ -244,18 +236,16 @@ int CalendarStore<Item, Store>::ReadInfo(unsigned long handle, const wchar_t* se
     }
     item->ReadStoreKeys(handle, s);
   }
-  return finish(true);
+  readGuard.End(true);
+  return 1;
 }
 
 template <class Item, class Store>
 bool CalendarStore<Item, Store>::WriteInfo(bool writeTrips, unsigned long handle, const wchar_t* section) {
-  const bool own = handle == 0;
-  if (own) {
-    MakeDir(GetAppDataFolder(Item::kAppType));
-    handle = WR_BEGIN(GetStorePathName());
-    if (!handle) return false;
-    section = L"SECTION";
-  }
+  StoreFileWriter file(handle, section, GetStorePathName());
+  if (!file.ok()) return false;
+  handle = file.handle();
+  section = file.section();
   WR_STRING(handle, section, L"user_name", userName);
   const CString prefix = Item::kKeyPrefix;
   int counter = 0;
@@ -271,7 +261,7 @@ bool CalendarStore<Item, Store>::WriteInfo(bool writeTrips, unsigned long handle
     }
   }
   WR_INT(handle, section, prefix + L"_count", counter);
-  return own ? WR_END(handle) == 1 : true;
+  return file.Finish();
 }
 
 template <class Item, class Store>
