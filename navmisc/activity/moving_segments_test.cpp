@@ -111,14 +111,6 @@ TEST(MovingSegments, GapsStopsAndBreaksWithoutNoise) {
   EXPECT_EQ(SamplingInterval({}), 1);
 }
 
-// The python that has gpxpy (Debian's), or "".
-std::string PythonWithGpxpy() {
-  for (const char* python : {"/usr/bin/python3", "python3"}) {
-    if (RunCommand(std::string(python) + " -c 'import gpxpy' 2>/dev/null").status == 0) return python;
-  }
-  return {};
-}
-
 TEST(MovingSegments, AWalkWithStopsAgainstTheTruthAndGpxpy) {
   // A 50-minute town walk at 1.4 m/s with a wandering GPS error of about 2 m: a red light,
   // a coffee, a look at a shop window.
@@ -134,7 +126,7 @@ TEST(MovingSegments, AWalkWithStopsAgainstTheTruthAndGpxpy) {
   const int32_t ours = MovingTime(r.points);
   EXPECT_NEAR(ours, truth, truth * 0.03);
 
-  const std::string python = PythonWithGpxpy();
+  const std::string python = navmisc::testutil::PythonWithModule("gpxpy");
   if (python.empty()) GTEST_SKIP() << "python3-gpxpy is not installed (scripts/setup.sh installs it)";
   TempDir dir;
   TRACK_ITEM_INFO track(nullptr);

@@ -39,14 +39,6 @@ struct Demo {
 
 bool Shows(const CommandResult& r, const std::string& text) { return r.out.find(text) != std::string::npos; }
 
-// The python that has gpxpy (Debian's), or "".
-std::string PythonWithGpxpy() {
-  for (const char* python : {"/usr/bin/python3", "python3"}) {
-    if (RunCommand(std::string(python) + " -c 'import gpxpy' 2>/dev/null").status == 0) return python;
-  }
-  return {};
-}
-
 TEST(ActivityCommands, TheDemoFilesItsActivitiesAndSumsTheRunUp) {
   Demo d;
   for (const wchar_t* file : {L"SportRes/SPORTRES_INFO.INI", L"TrackerRes/TRACKERRES_INFO.INI",
@@ -81,7 +73,7 @@ TEST(ActivityCommands, TheDemoFilesItsActivitiesAndSumsTheRunUp) {
   EXPECT_TRUE(Shows(part, "duration         0:30:00                  0:10:00")) << part.out;
 
   // The same run through gpxpy, for the moving time beside ours.
-  const std::string python = PythonWithGpxpy();
+  const std::string python = navmisc::testutil::PythonWithModule("gpxpy");
   if (!python.empty()) {
     const std::string gpx = (d.root / L"run.gpx").ToUtf8();
     ASSERT_EQ(d.Run("export " + run + " --format gpx -o " + ShellQuote(gpx)).status, 0);
