@@ -4,6 +4,7 @@
 #include <utility>
 #include <vector>
 
+#include "navmisc/activity/activity_points.h"
 #include "navmisc/activity/calories.h"
 #include "navmisc/activity/detail/per_second.h"
 #include "navmisc/export/detail/export_common.h"
@@ -20,10 +21,6 @@ constexpr uint8_t kHasPosition = WAYPOINT_ITEM_INFO::kHasPosition;
 constexpr uint8_t kHasHeartRate = WAYPOINT_ITEM_INFO::kHasHeartRate;
 constexpr uint8_t kHasCadence = WAYPOINT_ITEM_INFO::kHasCadence;
 constexpr uint8_t kHasSpeed = WAYPOINT_ITEM_INFO::kHasSpeed;
-
-bool HasPosition(const WAYPOINT_ITEM_INFO& p) {
-  return !((p.latitude == 0.0 && p.longitude == 0.0) || (p.latitude == 45.0 && p.longitude == 45.0));
-}
 
 }  // namespace
 
@@ -51,7 +48,7 @@ bool FillTcxLap(TRACK_ITEM_INFO& track, TcxLap& lap, int32_t sportType) {
     if (p->time == -1) continue;
 
     flags = kHasSpeed;
-    if (HasPosition(*p)) {
+    if (navmisc::activity::HasFix(*p)) {
       flags |= kHasPosition;
       if (previous) {
         distance += helper.GetDistance(previous->latitude, previous->longitude, p->latitude,

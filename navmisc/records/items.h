@@ -38,7 +38,8 @@ class WAYPOINT_ITEM_INFO : public BASE_ITEM_INFO {
   // Indices into `flags`.
   static constexpr int kFlagKept = 0;      // set by the cleaning passes on points that stay
   static constexpr int kFlagPresence = 1;  // which working values hold a reading (bits below)
-  // Bits of flags[kFlagPresence], set by the TCX export and the activity summaries.
+  // Bits of flags[kFlagPresence], set by the TCX export; the activity summaries mark their own
+  // points with the same bits.
   static constexpr uint8_t kHasPosition = 1;   // latitude and longitude are a real fix
   static constexpr uint8_t kHasHeartRate = 2;  // workHeartRate
   static constexpr uint8_t kHasCadence = 4;    // workCadence
@@ -59,9 +60,8 @@ class WAYPOINT_ITEM_INFO : public BASE_ITEM_INFO {
   int32_t extraB = 0;     // stored in the main point file only
   uint8_t flags[4] = {0, 0, 0, 0};
 
-  // Working values: scratch for processing, never copied. The TCX export and the activity
-  // summaries use them as the cumulative distance (metres), speed reading (metres per second),
-  // heart rate (bpm) and cadence (rpm).
+  // Working values: scratch for processing, never copied. The TCX export reads them as the
+  // cumulative distance (metres), speed (metres per second), heart rate (bpm) and cadence (rpm).
   double workDistance = 0.0;
   double workSpeed = 0.0;
   int32_t workHeartRate = 0;
