@@ -138,11 +138,17 @@ MovingTotals SumMovingSegments(const std::vector<MovingSegment>& segments) {
 
 MovingTotals SumMovingSegments(const std::vector<MovingSegment>& segments, long start, long end) {
   MovingTotals t;
+  double distance = 0.0;
   for (const MovingSegment& s : segments) {
-    if (s.startTime < start || s.startTime > end) continue;
-    t.time += s.duration;
-    t.distance += s.distance;
+    // A segment's pairs follow each other without a pause, so it spans its duration from its
+    // start; the range takes the part of that span it covers.
+    const long from = std::max<long>(start, s.startTime);
+    const long to = std::min<long>(end, static_cast<long>(s.startTime) + s.duration);
+    if (to <= from || s.duration <= 0) continue;
+    t.time += static_cast<int32_t>(to - from);
+    distance += s.distance * static_cast<double>(to - from) / s.duration;
   }
+  t.distance = distance;
   return t;
 }
 

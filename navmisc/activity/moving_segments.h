@@ -39,7 +39,8 @@ struct MovingTotals {
 };
 // Sums every segment.
 MovingTotals SumMovingSegments(const std::vector<MovingSegment>& segments);
-// Sums the segments that start inside [start, end] (UTC seconds).
+// Sums the parts of the segments that lie inside [start, end] (UTC seconds): a segment the range
+// cuts counts with the time inside it, and with its distance in proportion to that time.
 MovingTotals SumMovingSegments(const std::vector<MovingSegment>& segments, long start, long end);
 
 }  // namespace navmisc::activity

@@ -109,6 +109,19 @@ TEST(MovingSegments, GapsStopsAndBreaksWithoutNoise) {
   EXPECT_EQ(MovingTime(r.points), 0);
   EXPECT_EQ(SamplingInterval(r.points), 1);
   EXPECT_EQ(SamplingInterval({}), 1);
+
+  // A selection takes the part of each segment inside it, distance in proportion.
+  const std::vector<MovingSegment> segments = {{0, 100, 100, 1000.0}, {9, 300, 50, 100.0}};
+  const struct {
+    long start, end;
+    int32_t time;
+    double distance;
+  } cuts[] = {{0, 1000, 150, 1100.0}, {150, 320, 70, 540.0}, {200, 300, 0, 0.0}, {120, 130, 10, 100.0}};
+  for (const auto& c : cuts) {
+    const MovingTotals t = SumMovingSegments(segments, c.start, c.end);
+    EXPECT_EQ(t.time, c.time) << c.start << ".." << c.end;
+    EXPECT_DOUBLE_EQ(t.distance, c.distance) << c.start << ".." << c.end;
+  }
 }
 
 TEST(MovingSegments, AWalkWithStopsAgainstTheTruthAndGpxpy) {

@@ -187,6 +187,7 @@ TEST_F(SportStore, SummaryCaloriesAndTheOwnersBody) {
   EXPECT_EQ(std::tuple(item.selStartTime, item.selEndTime, item.selected.duration, item.whole.duration),
             std::tuple(int32_t(start + 7200), int32_t(start + 7499), 299, 599));
   EXPECT_EQ(item.GetTotalCalorie(), 75871 + 5873);
+  EXPECT_EQ(item.selected.movingTime, 299);  // the part of the one long segment inside
 
   // Weight on the activity's date.
   double kg = 0, cm = 0;
