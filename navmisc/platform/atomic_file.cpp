@@ -129,6 +129,7 @@ bool AtomicFile::Open(const wchar_t* path) {
   fd_ = fd;
   temp_ = std::move(temp);
   failed_ = false;
+  keepTimes_ = false;
   written_ = writtenBack_ = 0;
   buffer_.clear();
   buffer_.reserve(kBufferSize);
@@ -172,31 +173,50 @@ void AtomicFile::StartWriteback() {
   writtenBack_ = written_;
 }
 
-bool AtomicFile::Commit() {
+void AtomicFile::SetTimes(const struct timespec& accessed, const struct timespec& modified) {
+  times_[0] = accessed;
+  times_[1] = modified;
+  keepTimes_ = true;
+}
+
+bool AtomicFile::Commit() { return Seal(true) && Publish(true); }
+
+bool AtomicFile::Seal(bool durable) {
   if (fd_ < 0) return false;
   // The data must be on disk before the rename makes it visible, or a crash could leave the
-  // target name pointing at an empty or partial file.
-  bool ok = Flush() && FsyncRetry(fd_);
+  // target name pointing at an empty or partial file: here, or by the caller before Publish. The
+  // times are set after the last write, which would otherwise move the modification time again.
+  bool ok = Flush() && (!keepTimes_ || ::futimens(fd_, times_) == 0) && (!durable || FsyncRetry(fd_));
   const int fd = fd_;
   fd_ = -1;
   if (RetryClose(fd) != 0) ok = false;
-  if (ok && ::rename(temp_.c_str(), target_.c_str()) != 0) ok = false;
-  if (!ok) {
-    ::unlink(temp_.c_str());
-    temp_.clear();
-    buffer_.clear();
-    failed_ = false;
+  // Many sealed files may wait for their Publish: none keeps its buffer meanwhile.
+  std::string().swap(buffer_);
+  if (!ok) Abandon();
+  return ok;
+}
+
+bool AtomicFile::Publish(bool syncFolder) {
+  if (fd_ >= 0 || temp_.empty()) return false;
+  if (::rename(temp_.c_str(), target_.c_str()) != 0) {
+    Abandon();
     return false;
   }
   temp_.clear();
   // Make the rename itself durable. The new content is in place either way, so a folder that
   // cannot be synced does not fail the commit.
-  const int dir = ::open(FolderOf(target_).c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC);
+  if (syncFolder) SyncFolder(FolderOf(target_));
+  return true;
+}
+
+const std::string& AtomicFile::TempPath() const { return temp_; }
+
+void SyncFolder(const std::string& folder) {
+  const int dir = ::open(folder.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC);
   if (dir >= 0) {
     FsyncRetry(dir);
     RetryClose(dir);
   }
-  return true;
 }
 
 void AtomicFile::Abandon() {

@@ -19,10 +19,10 @@ CString RD_STRING(unsigned long handle, const wchar_t* section, const wchar_t* k
                   const wchar_t* def = L"");
 // True when the key is present in the section (whatever its value).
 bool RD_EXISTS(unsigned long handle, const wchar_t* section, const wchar_t* key);
-// Appends the name of every section that holds at least one key, once each and in no
-// particular order, with ASCII letters in lower case (names match without regard to case).
-// Lets a reader visit the sections a file really has instead of trusting a count inside it.
-void RD_SECTIONS(unsigned long handle, CStringList& names);
+// Appends the names of the file's sections to `names` in the order they first appear, each
+// once; returns how many. Lets a reader visit what a file holds instead of trying every name a
+// count inside the file promises.
+int RD_SECTIONS(unsigned long handle, CStringList& names);
 void RD_END(unsigned long handle);
 
 // Starts a new document for `path`; 0 when `path` is empty.

@@ -69,6 +69,9 @@ void AddSummaryCommand(CLI::App& app);
 void AddSportCommand(CLI::App& app);
 void AddTrackerCommand(CLI::App& app);
 void AddWhereCommand(CLI::App& app);
+// `navmisc photos add|list` and `navmisc geotag` (cmd_photos.cpp).
+void AddPhotosCommand(CLI::App& app);
+void AddGeotagCommand(CLI::App& app);
 // `navmisc help [COMMAND]`: the program's or a command's help.
 void AddHelpCommand(CLI::App& app);
 

@@ -12,6 +12,7 @@
 #include "navmisc/platform/temp_folder.h"
 #include "navmisc/records/trip_tree.h"
 #include "navmisc/records/user_profile.h"
+#include "photo_cli.h"
 #include "synthetic.h"
 
 namespace navmisc::cli {
@@ -96,6 +97,7 @@ void RunDemo(std::string root) {
   }
   std::printf("  (tracker day: %ld cell fixes, %ld help points)\n", cells, help);
   DemoGeometry();
+  DemoPhotos(journey->tripId.ToUtf8());
   DemoExports(root);
   DemoActivities(run->tripId, tracker.tripId);
   std::printf("\nTry: navmisc --data-root %s trips\n", root.c_str());

@@ -205,7 +205,8 @@ int CalendarStore<Item, Store>::ReadInfo(unsigned long handle, const wchar_t* se
   CStringList sections;
   RD_SECTIONS(handle, sections);
   const CString head = prefix + L"_(";
-  for (const CString& s : sections) {
+  for (CString s : sections) {
+    s.MakeLower();  // the file may spell the names in any case
     if (s.GetLength() < head.GetLength() + 2 || s.Left(head.GetLength()) != head || s.Right(1) != L")") continue;
     const CString digits = s.Mid(head.GetLength(), s.GetLength() - head.GetLength() - 1);
     if (digits.GetLength() > 10) continue;
