@@ -8,10 +8,10 @@
 #pragma once
 
 #include "navmisc/activity/calendar.h"
-#include "navmisc/activity/store_cleanup.h"
 #include "navmisc/platform/cstring.h"
 #include "navmisc/platform/lists.h"
 #include "navmisc/platform/types.h"
+#include "navmisc/records/resource_cleanup.h"
 
 class BLOG_ITEM_INFO;
 
@@ -57,7 +57,7 @@ class CalendarStore {
 
   CString userName;  // the owner; an empty name marks an empty store
   CPtrList months;   // Month*, owned; by year, then month
-  CompleteRead readGuard;
+  CompleteReadGuard readGuard;
 
  protected:
   // Files a new activity of `type` for `trip` (taking the trip); null when the trip's start

@@ -71,10 +71,7 @@ bool WHEREIAM_DATA_NODE::AddWhereItem(WHERE_ITEM_TYPE type, long time, double lo
 int WHEREIAM_DATA_NODE::ReadInfo(unsigned long handle, const wchar_t* section) {
   readGuard.Begin();
   navmisc::activity::StoreFileReader file(handle, section, GetStorePathName());
-  if (!file.ok()) {
-    readGuard.End(false);
-    return 0;
-  }
+  if (!file.ok()) return 0;
   const auto type = static_cast<WHERE_ITEM_TYPE>(RD_INT(file.handle(), file.section(), L"whereiam_item_type", 0));
   const CString id = RD_STRING(file.handle(), file.section(), L"whereiam_item_info", L"");
   if (!id.IsEmpty()) {
@@ -83,10 +80,10 @@ int WHEREIAM_DATA_NODE::ReadInfo(unsigned long handle, const wchar_t* section) {
       AddWhereItem(type, trip);
     } else {
       delete trip;
-      readGuard.Dropped();
+      readGuard.Missed(L"the where-am-I trip \"" + id + L"\" cannot be read");
     }
   }
-  readGuard.End(true);
+  readGuard.Finish();
   return 1;
 }
 
@@ -112,6 +109,6 @@ int WHEREIAM_DATA_NODE::RemoveAllUnusedResource() {
   // The ids name no folders here: every where-am-I trip lives in the one shared folder, which
   // must stay while a trip is held.
   if (item) used.AddTail(PathFileName(item->GetResourcePath()));
-  return navmisc::activity::RemoveUnusedFolders(readGuard, GPS_APP_WHEREAMI, used,
-                                                navmisc::activity::RemovalPasses::kTwiceWithPause);
+  return navmisc::RemoveUnusedResourceFolders(PathFolder(PathJoin(GetAppDataFolder(GPS_APP_WHEREAMI), L"dumy.file")),
+                                              used, readGuard);
 }

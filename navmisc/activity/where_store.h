@@ -6,9 +6,9 @@
 #include <cstdint>
 #include <string>
 
-#include "navmisc/activity/store_cleanup.h"
 #include "navmisc/platform/cstring.h"
 #include "navmisc/platform/lists.h"
+#include "navmisc/records/resource_cleanup.h"
 
 class BLOG_ITEM_INFO;
 
@@ -59,7 +59,7 @@ class WHEREIAM_DATA_NODE {
 
   WHERE_ITEM_TYPE itemType = WHERE_ITEM_DEFAULT;
   BLOG_ITEM_INFO* item = nullptr;  // owned
-  navmisc::activity::CompleteRead readGuard;
+  navmisc::CompleteReadGuard readGuard;
 
  protected:
   // Empties `ids` and adds the held trip's id.

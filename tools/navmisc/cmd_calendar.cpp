@@ -70,8 +70,7 @@ void ReadStore(typename C::Store& store, bool toChange) {
     return;
   }
   if (!store.readGuard.IsComplete()) {
-    const std::string why = FormatA("%lld activit%s named by %s could not be read", store.readGuard.dropped(),
-                                    store.readGuard.dropped() == 1 ? "y" : "ies", path.ToUtf8().c_str());
+    const std::string why = "not every activity named by " + path.ToUtf8() + " reads: " + store.readGuard.Why().ToUtf8();
     if (toChange) Fail(why + "; the store is left as it is until they can be (see navmisc " + C::kName + " list)");
     std::fprintf(stderr, "navmisc %s: note: %s\n", C::kName, why.c_str());
   }

@@ -189,35 +189,22 @@ int CalendarStore<Item, Store>::ReadInfo(unsigned long handle, const wchar_t* se
   readGuard.Begin();
   StoreFileReader file(handle, section, GetStorePathName());
   const CString name = file.ok() ? RD_STRING(file.handle(), file.section(), L"user_name", L"") : CString();
-  if (name.IsEmpty()) {
-    readGuard.End(false);
-    return 0;
-  }
+  if (name.IsEmpty()) return 0;
   handle = file.handle();
   section = file.section();
   Clear();
   userName = name;
   const CString prefix = Item::kKeyPrefix;
-  const long long count = std::max(RD_INT(handle, section, prefix + L"_count", 0), 0);
+  const int count = std::max(RD_INT(handle, section, prefix + L"_count", 0), 0);
   // Only the sections the file holds are visited: a count of two thousand million costs no
-  // more than the sections there are. Numbers are taken only in the form the writer gives them.
-  std::vector<int> numbers;
-  CStringList sections;
-  RD_SECTIONS(handle, sections);
-  const CString head = prefix + L"_(";
-  for (CString s : sections) {
-    s.MakeLower();  // the file may spell the names in any case
-    if (s.GetLength() < head.GetLength() + 2 || s.Left(head.GetLength()) != head || s.Right(1) != L")") continue;
-    const CString digits = s.Mid(head.GetLength(), s.GetLength() - head.GetLength() - 1);
-    if (digits.GetLength() > 10) continue;
-    const long long n = wcstoll(digits, nullptr, 10);
-    if (n >= 0 && n < count && FormatString(L"%s_(%lld)", static_cast<const wchar_t*>(prefix), n) == s) {
-      numbers.push_back(static_cast<int>(n));
-    }
-  }
-  std::sort(numbers.begin(), numbers.end());
+  // more than the sections there are.
+  const std::vector<int> numbers = SectionIndices(handle, prefix + L"_(%d)", count);
   // A count beyond the sections present names activities that are gone.
-  readGuard.Dropped(count - static_cast<long long>(numbers.size()));
+  if (numbers.size() < static_cast<size_t>(count)) {
+    readGuard.Missed(FormatString(L"%s names %d activities, of which %d have a section",
+                                  static_cast<const wchar_t*>(PathFileName(GetStorePathName())), count,
+                                  static_cast<int>(numbers.size())));
+  }
 
   for (int n : numbers) {
     const CString s = FormatString(L"%s_(%d)", static_cast<const wchar_t*>(prefix), n);
@@ -225,19 +212,19 @@ int CalendarStore<Item, Store>::ReadInfo(unsigned long handle, const wchar_t* se
     const CString res = RD_STRING(handle, s, L"res_info", L"");
     // The id is a folder of the data folder: anything but one plain name drops the activity.
     if (!IsPlainPathComponent(res)) {
-      readGuard.Dropped();
+      readGuard.Missed(L"activity " + s + L" names no folder of its own (\"" + res + L"\")");
       continue;
     }
     auto* trip = new BLOG_ITEM_INFO(Item::kAppType, res, 0);
     Item* item = trip->ReadInfo() == 1 ? AddItem(type, trip) : nullptr;
     if (!item) {
       delete trip;
-      readGuard.Dropped();
+      readGuard.Missed(L"the trip " + res + L" of activity " + s + L" cannot be read");
       continue;
     }
     item->ReadStoreKeys(handle, s);
   }
-  readGuard.End(true);
+  readGuard.Finish();
   return 1;
 }
 
@@ -278,7 +265,9 @@ template <class Item, class Store>
 int CalendarStore<Item, Store>::RemoveAllUnusedResource() {
   CStringList used;
   _FindAllUsedResource(used);
-  return RemoveUnusedFolders(readGuard, Item::kAppType, used, RemovalPasses::kOnceThenPause);
+  // The folder is named through a file name in it, which is never created.
+  return RemoveUnusedResourceFolders(PathFolder(PathJoin(GetAppDataFolder(Item::kAppType), L"dumy.file")), used,
+                                     readGuard, ResourceRemoval::kOnePass);
 }
 
 }  // namespace navmisc::activity
