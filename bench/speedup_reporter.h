@@ -36,7 +36,7 @@ class SpeedupReporter : public benchmark::ConsoleReporter {
       const auto f = seconds_.find(p.fast), r = seconds_.find(p.reference);
       if (f == seconds_.end() || r == seconds_.end() || f->second <= 0.0) continue;
       const double speedup = r->second / f->second;
-      std::printf("speed-up %s over %s: %.1fx (target %.0fx)%s\n", p.fast.c_str(),
+      std::printf("speed-up %s over %s: %.1fx (target %gx)%s\n", p.fast.c_str(),
                   p.reference.c_str(), speedup, p.target,
                   speedup >= p.target ? "" : "  BELOW TARGET");
     }

@@ -86,6 +86,15 @@ bool HaveProgram(const char* name) {
   return RunCommand(std::string("command -v ") + name + " >/dev/null 2>&1").status == 0;
 }
 
+std::string PythonWithModule(const char* module) {
+  // Debian's python first: a python of one's own (pyenv, a venv) earlier on PATH may lack the
+  // Debian packages.
+  for (const char* python : {"/usr/bin/python3", "python3"}) {
+    if (RunCommand(std::string(python) + " -c 'import " + module + "' >/dev/null 2>&1").status == 0) return python;
+  }
+  return {};
+}
+
 std::string ShellQuote(const std::string& s) {
   std::string q = "'";
   for (char c : s) {

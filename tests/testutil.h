@@ -89,6 +89,8 @@ struct CommandResult {
 CommandResult RunCommand(const std::string& command);
 // True when `name` is a program on PATH.
 bool HaveProgram(const char* name);
+// A python 3 that can import `module` (Debian's first), or "" when there is none.
+std::string PythonWithModule(const char* module);
 // `s` as one single-quoted shell word.
 std::string ShellQuote(const std::string& s);
 

@@ -171,9 +171,11 @@ TEST(FillTcxLap, DerivesTheLapFromTheTrackAndItsSamples) {
   track->cadences.AddTail(cad);
 
   TcxLap lap;
-  ASSERT_TRUE(FillTcxLap(*track, lap));
-  EXPECT_EQ(std::tuple(lap.startTime, lap.totalTimeSeconds, lap.maximumSpeed),
-            std::tuple(1000, 20.0, 5.0));
+  ASSERT_TRUE(FillTcxLap(*track, lap, CTcxActivities::kRunning));
+  // A track of no trip has no owner whose energy could be known: the lap gets the least
+  // calories a lap may carry.
+  EXPECT_EQ(std::tuple(lap.startTime, lap.totalTimeSeconds, lap.maximumSpeed, lap.calories),
+            std::tuple(1000, 20.0, 5.0, 1));
   EXPECT_NEAR(lap.distanceMeters, 222.39, 0.01);  // not to the untimed point nor the one without a fix
   // (150 + 171) / 2, rounded.
   EXPECT_EQ(std::tuple(lap.averageHeartRate, lap.maximumHeartRate), std::tuple(161, 171));

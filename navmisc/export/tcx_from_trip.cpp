@@ -4,6 +4,9 @@
 #include <utility>
 #include <vector>
 
+#include "navmisc/activity/activity_points.h"
+#include "navmisc/activity/calories.h"
+#include "navmisc/activity/detail/per_second.h"
 #include "navmisc/export/detail/export_common.h"
 #include "navmisc/geo/gps_helper.h"
 #include "navmisc/platform/textconv.h"
@@ -13,44 +16,15 @@
 
 namespace {
 
-constexpr uint8_t kHasPosition = 1;
-constexpr uint8_t kHasHeartRate = 2;
-constexpr uint8_t kHasCadence = 4;
-constexpr uint8_t kHasSpeed = 8;
-
-// One value per second, by time, from sample records of `Sample` (a time and values up to the
-// end marker 255).
-template <class Sample>
-class PerSecond {
- public:
-  explicit PerSecond(const CPtrList& samples) {
-    for (const Sample* s : navmisc::Items<Sample>(samples)) {
-      if (!s || s->time == -1) continue;
-      const int used = s->UsedCount();
-      for (int i = 0; i < used; ++i) values_.emplace_back(static_cast<int64_t>(s->time) + i, s->values[i]);
-    }
-    // Records may overlap; the first record's sample wins a shared second.
-    std::stable_sort(values_.begin(), values_.end(),
-                     [](const auto& a, const auto& b) { return a.first < b.first; });
-  }
-  // The sample at `time`, or -1.
-  int At(int64_t time) const {
-    auto it = std::lower_bound(values_.begin(), values_.end(), time,
-                               [](const auto& v, int64_t t) { return v.first < t; });
-    return it != values_.end() && it->first == time ? it->second : -1;
-  }
-
- private:
-  std::vector<std::pair<int64_t, uint8_t>> values_;
-};
-
-bool HasPosition(const WAYPOINT_ITEM_INFO& p) {
-  return !((p.latitude == 0.0 && p.longitude == 0.0) || (p.latitude == 45.0 && p.longitude == 45.0));
-}
+using navmisc::activity::PerSecond;
+constexpr uint8_t kHasPosition = WAYPOINT_ITEM_INFO::kHasPosition;
+constexpr uint8_t kHasHeartRate = WAYPOINT_ITEM_INFO::kHasHeartRate;
+constexpr uint8_t kHasCadence = WAYPOINT_ITEM_INFO::kHasCadence;
+constexpr uint8_t kHasSpeed = WAYPOINT_ITEM_INFO::kHasSpeed;
 
 }  // namespace
 
-bool FillTcxLap(TRACK_ITEM_INFO& track, TcxLap& lap) {
+bool FillTcxLap(TRACK_ITEM_INFO& track, TcxLap& lap, int32_t sportType) {
   PerSecond<HEARTRATE_ITEM_INFO> heartRates(track.heartRates);
   PerSecond<CYCLING_CADENCE_RPM_ITEM_INFO> cadences(track.cadences);
   CGPSHelper helper;
@@ -74,7 +48,7 @@ bool FillTcxLap(TRACK_ITEM_INFO& track, TcxLap& lap) {
     if (p->time == -1) continue;
 
     flags = kHasSpeed;
-    if (HasPosition(*p)) {
+    if (navmisc::activity::HasFix(*p)) {
       flags |= kHasPosition;
       if (previous) {
         distance += helper.GetDistance(previous->latitude, previous->longitude, p->latitude,
@@ -86,16 +60,16 @@ bool FillTcxLap(TRACK_ITEM_INFO& track, TcxLap& lap) {
     p->workSpeed = p->speed / 3600.0;
     maxSpeed = std::max(maxSpeed, p->workSpeed);
     // 0 is no heart rate a reader accepts: the belt lost contact.
-    if (int hr = heartRates.At(p->time); hr > 0) {
+    if (const uint8_t* hr = heartRates.At(p->time); hr && *hr > 0) {
       flags |= kHasHeartRate;
-      p->workHeartRate = hr;
-      heartSum += hr;
+      p->workHeartRate = *hr;
+      heartSum += *hr;
       ++heartCount;
-      heartMax = std::max(heartMax, hr);
+      heartMax = std::max<int>(heartMax, *hr);
     }
-    if (int cadence = cadences.At(p->time); cadence >= 0) {
+    if (const uint8_t* cadence = cadences.At(p->time)) {
       flags |= kHasCadence;
-      p->workCadence = cadence;
+      p->workCadence = *cadence;
     }
     if (!first) first = p;
     last = p;
@@ -106,7 +80,10 @@ bool FillTcxLap(TRACK_ITEM_INFO& track, TcxLap& lap) {
   lap.totalTimeSeconds = static_cast<double>(static_cast<int64_t>(last->time) - first->time);
   lap.distanceMeters = distance;
   lap.maximumSpeed = maxSpeed;
-  lap.calories = 0;
+  // The TCX sport types 0 and 1 are the sport store's cycling and running; 2 to 7 map onto its
+  // fixed-intensity types, 7 being "unknown" there.
+  const long smallCalories = navmisc::activity::TrackEnergy(track, sportType);
+  lap.calories = static_cast<int32_t>(std::clamp<long>((smallCalories + 500) / 1000, 1, 65535));
   lap.averageHeartRate = heartCount ? static_cast<int32_t>((heartSum + heartCount / 2) / heartCount) : 0;
   lap.maximumHeartRate = heartMax;
   lap.tracks.RemoveAll();
@@ -120,7 +97,7 @@ int FillTcxActivity(CPtrList& tracks, int32_t sportType, CTcxActivities& activit
   for (TRACK_ITEM_INFO* track : navmisc::Items<TRACK_ITEM_INFO>(tracks)) {
     if (!track) continue;
     auto* lap = new TcxLap;
-    if (FillTcxLap(*track, *lap)) activity.laps.AddTail(lap);
+    if (FillTcxLap(*track, *lap, sportType)) activity.laps.AddTail(lap);
     else delete lap;
   }
   if (!activity.laps.IsEmpty()) {

@@ -15,9 +15,12 @@ class TRACK_ITEM_INFO;
 // speed (metres per second, from the stored metres per hour), and heart rate and cadence from
 // the track's per-second samples at the point's time, when there is one. Points without a time
 // get no flags. Then sums the lap up: start = first point's time, total time = last - first,
-// distance, maximum speed, average and maximum heart rate (0 when there are none); calories
-// stay 0 (unknown). Returns false, leaving `lap` alone, when no point of the track has a time.
-bool FillTcxLap(TRACK_ITEM_INFO& track, TcxLap& lap);
+// distance, maximum speed, average and maximum heart rate (0 when there are none), and the
+// calories of the track as an activity of `sportType` (TCX sport 0 biking, 1 running, 2-7
+// other) by the owner in the profile of the trip's application: exercise plus resting energy,
+// in whole kilocalories, at least 1 (a lap's calories are required) and at most 65535 (their
+// range). Returns false, leaving `lap` alone, when no point of the track has a time.
+bool FillTcxLap(TRACK_ITEM_INFO& track, TcxLap& lap, int32_t sportType);
 
 // Replaces `activity`'s laps by one lap per track of `tracks` (TRACK_ITEM_INFO*) that has timed
 // points, sets the sport type, and sets the Id to the first lap's start ("YYYY-MM-DDThh:mm:ssZ")

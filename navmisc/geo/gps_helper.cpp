@@ -9,6 +9,7 @@
 
 using navmisc::geo::kDegToRad;
 using navmisc::geo::kRadToDeg;
+using navmisc::geo::HaversineAngle;
 
 namespace navmisc::geo {
 
@@ -63,20 +64,6 @@ double SegmentDistanceKm(const UnitVector& a, const UnitVector& b, const UnitVec
   return AngleBetween(p, q) * kEarthRadiusKm;
 }
 
-}  // namespace navmisc::geo
-
-namespace {
-
-double RadiusOf(CGPSHelper::DIS_UNIT unit) {
-  switch (static_cast<int>(unit)) {
-    case CGPSHelper::DIS_MILE: return 3956.0;
-    case CGPSHelper::DIS_NAUTICAL_MILE: return 3437.7;
-    case CGPSHelper::DIS_KILOMETER: return 6371.0;
-    case CGPSHelper::DIS_METER: return 6371000.0;
-    default: return 0.0;
-  }
-}
-
 // The central angle (radians) between two positions by the haversine formula, with the cosines
 // of both latitudes supplied by the caller. 0 for identical positions, and for positions less
 // than a centimetre apart: that difference is rounding noise of the inputs, not a distance.
@@ -89,6 +76,20 @@ double HaversineAngle(double lat1, double lon1, double cosLat1, double lat2, dou
                    cosLat1 * cosLat2 * std::pow(std::sin(dLon / 2.0), 2.0);
   const double c = 2.0 * std::atan2(std::sqrt(a), std::sqrt(1.0 - a));
   return c * 6371000.0 < 0.01 ? 0.0 : c;
+}
+
+}  // namespace navmisc::geo
+
+namespace {
+
+double RadiusOf(CGPSHelper::DIS_UNIT unit) {
+  switch (static_cast<int>(unit)) {
+    case CGPSHelper::DIS_MILE: return 3956.0;
+    case CGPSHelper::DIS_NAUTICAL_MILE: return 3437.7;
+    case CGPSHelper::DIS_KILOMETER: return 6371.0;
+    case CGPSHelper::DIS_METER: return 6371000.0;
+    default: return 0.0;
+  }
 }
 
 // Truncation toward zero of a pixel distance. A distance that is not a number (a NaN

@@ -113,5 +113,8 @@ double SegmentDistanceKm(const UnitVector& a, const UnitVector& b, const UnitVec
                          double* where);
 // Angle (radians, 0..pi) between two unit vectors.
 double AngleBetween(const UnitVector& a, const UnitVector& b);
+// The central angle (radians) of CGPSHelper::GetDistance, with the cosines of both latitudes
+// supplied by a caller that measures many legs: the same result to the last bit.
+double HaversineAngle(double lat1, double lon1, double cosLat1, double lat2, double lon2, double cosLat2);
 
 }  // namespace navmisc::geo

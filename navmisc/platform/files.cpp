@@ -329,6 +329,12 @@ bool IsDirectory(const wchar_t* path) {
   return !p.empty() && ::stat(p.c_str(), &st) == 0 && S_ISDIR(st.st_mode);
 }
 
+bool IsRealDirectory(const wchar_t* path) {
+  std::string p = NativePath(path);
+  struct stat st;
+  return !p.empty() && ::lstat(p.c_str(), &st) == 0 && S_ISDIR(st.st_mode);
+}
+
 bool GetFileBirthTime(const wchar_t* path, long long& seconds, long& nanoseconds) {
   std::string p = NativePath(path);
   if (p.empty()) return false;

@@ -30,6 +30,8 @@ int PathStatus(const wchar_t* path);
 bool FileExists(const wchar_t* path);
 // True when the path leads to a folder, following symbolic links.
 bool IsDirectory(const wchar_t* path);
+// True when the path itself is a folder: a symbolic link, even to a folder, is not one.
+bool IsRealDirectory(const wchar_t* path);
 // When the file was made: its birth time where the file system records one, else the time its
 // status last changed (the nearest a Linux file system without birth times comes to it). Seconds
 // and nanoseconds since 1970 (UTC). False when the file cannot be opened for reading.

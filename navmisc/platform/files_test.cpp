@@ -4,6 +4,7 @@
 #include <unistd.h>
 
 #include <chrono>
+#include <cstdlib>
 #include <string>
 #include <tuple>
 #include <vector>
@@ -62,6 +63,29 @@ TEST(RemoveDir, NeverFollowsSymbolicLinks) {
   EXPECT_TRUE(FileExists(outside + L"/keep.txt"));
   EXPECT_FALSE(RemoveDir(link + L"/", L"*"));
   EXPECT_TRUE(FileExists(outside + L"/keep.txt"));
+}
+
+// A program's own static object may still remove its scratch folder in the data root while the
+// program exits, after any static state the library made on its first file step.
+TEST(RemoveDir, WorksFromAStaticObjectWhileTheProgramExits) {
+  GTEST_FLAG_SET(death_test_style, "threadsafe");  // a fresh process: statics in the order made here
+  EXPECT_EXIT(
+      {
+        struct Scratch {
+          CString path;
+          ~Scratch() {
+            RemoveDir(path, L"*.*");
+            if (PathStatus(path) != 2) std::_Exit(3);
+          }
+        };
+        std::string folder = "/tmp/navmisc-exit-XXXXXX";
+        if (!::mkdtemp(folder.data())) std::_Exit(2);
+        static Scratch scratch{CString::FromUtf8(folder)};
+        navmisc::testutil::DataRootScope root(scratch.path);
+        if (!MakeDir(scratch.path + L"/sub")) std::_Exit(2);
+        std::exit(0);
+      },
+      ::testing::ExitedWithCode(0), "");
 }
 
 TEST(RemoveDir, PatternSelectsEntriesAndFolderStaysWhenNotEmpty) {

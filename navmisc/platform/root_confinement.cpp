@@ -66,18 +66,23 @@ bool IsUnder(const std::string& path, const std::string& root) {
 // The data root as written and resolved. Resolving it is a walk over its folders; it is done
 // again only when the data root's text changes.
 bool DataRoot(std::string& written, std::string& resolved) {
-  static std::mutex mu;
-  static std::string lastText, lastWritten, lastResolved;
+  struct Cache {
+    std::mutex mu;
+    std::string lastText, lastWritten, lastResolved;
+  };
+  // Never destroyed: a program's own static objects may still delete or write files while the
+  // program exits, after a static cache made on first use would be gone.
+  static Cache& cache = *new Cache;
   const std::string text = NativePath(g_szAppDataPath);
   if (text.empty()) return false;
-  std::lock_guard lock(mu);
-  if (text != lastText) {
-    lastText = text;
-    lastWritten = AsWritten(text);
-    lastResolved = ResolveLinks(text, true);
+  std::lock_guard lock(cache.mu);
+  if (text != cache.lastText) {
+    cache.lastText = text;
+    cache.lastWritten = AsWritten(text);
+    cache.lastResolved = ResolveLinks(text, true);
   }
-  written = lastWritten;
-  resolved = lastResolved;
+  written = cache.lastWritten;
+  resolved = cache.lastResolved;
   return !resolved.empty();
 }
 

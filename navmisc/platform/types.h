@@ -24,6 +24,16 @@ struct CPoint {
   long y = 0;
 };
 
+// A screen rectangle in pixels. Like a window's rectangle it holds its left and top edges but
+// not its right and bottom ones.
+struct CRect {
+  long left = 0;
+  long top = 0;
+  long right = 0;
+  long bottom = 0;
+  bool PtInRect(const CPoint& p) const { return p.x >= left && p.x < right && p.y >= top && p.y < bottom; }
+};
+
 namespace navmisc {
 
 // The data folder of an application type under the data root; nullptr for an unknown type.

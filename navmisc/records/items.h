@@ -37,7 +37,13 @@ class WAYPOINT_ITEM_INFO : public BASE_ITEM_INFO {
  public:
   // Indices into `flags`.
   static constexpr int kFlagKept = 0;      // set by the cleaning passes on points that stay
-  static constexpr int kFlagPresence = 1;  // TCX: bit 0 position, 1 heart rate, 2 cadence, 3 speed
+  static constexpr int kFlagPresence = 1;  // which working values hold a reading (bits below)
+  // Bits of flags[kFlagPresence], set by the TCX export; the activity summaries mark their own
+  // points with the same bits.
+  static constexpr uint8_t kHasPosition = 1;   // latitude and longitude are a real fix
+  static constexpr uint8_t kHasHeartRate = 2;  // workHeartRate
+  static constexpr uint8_t kHasCadence = 4;    // workCadence
+  static constexpr uint8_t kHasSpeed = 8;      // workSpeed
 
   // Defaults: reserve -2.0, course -1, time -1, everything else 0. A copy takes every field
   // except the working values, which start at zero.

@@ -34,24 +34,26 @@ CString CompleteReadGuard::Why() const {
   return {};
 }
 
-bool RemoveUnusedResourceFolders(const CString& folder, const CStringList& used,
-                                 const CompleteReadGuard& guard) {
-  if (!guard.IsComplete()) return false;
+int RemoveUnusedResourceFolders(const CString& folder, const CStringList& used, const CompleteReadGuard& guard,
+                                ResourceRemoval removal) {
+  if (!guard.IsComplete()) return -1;
   std::unordered_set<std::wstring> keep;
   for (const CString& id : used) keep.insert(id.str());
   CStringList entries;
-  if (GetContent(folder, L"*.*", entries) < 0) return false;
+  if (GetContent(folder, L"*.*", entries) < 0) return 0;
+  int removed = 0;
   for (const CString& entry : entries) {
     if (keep.count(entry.str())) continue;
     const CString path = PathJoin(folder, entry);
     // Only folders are trip resources: the store's own file and other files stay. RemoveDir
-    // leaves a symbolic link to a folder alone.
-    if (!IsDirectory(path)) continue;
+    // is not even asked about a symbolic link.
+    if (!IsRealDirectory(path)) continue;
     RemoveDir(path, L"*.*");
     SleepMs(100);
-    RemoveDir(path, L"*.*");
+    if (removal == ResourceRemoval::kTwoPasses) RemoveDir(path, L"*.*");
+    if (PathStatus(path) == 2) ++removed;
   }
-  return true;
+  return removed;
 }
 
 }  // namespace navmisc

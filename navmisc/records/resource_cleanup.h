@@ -29,10 +29,14 @@ class CompleteReadGuard {
   CString firstMiss_;
 };
 
-// Removes every sub-folder of `folder` whose name `used` does not hold, each in two passes 100 ms
-// apart (the second catches files that were still locked). Files and symbolic links stay.
-// Removes nothing and returns false when `guard` does not report a complete read.
-bool RemoveUnusedResourceFolders(const CString& folder, const CStringList& used,
-                                 const CompleteReadGuard& guard);
+// How a folder is removed: twice, 100 ms apart (the second pass catches files that were still
+// locked), or once with a 100 ms pause before the next folder.
+enum class ResourceRemoval { kTwoPasses, kOnePass };
+
+// Removes every sub-folder of `folder` whose name `used` does not hold, as `removal` says. Files
+// and symbolic links stay. Returns the number of folders removed, or -1 and removes nothing when
+// `guard` does not report a complete read.
+int RemoveUnusedResourceFolders(const CString& folder, const CStringList& used, const CompleteReadGuard& guard,
+                                ResourceRemoval removal = ResourceRemoval::kTwoPasses);
 
 }  // namespace navmisc

@@ -92,6 +92,10 @@ void AddExportCommand(CLI::App& app);
 void AddProfileCommand(CLI::App& app);
 void AddTemplatesCommand(CLI::App& app);
 void AddTimeZoneCommand(CLI::App& app);
+void AddSummaryCommand(CLI::App& app);
+void AddSportCommand(CLI::App& app);
+void AddTrackerCommand(CLI::App& app);
+void AddWhereCommand(CLI::App& app);
 // `navmisc photos add|list` and `navmisc geotag` (cmd_photos.cpp).
 void AddPhotosCommand(CLI::App& app);
 void AddGeotagCommand(CLI::App& app);
@@ -101,5 +105,9 @@ void AddHelpCommand(CLI::App& app);
 // The demo's geometry step (demo_geo.cpp): optimises the demo's trips (ids), draws one and
 // places a photo on it.
 void DemoGeometry(const std::vector<std::string>& trips);
+// The demo's activity step (demo_activity.cpp): files the run `runId` as a sport activity and
+// the tracker trip `trackerId` as a tracker activity, sets a where-am-I position, and shows the
+// run's summary with calories.
+void DemoActivities(const CString& runId, const CString& trackerId);
 
 }  // namespace navmisc::cli

@@ -173,6 +173,7 @@ void RunDemo(std::string root, bool force) {
   DemoGeometry(demoTrips);
   DemoPhotos(journey->tripId.ToUtf8());
   DemoExports(root, demoTrips);
+  DemoActivities(run->tripId, tracker.tripId);
   std::printf("\nTry: navmisc --data-root %s trips\n", root.c_str());
 }
 

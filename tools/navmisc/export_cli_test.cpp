@@ -1,9 +1,12 @@
 #include <unistd.h>
 
+#include <cstdio>
+
 #include <string>
 
 #include <gtest/gtest.h>
 
+#include "navmisc/export/detail/test_support.h"
 #include "navmisc/platform/files.h"
 #include "navmisc/records/trip.h"
 #include "testutil.h"
@@ -90,6 +93,20 @@ struct SavedTrips {
   std::string Read(const wchar_t* name) const { return ReadFileBytes(root / name); }
 };
 
+// Checks a TCX document the command wrote against the published TCX schema; says so when
+// xmllint or the schema is missing.
+void ExpectValidTcx(const std::string& quotedPath) {
+  const std::string schemas = navmisc::exporttest::SchemaDir();
+  if (!HaveProgram("xmllint") || schemas.empty()) {
+    std::printf("note: %s not checked against the TCX schema: xmllint or the schema folder is missing\n",
+                quotedPath.c_str());
+    return;
+  }
+  const CommandResult r = RunCommand("xmllint --noout --nonet --schema " + ShellQuote(schemas + "/tcx2-with-ax2.xsd") +
+                                     " " + quotedPath + " 2>&1");
+  EXPECT_EQ(r.status, 0) << quotedPath << "\n" << r.out;
+}
+
 TEST(ExportCommand, FormatsOptionsTripsAndTracksAsTheUserNamesThem) {
   SavedTrips s;
   // The ids share all but their last characters; the first's unique start and the shared name.
@@ -106,6 +123,7 @@ TEST(ExportCommand, FormatsOptionsTripsAndTracksAsTheUserNamesThem) {
       {"export " + s.otherId + " --format TCX --sport 0 -o " + s.Out(L"t.tcx"), 0, "t.tcx\n"},
       {"export " + s.id + " --metric -o " + s.Out(L"t.csv"), 0, "t.csv\n"},
       {"export " + s.id + " -o " + s.Out(L"t.kmz"), 0, "t.kmz\n"},
+      {"export " + s.id + " --sport 0 -o " + s.Out(L"laps.tcx"), 0, "laps.tcx\n"},
       {"export " + s.id + " --format gpx -o -", 0, "<?xml version=\"1.0\" encoding=\"UTF-8\" standalone=\"yes\" ?>"},
       {"export " + s.id + " --track Back -o " + s.Out(L"back.gpx"), 0, "back.gpx\n"},
       {"export " + s.id + " --level 50 -o " + s.Out(L"level.gpx"), 0, "level.gpx\n"},
@@ -135,6 +153,14 @@ TEST(ExportCommand, FormatsOptionsTripsAndTracksAsTheUserNamesThem) {
   EXPECT_EQ(s.Run("export " + s.id + " --format gpx -o - 2>/dev/null").out, s.Read(L"t.gpx"));
   EXPECT_NE(s.Read(L"u.KML").find("<kml xmlns"), std::string::npos);
   EXPECT_NE(s.Read(L"t.tcx").find("<Activity Sport=\"Biking\">"), std::string::npos);
+  // One lap per track, each with its calories: the default profile (60 kg, 170 cm, age unknown)
+  // on a bike for 40 s, 4 * 10 s at MET 3.0, plus 40 s at rest: 2000 + 806 small calories.
+  EXPECT_EQ(Count(s.Read(L"laps.tcx"), "<Lap "), 2u);
+  EXPECT_EQ(Count(s.Read(L"laps.tcx"), "<Calories>3</Calories>"), 2u) << s.Read(L"laps.tcx");
+  // Three points 1 s apart (100 + 40 small calories) still make a lap of one calorie: the schema
+  // requires the element.
+  EXPECT_EQ(Count(s.Read(L"t.tcx"), "<Calories>1</Calories>"), 1u) << s.Read(L"t.tcx");
+  for (const wchar_t* tcx : {L"t.tcx", L"laps.tcx"}) ExpectValidTcx(s.Out(tcx));
   EXPECT_NE(s.Read(L"t.csv").find("47.374000, 8.540000, 100.00,  0.00"), std::string::npos);
   // One track; at level 50 one point of each track (the first and last points of a track are
   // kept by the simplification only when their level says so).
@@ -157,6 +183,7 @@ TEST(ExportCommand, TitlesWithMarkupCharactersGiveWellFormedDocuments) {
     ASSERT_EQ(r.status, 0) << r.out;
     const CommandResult lint = RunCommand("xmllint --noout " + s.Out(name) + " 2>&1");
     EXPECT_EQ(lint.status, 0) << CString(name).ToUtf8() << "\n" << lint.out;
+    if (CString(name).str().ends_with(L"tcx")) ExpectValidTcx(s.Out(name));
   }
   const CommandResult kmz = s.Run("export " + s.id + " -o " + s.Out(L"w.kmz"));
   ASSERT_EQ(kmz.status, 0) << kmz.out;

@@ -58,6 +58,10 @@ int main(int argc, char** argv) {
   navmisc::cli::AddProfileCommand(app);
   navmisc::cli::AddTemplatesCommand(app);
   navmisc::cli::AddTimeZoneCommand(app);
+  navmisc::cli::AddSummaryCommand(app);
+  navmisc::cli::AddSportCommand(app);
+  navmisc::cli::AddTrackerCommand(app);
+  navmisc::cli::AddWhereCommand(app);
   navmisc::cli::AddHelpCommand(app);
 
   try {
