@@ -23,7 +23,8 @@ void PutFlag(CPackageBlk& p, const char* name, uint8_t value);     // 4 bytes, 0
 void PutDouble(CPackageBlk& p, const char* name, double value);    // 8 bytes, IEEE 754, little-endian
 // UTF-16 with its terminator; a null text is one zero character.
 void PutText(CPackageBlk& p, const char* name, const wchar_t* text);
-// Seconds since 1970 as "YYYY-MM-DDThh:mm:ss"; a date-time before 1970 or invalid is an empty
+// The date-time's seconds since 1970 in the standard text form ("YYYY-MM-DDThh:mm:ss"); one
+// that has no such time (conversion gives -1: invalid, or out of the 32-bit range) is an empty
 // text.
 void PutDateTime(CPackageBlk& p, const char* name, const COleDateTime& value);
 // A byte text up to its terminator (at most `capacity` bytes), without the terminator.

@@ -1,0 +1,18 @@
+#include "config.h"
+
+#include "navmisc/platform/files.h"
+#include "navmisc/platform/settings.h"
+
+namespace gpsdc {
+
+Config ReadConfig(const wchar_t* root) {
+  Config config;
+  const unsigned long ini = RD_BEGIN(PathJoin(root, kConfigFileName));
+  if (!ini) return config;
+  config.devicePath = RD_STRING(ini, L"DEVICE", L"Path");
+  config.serviceUrl = RD_STRING(ini, L"WEBSERVICE", L"Url");
+  RD_END(ini);
+  return config;
+}
+
+}  // namespace gpsdc
