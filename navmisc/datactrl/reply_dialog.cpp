@@ -11,6 +11,11 @@ constexpr unsigned kTextClearDone = 9584;
 constexpr unsigned kTextClearing = 9588;
 }  // namespace
 
+CString ClearLogOutcomeText(int32_t error) {
+  return error != 0 ? navmisc::FormatResString(kTextClearFailed, std::to_wstring(error).c_str())
+                    : LoadResString(kTextClearDone);
+}
+
 CDataCtrlReplyDlg::CDataCtrlReplyDlg(IDataCtrlDialogView& view, CString uiLanguage)
     : view_(view), uiLanguage_(std::move(uiLanguage)) {}
 
@@ -84,10 +89,7 @@ long CWaitDataCtrlProcDlg::ProcessKVDevice(CDataControlCmdBlk* block) {
   // Both device block classes begin with the header and nDeviceCmd.
   const auto& device = *static_cast<CDataControlCmdBlkKVDevice*>(block);
   if (device.nDeviceCmd != DC_DEVICE_CLEAR_LOG) return 1;
-  waitView_.SetMessageText(
-      device.nLastError != 0
-          ? navmisc::FormatResString(kTextClearFailed, std::to_wstring(device.nLastError).c_str())
-          : LoadResString(kTextClearDone));
+  waitView_.SetMessageText(ClearLogOutcomeText(device.nLastError));
   done_ = true;
   waitView_.EnableButton(true);
   return 0;

@@ -51,6 +51,10 @@ class CDataCtrlReplyDlg : public CWnd {
   CString uiLanguage_;
 };
 
+// The outcome of clearing the logger's memory, as the dialogs show it: text 9583 with the
+// error, or 9584 when it worked.
+CString ClearLogOutcomeText(int32_t error);
+
 // What the wait dialog for clearing the logger's memory shows.
 class IWaitDataCtrlProcView : public IDataCtrlDialogView {
  public:
