@@ -8,8 +8,8 @@ enum : int32_t {
   DC_ERR_NONE = 0,
   // The connected logger cannot be used by this program; dialogs show text 9582 for it.
   DC_ERR_DEVICE_REFUSED = 61,
-  // The process knows the command but does not carry it out yet (device, file and web-service
-  // commands of this version).
+  // The process knows the command but does not carry it out yet (device and file commands of
+  // this version).
   DC_ERR_NOT_AVAILABLE = 9001,
   // The command code (nDeviceCmd, nNetCmd, nFileCmd) or status source is not one the process
   // knows.
@@ -46,4 +46,6 @@ enum : int32_t {
   DC_ERR_NET_BAD_REPLY = 9112,
   // The process was told to end while the command ran.
   DC_ERR_NET_CANCELLED = 9113,
+  // Too many web-service commands were waiting; this one was not run.
+  DC_ERR_NET_BUSY = 9114,
 };

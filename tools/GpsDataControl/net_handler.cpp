@@ -31,6 +31,8 @@
 namespace gpsdc {
 namespace {
 
+// Commands that may wait for the worker; more are answered DC_ERR_NET_BUSY at once.
+constexpr size_t kMaxWaiting = 64;
 // The largest GPX file that is uploaded.
 constexpr uintmax_t kMaxUploadBytes = 50u << 20;
 
@@ -324,12 +326,15 @@ class NetWorker {
     thread_.join();
   }
 
-  void Submit(CDataControlCmdBlkNet block) {
+  // False, with the block left alone, when too many commands wait already.
+  bool Submit(CDataControlCmdBlkNet& block) {
     {
       std::lock_guard lock(mutex_);
+      if (waiting_.size() >= kMaxWaiting) return false;
       waiting_.push_back(std::move(block));
     }
     wake_.notify_all();
+    return true;
   }
 
  private:
@@ -375,7 +380,10 @@ void RegisterNetHandlers(HandlerTable& table) {
     CDataControlCmdBlkNet net;
     navmisc::datactrl::UnpackBlock(ctx.request, net);
     if (!*worker) *worker = std::make_unique<NetWorker>(ctx.replies, ctx.config);
-    (*worker)->Submit(std::move(net));
+    if ((*worker)->Submit(net)) return;
+    net.nLastError = DC_ERR_NET_BUSY;
+    net.userInfo.szPassword.Empty();
+    ctx.replies.Send(net);
   });
 }
 

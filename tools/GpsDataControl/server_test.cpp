@@ -60,7 +60,7 @@ TEST_F(Queues, ConfigurationDecidesTheConnectionState) {
     const char* file;
     bool device, net;
   } cases[] = {
-      {nullptr, false, false},
+      {nullptr, false, true},  // the public web service, not yet found unreachable
       {"[DEVICE]\nPath=@/logger\n[WEBSERVICE]\nUrl=https://api.example.org\n", true, true},
       {"[device]\npath=@/missing\n[webservice]\nurl=http://127.0.0.1:9/\n", false, true},
       {"[WEBSERVICE]\nUrl=ftp://example.org\n", false, false},
@@ -115,8 +115,8 @@ TEST_F(Queues, ServerAnnouncesAnswersDropsAndEnds) {
   const struct {
     int32_t code;
     int32_t error;
-  } netCases[] = {{1, DC_ERR_NOT_AVAILABLE}, {26, DC_ERR_NOT_AVAILABLE},
-                  {17, DC_ERR_UNKNOWN_COMMAND}, {0, DC_ERR_UNKNOWN_COMMAND}};
+  } netCases[] = {{1, DC_ERR_NET_BAD_REQUEST}, {26, DC_ERR_NET_BAD_REQUEST},
+                  {17, DC_ERR_NET_NOT_OFFERED}, {0, DC_ERR_UNKNOWN_COMMAND}};
   for (const auto& c : netCases) {
     CDataControlCmdBlkNet net;
     net.nNetCmd = c.code;
