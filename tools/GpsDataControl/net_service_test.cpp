@@ -392,9 +392,9 @@ TEST_F(NetService, HostileServersEndInAnErrorWithinBounds) {
   const auto asked = Clock::now();
   EXPECT_TRUE(AskStatus());
   EXPECT_LT(Clock::now() - asked, std::chrono::seconds(5));
-  EXPECT_LT(Stop(), std::chrono::seconds(4)) << "the process ended without being killed";
+  EXPECT_LT(Stop(), std::chrono::seconds(10));
   EXPECT_EQ(window_.nets.size(), replies);
-  EXPECT_EQ(DataControlProcessId(), 0);
+  EXPECT_EQ(DataControlProcessId(), 0) << "the process ended in time, it was not kept";
 }
 
 TEST_F(NetService, OnlyHttpsOrTheLoopbackIsUsed) {

@@ -94,15 +94,11 @@ class NetWindow : public CLoginDlg {
   NetWindow(TerminalLoginView& view, USER_MAP_INFO& user) : CLoginDlg(view, user) {}
   long ProcessNet(CDataControlCmdBlk* block) override {
     replies.push_back(*static_cast<CDataControlCmdBlkNet*>(block));
-    return CLoginDlg::ProcessNet(block);
-  }
-  long ProcessConnectionStatus(CDataControlCmdBlk* block) override {
-    const auto& status = *static_cast<CDataControlConnectionStatus*>(block);
-    if (status.nSource == DC_SOURCE_NET) netConnected = status.bConnected;
-    return 1;
+    // The dialog takes replies only while it is open, as a dialog window does.
+    return dialogOpen ? CLoginDlg::ProcessNet(block) : 1;
   }
   std::vector<CDataControlCmdBlkNet> replies;
-  bool netConnected = true;
+  bool dialogOpen = false;
 };
 
 // The channel for one command: the command thread and the data-control process it starts.
@@ -154,12 +150,14 @@ class NetSession {
 
   // The dialog's way: fields filled, OK pressed, the reply taken.
   CDataControlCmdBlkNet LogInWith(const CString& name, const CString& token) {
+    window_.dialogOpen = true;
     window_.OnInitDialog();
     view_.name = name;
     view_.password = token;
     view_.keep = true;
     window_.OnChangeName();
     const CDataControlCmdBlkNet reply = Ask(DC_NET_CMD_LOGIN, [&] { window_.BeginLogin(); });
+    window_.dialogOpen = false;
     if (view_.result != IDOK && reply.nLastError == 0) Fail("the login was not stored");
     return reply;
   }
@@ -284,19 +282,27 @@ void Tracks() {
   }
 }
 
-void Download(const std::string& id, std::string out) {
-  if (out.empty()) out = id + ".gpx";
-  if (IsDirectory(CString::FromUtf8(out))) Fail(out + " is a folder");
+// Logs on and sends command `netCmd` about the trace `id` with `send`; prints the reply's log
+// text, or fails with it.
+CDataControlCmdBlkNet TraceCommand(int32_t netCmd, const std::string& id,
+                                   void (*send)(CDataControlCmdBlkNet&)) {
   NetSession session;
   session.LogInStored();
-  const CDataControlCmdBlkNet reply = session.Ask(DC_NET_CMD_DWLOAD_TRACK, [&] {
+  const CDataControlCmdBlkNet reply = session.Ask(netCmd, [&] {
     CDataControlCmdBlkNet block;
-    block.nNetCmd = DC_NET_CMD_DWLOAD_TRACK;
+    block.nNetCmd = netCmd;
     block.trackInfo.szTrackId = CString::FromUtf8(id);
-    DC_NET_QueryTrack(block);
+    send(block);
   });
   NetSession::Check(reply);
   PrintLog(NetReplyLogText(reply));
+  return reply;
+}
+
+void Download(const std::string& id, std::string out) {
+  if (out.empty()) out = id + ".gpx";
+  if (IsDirectory(CString::FromUtf8(out))) Fail(out + " is a folder");
+  const CDataControlCmdBlkNet reply = TraceCommand(DC_NET_CMD_DWLOAD_TRACK, id, DC_NET_QueryTrack);
 
   // The points as a track of no trip, written by the GPX export. Its name goes in unescaped,
   // so the characters XML reserves are left out of it.
@@ -318,18 +324,7 @@ void Download(const std::string& id, std::string out) {
   std::printf("%s: %d points\n", out.c_str(), track.points.GetCount());
 }
 
-void Remove(const std::string& id) {
-  NetSession session;
-  session.LogInStored();
-  const CDataControlCmdBlkNet reply = session.Ask(DC_NET_CMD_REMOVE_TRACK, [&] {
-    CDataControlCmdBlkNet block;
-    block.nNetCmd = DC_NET_CMD_REMOVE_TRACK;
-    block.trackInfo.szTrackId = CString::FromUtf8(id);
-    DC_NET_RemoveTrack(block);
-  });
-  NetSession::Check(reply);
-  PrintLog(NetReplyLogText(reply));
-}
+void Remove(const std::string& id) { TraceCommand(DC_NET_CMD_REMOVE_TRACK, id, DC_NET_RemoveTrack); }
 
 constexpr const char* kNetHelp =
     "The web service (OpenStreetMap's GPS traces; the address is the Url of [WEBSERVICE] in\n"

@@ -43,6 +43,8 @@ class NetCommand : public ::testing::Test {
 };
 
 TEST_F(NetCommand, LoginUploadListDownloadRemove) {
+  // The demo's data root, with its profiles and trips.
+  ASSERT_EQ(Run("demo " + ShellQuote(root_.path().ToUtf8())).status, 0);
   auto r = Run("net whoami");
   EXPECT_NE(r.status, 0);
   EXPECT_TRUE(Has(r.out, "not logged on")) << r.out;
@@ -70,7 +72,6 @@ TEST_F(NetCommand, LoginUploadListDownloadRemove) {
   EXPECT_TRUE(Has(r.out, "UserName = [Ann Example]\nDisplayName = [Ann Example]\n")) << r.out;
 
   // A demo trip goes up as a GPX 1.0 document.
-  ASSERT_EQ(Run("demo").status, 0);
   CStringList trips;
   ASSERT_GT(GetContent(root_ / L"Resource", L"*.*", trips), 0);
   std::string trip;
