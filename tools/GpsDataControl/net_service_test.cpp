@@ -389,11 +389,16 @@ TEST_F(NetService, HostileServersEndInAnErrorWithinBounds) {
   const int sent = server.requests();
   DC_NET_GetUserData();
   ASSERT_TRUE(Until([&] { return server.requests() > sent; }, 10000));
+  // Behind it 16 commands may wait; more are turned away at once.
+  for (int i = 0; i < 20; ++i) DC_NET_GetUserData();
+  ASSERT_TRUE(Until([&] { return window_.nets.size() >= replies + 4; }, 10000));
+  for (size_t i = replies; i < window_.nets.size(); ++i)
+    EXPECT_EQ(window_.nets[i].nLastError, DC_ERR_NET_BUSY);
   const auto asked = Clock::now();
   EXPECT_TRUE(AskStatus());
   EXPECT_LT(Clock::now() - asked, std::chrono::seconds(5));
   EXPECT_LT(Stop(), std::chrono::seconds(10));
-  EXPECT_EQ(window_.nets.size(), replies);
+  EXPECT_EQ(window_.nets.size(), replies + 4) << "the waiting commands went with the process";
   EXPECT_EQ(DataControlProcessId(), 0) << "the process ended in time, it was not kept";
 }
 
