@@ -65,6 +65,8 @@ void AddExportCommand(CLI::App& app);
 void AddProfileCommand(CLI::App& app);
 void AddTemplatesCommand(CLI::App& app);
 void AddTimeZoneCommand(CLI::App& app);
+// `navmisc channel status`: the data-control channel and its process.
+void AddChannelCommand(CLI::App& app);
 // `navmisc net ...` (cmd_net.cpp): the web service through the data-control process.
 void AddNetCommand(CLI::App& app);
 // `navmisc help [COMMAND]`: the program's or a command's help.

@@ -5,7 +5,6 @@
 
 #include <CLI/CLI.hpp>
 
-#include <atomic>
 #include <chrono>
 #include <cstdio>
 #include <fstream>
@@ -13,8 +12,8 @@
 #include <iostream>
 #include <memory>
 #include <optional>
-#include <thread>
 
+#include "channel_run.h"
 #include "cli.h"
 #include "navmisc/datactrl/dc_errors.h"
 #include "navmisc/datactrl/login_dialog.h"
@@ -26,13 +25,14 @@
 #include "navmisc/records/track.h"
 #include "navmisc/records/trip.h"
 #include "navmisc/records/user_profile.h"
+#include "terminal_view.h"
 
 namespace navmisc::cli {
 namespace {
 
 // The process bounds every exchange (two for a download); this only guards against a channel
 // that stopped answering altogether.
-constexpr unsigned kReplyWaitMs = 20 * 60 * 1000;
+constexpr auto kReplyWait = std::chrono::minutes(20);
 constexpr size_t kMaxTokenBytes = 4096;
 
 // What a failed command's code means, for the line on stderr.
@@ -79,13 +79,16 @@ class TerminalLoginView : public ILoginView {
   void EnableOk(bool) override {}
   void EnableOtherControls(bool) override {}
   void EndDialog(int r) override { result = r; }
-  void ShowMessageBox(const CString& text, Icon, bool) override {
-    std::fprintf(stderr, "navmisc: %s\n", text.ToUtf8().c_str());
+  void ShowMessageBox(const CString& text, Icon icon, bool rightToLeft) override {
+    boxes_.ShowMessageBox(text, icon, rightToLeft);
   }
 
   CString name, password;
   bool keep = true;
   int result = 0;
+
+ private:
+  TerminalDialogView boxes_;
 };
 
 // The channel's owner window: the login dialog, which also keeps every web-service reply.
@@ -101,40 +104,23 @@ class NetWindow : public CLoginDlg {
   bool dialogOpen = false;
 };
 
-// The channel for one command: the command thread and the data-control process it starts.
+// The channel for one command, with the login dialog as its window.
 class NetSession {
  public:
-  NetSession() : window_(view_, g_TripMapInfo) {
-    g_TripMapInfo.ReadInfo();
-    g_bExit = false;
-    const HWND hwnd = window_.GetSafeHwnd();
-    thread_ = std::thread([this, hwnd] {
-      ProcessCommand(&window_);
-      finished_ = true;
-      PostMessageW(hwnd, WM_NULL, 0, 0);
-    });
-    if (!PumpMessagesUntil(
-            [this] { return finished_ || datactrl::GetChannelState() == datactrl::ChannelState::kRunning; },
-            10000) ||
-        finished_) {
-      Stop();
-      Fail("the data-control process GpsDataControl.exe could not be started");
-    }
-  }
-  ~NetSession() { Stop(); }
+  NetSession() : window_(view_, g_TripMapInfo) { g_TripMapInfo.ReadInfo(); }
 
   // Sends a request and waits for the reply with `netCmd`.
   CDataControlCmdBlkNet Ask(int32_t netCmd, const std::function<void()>& send) {
     const size_t before = window_.replies.size();
     send();
     std::optional<CDataControlCmdBlkNet> reply;
-    PumpMessagesUntil(
+    PumpUntil(
         [&] {
           for (size_t i = before; i < window_.replies.size() && !reply; ++i)
             if (window_.replies[i].nNetCmd == netCmd) reply = window_.replies[i];
-          return reply.has_value() || finished_;
+          return reply.has_value() || channel_.finished();
         },
-        kReplyWaitMs);
+        kReplyWait);
     if (!reply) Fail("the data-control process did not answer");
     return *reply;
   }
@@ -170,17 +156,9 @@ class NetSession {
   }
 
  private:
-  void Stop() {
-    if (!thread_.joinable()) return;
-    g_bExit = true;
-    PumpMessagesUntil([this] { return finished_.load(); }, 60000);
-    thread_.join();
-  }
-
   TerminalLoginView view_;
   NetWindow window_;
-  std::thread thread_;
-  std::atomic<bool> finished_{false};
+  ChannelRun channel_{window_};
 };
 
 // The token: from a file (its first line), else from the terminal without echo, else the first

@@ -56,6 +56,7 @@ int main(int argc, char** argv) {
   navmisc::cli::AddProfileCommand(app);
   navmisc::cli::AddTemplatesCommand(app);
   navmisc::cli::AddTimeZoneCommand(app);
+  navmisc::cli::AddChannelCommand(app);
   navmisc::cli::AddNetCommand(app);
   navmisc::cli::AddHelpCommand(app);
 
