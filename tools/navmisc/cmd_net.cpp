@@ -223,11 +223,14 @@ struct UploadOptions {
 
 void Upload(const UploadOptions& o) {
   auto trip = OpenTrip(o.trip);
-  trip->ReadAllWaypoint(0);
   ScopedTempFolder temp(L"navmisc-upload");
   if (temp.path().IsEmpty()) Fail("no temporary folder for the GPX document");
   const CString gpx = PathJoin(temp.path(), L"trip.gpx");
-  ExportTrip(*trip, "gpx", gpx.ToUtf8(), true, 1);
+  ExportRequest exportRequest;
+  exportRequest.trip = o.trip;
+  exportRequest.out = gpx.ToUtf8();
+  exportRequest.format = "gpx";
+  RunExport(exportRequest);
 
   NetSession session;
   session.LogInStored();
