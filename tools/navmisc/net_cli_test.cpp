@@ -43,8 +43,8 @@ class NetCommand : public ::testing::Test {
 };
 
 TEST_F(NetCommand, LoginUploadListDownloadRemove) {
-  // The demo's data root, with its profiles and trips.
-  ASSERT_EQ(Run("demo " + ShellQuote(root_.path().ToUtf8())).status, 0);
+  // The demo's profiles and trips, added to a data root that holds the process's configuration.
+  ASSERT_EQ(Run("demo --force " + ShellQuote(root_.path().ToUtf8())).status, 0);
   auto r = Run("net whoami");
   EXPECT_NE(r.status, 0);
   EXPECT_TRUE(Has(r.out, "not logged on")) << r.out;
