@@ -207,7 +207,11 @@ std::unique_ptr<BLOG_ITEM_INFO> OpenTrip(const std::string& name) {
   }
   const size_t i = PickOne(all, name, "trip", "under " + DataRoot());
   auto trip = std::make_unique<BLOG_ITEM_INFO>(types[i], CString::FromUtf8(all[i].id), 0);
-  if (trip->ReadInfo() != 1) Fail("cannot read trip " + all[i].id);
+  ClearFileRefusal();
+  if (trip->ReadInfo() != 1) {
+    const std::string refused = LastFileRefusal();
+    Fail("cannot read trip " + all[i].id + (refused.empty() ? "" : ": " + refused));
+  }
   return trip;
 }
 
