@@ -47,12 +47,9 @@ void RegisterDeviceHandlers(HandlerTable& table) {
     if (navmisc::datactrl::UsesKV11Block(device.nDeviceCmd)) {
       CDataControlCmdBlkKVDevice11 kv11;
       InitKV11BlockDefaults(kv11);
-      navmisc::datactrl::UnpackBlock(ctx.request, kv11);
-      kv11.nLastError = RunKV11Command(kv11, ctx);
-      ctx.replies.Send(kv11);
+      AnswerInPlace(ctx, kv11, RunKV11Command);
     } else {
-      device.nLastError = RunDeviceCommand(device, ctx);
-      ctx.replies.Send(device);
+      AnswerInPlace(ctx, device, RunDeviceCommand);
     }
   });
 }
