@@ -4,12 +4,9 @@
 
 #include "navmisc/datactrl/reply_dialog.h"
 #include "navmisc/platform/cstring.h"
+#include "navmisc/platform/dialog_results.h"
 
 class USER_MAP_INFO;
-
-// Results a dialog ends with.
-inline constexpr int IDOK = 1;
-inline constexpr int IDCANCEL = 2;
 
 // What the login dialog shows: the user-name and password fields, the keep-password box, the
 // OK button and the other controls (Cancel and the two other actions).
