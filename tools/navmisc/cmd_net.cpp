@@ -336,7 +336,7 @@ void AddNetCommand(CLI::App& app) {
   CLI::App* up = AddCommand(*net, "upload", "upload a trip as a GPX trace",
                             "Uploads the trip's tracks and photos as one GPX document; prints its trace id.",
                             [upload] { Upload(*upload); });
-  up->add_option("TRIP", upload->trip, "the trip's id")->required();
+  up->add_option("TRIP", upload->trip, "the trip: its id, the start of its id, or its name")->required();
   up->add_flag("--private", upload->isPrivate, "upload as a private trace (default public)");
   up->add_option("--description", upload->description, "the trace's description (default the trip's)");
   up->add_option("--tags", upload->tags, "comma-separated tags");
