@@ -13,6 +13,7 @@ packages=(
   libcli11-dev                         # the command line's options
   libexpat1-dev                        # reading GPX, TCX and KML files
   libcurl4-openssl-dev                 # the web service
+  nlohmann-json3-dev                   # the geolocation answers of the web service
   libcpp-httplib-dev                   # the tests' loopback web server
   libgps-dev gpsd gpsd-clients         # live positions from gpsd; gpsfake for its tests
   libxml2-utils gpsbabel gdal-bin zip unzip   # readers that check the exported documents

@@ -4,11 +4,10 @@
 #pragma once
 
 #include "navmisc/platform/cstring.h"
+#include "navmisc/platform/dialog_results.h"
 
-// The answers of the question.
-constexpr int IDCANCEL = 2;  // no, for this photo and every following one
-constexpr int IDYES = 6;
-constexpr int IDNO = 7;
+// The answers of the question: IDYES, IDNO, IDCANCEL (no, for this photo and every following
+// one) and IDYESTOALL.
 constexpr int IDYESTOALL = 637;  // yes, for this photo and every following one
 
 // What a program shows the user.

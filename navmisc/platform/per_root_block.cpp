@@ -27,13 +27,16 @@ void SleepOneMs() {
   ::nanosleep(&ts, nullptr);
 }
 
-// Everything but the state word becomes zero, then the identification is written.
-void FillNewBlock(SharedBlockHeader& header, const SharedBlockType& type) {
+// Everything but the state word becomes zero, then the identification is written and the
+// block's own initialisation runs.
+void FillNewBlock(SharedBlockHeader& header, const SharedBlockType& type,
+                  void (*initialise)(SharedBlockHeader&)) {
   constexpr size_t kStateSize = sizeof header.state;
   std::memset(reinterpret_cast<unsigned char*>(&header) + kStateSize, 0, type.size - kStateSize);
   header.magic = type.magic;
   header.layoutVersion = type.layoutVersion;
   header.blockSize = static_cast<uint32_t>(type.size);
+  if (initialise) initialise(header);
 }
 
 bool HasLayout(const SharedBlockHeader& header, const SharedBlockType& type) {
@@ -43,12 +46,13 @@ bool HasLayout(const SharedBlockHeader& header, const SharedBlockType& type) {
 
 }  // namespace
 
-bool JoinOrInitialiseBlock(SharedBlockHeader& header, const SharedBlockType& type, bool& fresh) {
+bool JoinOrInitialiseBlock(SharedBlockHeader& header, const SharedBlockType& type, bool& fresh,
+                           void (*initialise)(SharedBlockHeader&)) {
   fresh = false;
   std::atomic_ref<uint32_t> state(header.state);
   uint32_t seen = kSharedBlockNew;
   if (state.compare_exchange_strong(seen, kSharedBlockInitialising, std::memory_order_acq_rel)) {
-    FillNewBlock(header, type);
+    FillNewBlock(header, type, initialise);
     state.store(kSharedBlockReady, std::memory_order_release);
     fresh = true;
     return true;
@@ -60,7 +64,7 @@ bool JoinOrInitialiseBlock(SharedBlockHeader& header, const SharedBlockType& typ
   if (seen == kSharedBlockInitialising) {
     // The initialising process has died between claiming and publishing: finish its work.
     // Should it only be slow, both write the same zeros and the same identification.
-    FillNewBlock(header, type);
+    FillNewBlock(header, type, initialise);
     state.store(kSharedBlockReady, std::memory_order_release);
     fresh = true;
     return true;

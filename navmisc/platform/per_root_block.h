@@ -79,7 +79,9 @@ class PerRootBlock {
 
 // Makes `header` (the start of a block of `type`) ready for use if no other process has, or
 // waits for the one that does. Sets `fresh` when this call initialised it (every byte after the
-// state word zero, then the identification). False when the memory holds no block of this type.
-bool JoinOrInitialiseBlock(SharedBlockHeader& header, const SharedBlockType& type, bool& fresh);
+// state word zero, then the identification, then `initialise` when given, all before any other
+// process may use the block). False when the memory holds no block of this type.
+bool JoinOrInitialiseBlock(SharedBlockHeader& header, const SharedBlockType& type, bool& fresh,
+                           void (*initialise)(SharedBlockHeader&) = nullptr);
 
 }  // namespace navmisc

@@ -84,3 +84,31 @@ void SetResourceFile(const wchar_t* path) {
 }
 
 }  // namespace navmisc
+
+namespace navmisc {
+
+CString FormatResString(unsigned id, const wchar_t* argument) {
+  const std::wstring text = LoadResString(id).str();
+  std::wstring out;
+  bool placed = false;
+  for (size_t i = 0; i < text.size(); ++i) {
+    if (text[i] == L'%' && i + 1 < text.size()) {
+      const wchar_t next = text[i + 1];
+      if (next == L'%') {
+        out += L'%';
+        ++i;
+        continue;
+      }
+      if (!placed && (next == L's' || next == L'd')) {
+        out += argument ? argument : L"";
+        placed = true;
+        ++i;
+        continue;
+      }
+    }
+    out += text[i];
+  }
+  return CString(std::move(out));
+}
+
+}  // namespace navmisc

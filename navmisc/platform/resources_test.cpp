@@ -62,3 +62,21 @@ TEST(LoadResString, LooksInTheProgramFolderThenItsShareFolder) {
 }
 
 }  // namespace
+
+namespace {
+
+TEST(FormatResString, PutsTheArgumentInTheFirstPlaceholderOnly) {
+  TempDir tmp;
+  WriteFileBytes(tmp / L"texts.ini",
+                 "[STRINGS]\n1=Error %d\n2=100%% of %s done\n3=%s and %s %x\n4=no place\n5=%\n");
+  navmisc::SetResourceFile(tmp / L"texts.ini");
+  const struct {
+    unsigned id;
+    const wchar_t* expected;
+  } cases[] = {{1, L"Error 61"}, {2, L"100% of 61 done"}, {3, L"61 and %s %x"},
+               {4, L"no place"}, {5, L"%"}, {6, L""}};
+  for (const auto& c : cases) EXPECT_EQ(navmisc::FormatResString(c.id, L"61"), c.expected) << c.id;
+  navmisc::SetResourceFile(L"");
+}
+
+}  // namespace

@@ -23,6 +23,14 @@ void* MapFd(int fd, size_t size, std::error_code& ec, void* at) {
   return p;
 }
 
+// An object that another user made, or that others may read, is not one to trust with the
+// user's paths, device settings or messages.
+bool Trusted(const struct stat& st, std::error_code& ec) {
+  if (st.st_uid == ::geteuid() && (st.st_mode & 077) == 0) return true;
+  ec = std::make_error_code(std::errc::permission_denied);
+  return false;
+}
+
 class FdCloser {
  public:
   explicit FdCloser(int fd) : fd_(fd) {}
@@ -72,12 +80,7 @@ SharedMemory SharedMemory::OpenOrCreate(const std::string& name, size_t size,
     ec = LastError();
     return {};
   }
-  // An object that another user made, or that others may read, is not one to trust with the
-  // user's paths and device settings.
-  if (st.st_uid != ::geteuid() || (st.st_mode & 077) != 0) {
-    ec = std::make_error_code(std::errc::permission_denied);
-    return {};
-  }
+  if (!Trusted(st, ec)) return {};
   if (st.st_size == 0) {
     // Just created (by us or by another process that has not sized it yet): sizing to the same
     // length twice is harmless.
@@ -106,6 +109,7 @@ SharedMemory SharedMemory::OpenExisting(const std::string& name, std::error_code
     ec = LastError();
     return {};
   }
+  if (!Trusted(st, ec)) return {};
   if (st.st_size <= 0) {
     ec = std::make_error_code(std::errc::invalid_argument);
     return {};

@@ -25,7 +25,8 @@ class SharedMemory {
   // mapped at that page-aligned address (which must span `size` bytes and belong to the caller).
   static SharedMemory OpenOrCreate(const std::string& name, size_t size, std::error_code& ec,
                                    void* at = nullptr);
-  // Maps the whole of an existing object; errc::no_such_file_or_directory when it is missing.
+  // Maps the whole of an existing object; errc::no_such_file_or_directory when it is missing,
+  // errc::permission_denied when it is not the user's own as OpenOrCreate requires.
   static SharedMemory OpenExisting(const std::string& name, std::error_code& ec);
   // `size` bytes of zeros shared with the children this process forks, and with nobody else.
   // `at` as for OpenOrCreate.

@@ -102,6 +102,43 @@ std::wstring FromUtf8Lossy(std::string_view in) {
   return out;
 }
 
+void AppendUtf16Le(std::wstring_view in, std::string& out) {
+  out.reserve(out.size() + in.size() * 2);
+  auto unit = [&out](char32_t u) {
+    out.push_back(static_cast<char>(u & 0xFF));
+    out.push_back(static_cast<char>(u >> 8));
+  };
+  for (wchar_t w : in) {
+    char32_t c = static_cast<char32_t>(w);
+    if (!ValidScalar(c)) c = 0xFFFD;
+    if (c < 0x10000) {
+      unit(c);
+    } else {
+      c -= 0x10000;
+      unit(0xD800 + (c >> 10));
+      unit(0xDC00 + (c & 0x3FF));
+    }
+  }
+}
+
+std::wstring Utf16LeToWide(const unsigned char* data, size_t size, size_t maxChars) {
+  std::wstring out;
+  const size_t units = size / 2;
+  auto at = [data](size_t i) { return static_cast<char32_t>(data[2 * i] | (data[2 * i + 1] << 8)); };
+  for (size_t i = 0; i < units && out.size() < maxChars; ++i) {
+    char32_t c = at(i);
+    if (c == 0) break;
+    if (c >= 0xD800 && c <= 0xDBFF && i + 1 < units && at(i + 1) >= 0xDC00 && at(i + 1) <= 0xDFFF) {
+      c = 0x10000 + ((c - 0xD800) << 10) + (at(i + 1) - 0xDC00);
+      ++i;
+    } else if (c >= 0xD800 && c <= 0xDFFF) {
+      c = 0xFFFD;
+    }
+    out.push_back(static_cast<wchar_t>(c));
+  }
+  return out;
+}
+
 }  // namespace navmisc
 
 int WCSToMBS(const wchar_t* src, char* dst, int size, bool /*utf8*/) {

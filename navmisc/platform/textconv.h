@@ -1,6 +1,7 @@
 // Conversion between wide text (wchar_t, UTF-32 on Linux) and UTF-8.
 #pragma once
 
+#include <cstdint>
 #include <string>
 #include <string_view>
 
@@ -22,5 +23,12 @@ bool Utf8ToWide(std::string_view in, std::wstring& out);
 // Lenient conversions: malformed sequences become U+FFFD (or "?" on the way to UTF-8).
 std::string ToUtf8Lossy(std::wstring_view in);
 std::wstring FromUtf8Lossy(std::string_view in);
+
+// Appends `in` as UTF-16 little-endian code units (two bytes each, characters beyond U+FFFF as
+// surrogate pairs, invalid values as U+FFFD), without a terminator.
+void AppendUtf16Le(std::wstring_view in, std::string& out);
+// Reads UTF-16 little-endian text from `size` bytes: up to the first zero unit or the end, an odd
+// last byte ignored, unpaired surrogates read as U+FFFD. At most `maxChars` characters are kept.
+std::wstring Utf16LeToWide(const unsigned char* data, size_t size, size_t maxChars = SIZE_MAX);
 
 }  // namespace navmisc

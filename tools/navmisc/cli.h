@@ -96,6 +96,10 @@ void AddSummaryCommand(CLI::App& app);
 void AddSportCommand(CLI::App& app);
 void AddTrackerCommand(CLI::App& app);
 void AddWhereCommand(CLI::App& app);
+// `navmisc channel status`: the data-control channel and its process.
+void AddChannelCommand(CLI::App& app);
+// `navmisc net ...` (cmd_net.cpp): the web service through the data-control process.
+void AddNetCommand(CLI::App& app);
 // `navmisc photos add|list` and `navmisc geotag` (cmd_photos.cpp).
 void AddPhotosCommand(CLI::App& app);
 void AddGeotagCommand(CLI::App& app);

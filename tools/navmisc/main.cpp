@@ -62,6 +62,8 @@ int main(int argc, char** argv) {
   navmisc::cli::AddSportCommand(app);
   navmisc::cli::AddTrackerCommand(app);
   navmisc::cli::AddWhereCommand(app);
+  navmisc::cli::AddChannelCommand(app);
+  navmisc::cli::AddNetCommand(app);
   navmisc::cli::AddHelpCommand(app);
 
   try {
