@@ -403,13 +403,24 @@ TEST_F(Channel, ProcessKilledWhileHoldingARingLock) {
     while (!stop) InsertRequestMessage(big);
     stopped = true;
   });
+  // However the test ends, the flood ends with it (a thread left joinable would abort the run).
+  struct EndFlood {
+    std::atomic<bool>& stop;
+    std::thread& flood;
+    ~EndFlood() {
+      stop = true;
+      if (flood.joinable()) flood.join();
+    }
+  } endFlood{stop, flood};
 
   // Stop the process at random moments until it is caught holding a ring's lock, and kill it
-  // there.
+  // there. On a loaded machine (or under sanitizers) a catch can take many tries: the bound is
+  // time, not a count.
   std::mt19937 random(7);
   int victim = 0;
   const navmisc::detail::MsgRingHeader* heldRing = nullptr;
-  for (int attempt = 0; attempt < 2000 && !heldRing; ++attempt) {
+  const auto giveUp = std::chrono::steady_clock::now() + std::chrono::seconds(120);
+  while (!heldRing && std::chrono::steady_clock::now() < giveUp) {
     ReleaseCPUTime(1 + random() % 10);
     const int pid = DataControlProcessId();
     if (pid <= 0 || ::kill(pid, SIGSTOP) != 0) continue;
