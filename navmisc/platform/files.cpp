@@ -10,6 +10,7 @@
 #include <unistd.h>
 
 #include <algorithm>
+#include <cstdlib>
 #include <cwctype>
 #include <string>
 #include <string_view>
@@ -320,6 +321,12 @@ CString GetCurrentExecPath() {
   if (n <= 0 || static_cast<size_t>(n) >= buf.size()) return CString();
   buf.resize(static_cast<size_t>(n));
   return PathFolder(CString::FromUtf8(buf));
+}
+
+CString UserConfigFolder() {
+  if (const char* x = std::getenv("XDG_CONFIG_HOME"); x && *x == '/') return CString::FromUtf8(x);
+  const char* home = std::getenv("HOME");
+  return CString::FromUtf8(std::string(home && *home ? home : "/tmp") + "/.config");
 }
 
 CString PathJoin(const wchar_t* folder, const wchar_t* name) {

@@ -41,6 +41,9 @@ bool DeleteFileRetry(const wchar_t* path);
 void SleepMs(unsigned ms);
 // The folder of the running executable, without a trailing separator.
 CString GetCurrentExecPath();
+// The user's folder for settings: $XDG_CONFIG_HOME when it is an absolute path, else
+// $HOME/.config (/tmp/.config without a home).
+CString UserConfigFolder();
 
 // Path text helpers (no file system access).
 CString PathJoin(const wchar_t* folder, const wchar_t* name);

@@ -81,14 +81,7 @@ bool SodiumReady() {
 
 CString SecretKeyPath() {
   if (const char* p = std::getenv("NAVMISC_KEY_FILE"); p && *p) return CString::FromUtf8(p);
-  std::string base;
-  if (const char* x = std::getenv("XDG_CONFIG_HOME"); x && *x) {
-    base = x;
-  } else {
-    const char* home = std::getenv("HOME");
-    base = std::string(home && *home ? home : "/tmp") + "/.config";
-  }
-  return CString::FromUtf8(base + "/navmisc/secret.key");
+  return PathJoin(UserConfigFolder(), L"navmisc/secret.key");
 }
 
 CString ProtectSecret(const CString& clear) {

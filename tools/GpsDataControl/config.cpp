@@ -11,6 +11,8 @@ Config ReadConfig(const wchar_t* root) {
   if (!ini) return config;
   config.devicePath = RD_STRING(ini, L"DEVICE", L"Path");
   config.serviceUrl = RD_STRING(ini, L"WEBSERVICE", L"Url");
+  config.gpsdHost = RD_STRING(ini, L"DONGLE", L"Host", config.gpsdHost);
+  config.gpsdPort = RD_STRING(ini, L"DONGLE", L"Port", config.gpsdPort);
   RD_END(ini);
   return config;
 }

@@ -40,6 +40,7 @@ DataControlServer::DataControlServer(CxSysMsgQueue& requests, CxSysMsgQueue& rep
       parent_(::getppid()) {}
 
 int DataControlServer::Run() {
+  DeviceServiceScope device(replies_, config_, product_);
   // Unasked, so that a command thread that has just (re)started this process learns the state.
   for (int32_t source : {DC_SOURCE_DEVICE, DC_SOURCE_NET}) replies_.Send(CurrentStatus(source, config_));
   for (;;) {
