@@ -153,9 +153,11 @@ bool LoggerFolder::Open(const CString& root) {
   identity_.gsmVersion = Utf8Of(RD_STRING(ini, kLoggerSection, L"GSMVersion"));
   identity_.timeZone = RD_INT(ini, kLoggerSection, L"TimeZone", 0);
   identity_.totalMemoryKiB = std::max(0, RD_INT(ini, kLoggerSection, L"TotalMemory", 0));
-  // The identity as the logger reports it, in the form the suite shows.
-  identity_.identity = RD_STRING(ini, kLoggerSection, L"Identity",
-                                 FormatString(L"M:%04d-SN: %d", model, identity_.serial));
+  // The identity as the logger reports it, in the form the suite shows; without one, that form
+  // of model and serial.
+  identity_.identity = RD_STRING(ini, kLoggerSection, L"Identity");
+  if (identity_.identity.IsEmpty())
+    identity_.identity = FormatString(L"SN:%02d%08d", model, identity_.serial);
   ChangeModelDspName(identity_.identity);
   RD_END(ini);
   return identity_.model != 0;

@@ -12,6 +12,7 @@
 #include "navmisc/platform/data_root.h"
 #include "navmisc/platform/files.h"
 #include "progress.h"
+#include "channel_harness.h"
 #include "testutil.h"
 
 namespace {
@@ -55,7 +56,7 @@ class Queues : public ::testing::Test {
 };
 
 TEST_F(Queues, ConfigurationDecidesTheConnectionState) {
-  ASSERT_TRUE(MakeDir(root_ / L"logger"));
+  navmisc::testutil::MakeLogger(root_ / L"logger", 1, 2);
   const struct {
     const char* file;
     bool device, net;

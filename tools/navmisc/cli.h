@@ -1,6 +1,7 @@
 // Shared pieces of the navmisc command-line tool.
 #pragma once
 
+#include <chrono>
 #include <functional>
 #include <memory>
 #include <string>
@@ -42,6 +43,23 @@ std::string DataRoot();
 // Finds and reads the trip whose id is `id`, in any application folder of the data root.
 std::unique_ptr<BLOG_ITEM_INFO> OpenTrip(const std::string& id);
 
+// A progress bar on stderr (only when stderr is a terminal, and only once the work has taken
+// more than a moment): a bar while the total is known, a spinner with the time otherwise.
+class ProgressDisplay {
+ public:
+  explicit ProgressDisplay(std::string label);
+  void Update(long done, long total);
+  // Ends the bar's line with "done" or "stopped".
+  void Finish(bool stopped);
+
+ private:
+  std::string label_;
+  bool draw_;
+  bool drawn_ = false;
+  std::chrono::steady_clock::time_point started_;
+  std::chrono::steady_clock::time_point last_;
+};
+
 // Runs `work` on a worker thread while a progress bar follows `counter` up to `total` on stderr
 // (only when stderr is a terminal). Ctrl-C clears `keepGoing`, so the work can stop cleanly;
 // returns false when it was interrupted that way.
@@ -65,10 +83,17 @@ void AddExportCommand(CLI::App& app);
 void AddProfileCommand(CLI::App& app);
 void AddTemplatesCommand(CLI::App& app);
 void AddTimeZoneCommand(CLI::App& app);
+// `navmisc device ...` and `navmisc where follow`: the logger and the live receiver through the
+// data-control process.
+void AddDeviceCommand(CLI::App& app);
+void AddWhereCommand(CLI::App& app);
 // `navmisc help [COMMAND]`: the program's or a command's help.
 void AddHelpCommand(CLI::App& app);
 
 // The demo's geometry step (demo_geo.cpp): optimises the sample trips, writes a plot.
 void DemoGeometry();
+// The demo's logger step (demo_device.cpp): a logger folder with two days of NMEA logs under
+// `root`, read into trips through the data-control process.
+void DemoDevice(const std::string& root);
 
 }  // namespace navmisc::cli
