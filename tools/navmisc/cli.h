@@ -83,6 +83,8 @@ void AddExportCommand(CLI::App& app);
 void AddProfileCommand(CLI::App& app);
 void AddTemplatesCommand(CLI::App& app);
 void AddTimeZoneCommand(CLI::App& app);
+// `navmisc channel status`: the data-control channel and its process.
+void AddChannelCommand(CLI::App& app);
 // `navmisc device ...` and `navmisc where follow`: the logger and the live receiver through the
 // data-control process.
 void AddDeviceCommand(CLI::App& app);

@@ -22,6 +22,7 @@
 #include "navmisc/platform/files.h"
 #include "navmisc/records/trip.h"
 #include "navmisc/util/device_identity.h"
+#include "terminal_view.h"
 
 namespace navmisc::cli {
 namespace {
@@ -60,23 +61,6 @@ class TerminalSheetView : public IWizConfigSheetView {
 
  private:
   bool assumeYes_;
-};
-
-// The wait dialog for clearing the log, on the terminal.
-class TerminalWaitView : public IWaitDataCtrlProcView {
- public:
-  void ShowMessageBox(const CString& text, Icon, bool) override {
-    std::fprintf(stderr, "%s\n", text.ToUtf8().c_str());
-  }
-  void EnableButton(bool) override {}
-  void SetMessageText(const CString& text) override {
-    if (text != shown_) std::printf("%s\n", text.ToUtf8().c_str());
-    shown_ = text;
-  }
-  void FlashMessageText() override {}
-
- private:
-  CString shown_;
 };
 
 void RequireLogger(const DeviceChannel& channel) {
@@ -167,7 +151,7 @@ void ClearLog(const std::string& logger, bool yes) {
   RequireLogger(channel);
   if (!yes && !Confirm("Erase every log on the logger?"))
     Fail("the log was not cleared (answer yes, or give --yes)");
-  TerminalWaitView view;
+  TerminalDialogView view;
   CWaitDataCtrlProcDlg dialog(view);
   channel.SetListener(&dialog);
   // The dialog sends the clear itself, on its first tick.

@@ -61,6 +61,7 @@ int main(int argc, char** argv) {
   navmisc::cli::AddProfileCommand(app);
   navmisc::cli::AddTemplatesCommand(app);
   navmisc::cli::AddTimeZoneCommand(app);
+  navmisc::cli::AddChannelCommand(app);
   navmisc::cli::AddDeviceCommand(app);
   navmisc::cli::AddWhereCommand(app);
   navmisc::cli::AddHelpCommand(app);
