@@ -1,7 +1,10 @@
 #include "navmisc/platform/msg_queue.h"
 
 #include <errno.h>
+#include <linux/futex.h>
+#include <sys/syscall.h>
 #include <time.h>
+#include <unistd.h>
 
 #include <algorithm>
 #include <atomic>
@@ -33,14 +36,14 @@ using detail::MsgFrameHeader;
 using detail::MsgRingHeader;
 
 // "NMQR" in memory. The layout version is part of the object's name.
-constexpr SharedBlockType kRingType = {"queue", 0x52514D4E, 1, sizeof(MsgRingHeader)};
+constexpr SharedBlockType kRingType = {"queue", 0x52514D4E, 2, sizeof(MsgRingHeader)};
 constexpr size_t kFrameHeaderSize = sizeof(MsgFrameHeader);
 // A message larger than the ring goes in parts of at least this many bytes (or its rest), so a
 // nearly full ring does not chop it into crumbs.
 constexpr size_t kMinPart = 64 * 1024;
-// Waits are cut into slices of this length and the condition looked at again: a process that
-// died while waiting can leave a condition variable's bookkeeping short of one waiter, and the
-// slice makes sure no wake-up is ever missed for longer than that.
+// Waits are cut into slices of this length and the condition looked at again, so that a lock
+// whose owner died while this process waited for it is noticed, and so that no wait depends on
+// a single wake-up.
 constexpr long kWaitSliceMs = 1000;
 constexpr int kMinCapacityKiB = 4;
 constexpr int kMaxCapacityKiB = 1 << 20;
@@ -115,10 +118,27 @@ int Lock(MsgRingHeader& r, pthread_mutex_t& m, const Deadline& deadline) {
   }
 }
 
-// Waits on `cond` (ringLock held) until woken, the deadline or the end of a slice.
-void Wait(MsgRingHeader& r, pthread_cond_t& cond, const Deadline& deadline) {
+// Waits on `cond` (ringLock held, and held again on return) until a broadcast, the deadline or
+// the end of a slice. The sequence word is read under the lock, and every broadcast changes it
+// under the lock, so a broadcast between the unlock and the futex wait makes the wait return at
+// once: no wake-up is lost.
+void Wait(MsgRingHeader& r, detail::SharedCondition& cond, const Deadline& deadline) {
+  std::atomic_ref<uint32_t> seq(cond.seq), waiters(cond.waiters);
+  const uint32_t seen = seq.load(std::memory_order_relaxed);
+  waiters.fetch_add(1, std::memory_order_relaxed);
+  ::pthread_mutex_unlock(&r.ringLock);
   const struct timespec wake = deadline.NextWake();
-  TakeOver(r, r.ringLock, ::pthread_cond_clockwait(&cond, &r.ringLock, CLOCK_MONOTONIC, &wake));
+  // FUTEX_WAIT_BITSET takes an absolute time on CLOCK_MONOTONIC.
+  ::syscall(SYS_futex, &cond.seq, FUTEX_WAIT_BITSET, seen, &wake, nullptr, FUTEX_BITSET_MATCH_ANY);
+  waiters.fetch_sub(1, std::memory_order_relaxed);
+  TakeOver(r, r.ringLock, ::pthread_mutex_lock(&r.ringLock));
+}
+
+// Wakes every waiter of `cond` (ringLock held).
+void Broadcast(detail::SharedCondition& cond) {
+  std::atomic_ref<uint32_t>(cond.seq).fetch_add(1, std::memory_order_release);
+  if (std::atomic_ref<uint32_t>(cond.waiters).load(std::memory_order_relaxed) != 0)
+    ::syscall(SYS_futex, &cond.seq, FUTEX_WAKE, INT32_MAX, nullptr, nullptr, 0);
 }
 
 class Unlocker {
@@ -142,12 +162,7 @@ void InitialiseRing(SharedBlockHeader& header) {
   ::pthread_mutexattr_setrobust(&ma, PTHREAD_MUTEX_ROBUST);
   for (pthread_mutex_t* m : {&r.ringLock, &r.writeLock, &r.readLock}) ::pthread_mutex_init(m, &ma);
   ::pthread_mutexattr_destroy(&ma);
-  pthread_condattr_t ca;
-  ::pthread_condattr_init(&ca);
-  ::pthread_condattr_setpshared(&ca, PTHREAD_PROCESS_SHARED);
-  ::pthread_condattr_setclock(&ca, CLOCK_MONOTONIC);
-  for (pthread_cond_t* c : {&r.notEmpty, &r.notFull}) ::pthread_cond_init(c, &ca);
-  ::pthread_condattr_destroy(&ca);
+  // The conditions start as zeros, as the block was filled.
 }
 
 bool ValidQueueName(std::string_view name) {
@@ -331,7 +346,7 @@ bool CxSysMsgQueue::Send(const void* data, uint32_t size, uint32_t timeoutMs) {
     ring.CopyIn(r.tail + kFrameHeaderSize, bytes + offset, f.length);
     r.tail += Align8(kFrameHeaderSize + f.length);
     offset += f.length;
-    ::pthread_cond_broadcast(&r.notEmpty);
+    Broadcast(r.notEmpty);
   } while (offset < size);
   return true;
 }
@@ -366,7 +381,7 @@ std::unique_ptr<uint8_t[]> CxSysMsgQueue::Receive(uint32_t timeoutMs, CxSysMsgIn
         r.head = r.tail;
         ++r.discarded;
         message.Drop();
-        ::pthread_cond_broadcast(&r.notFull);
+        Broadcast(r.notFull);
         continue;
       }
       // A first part starts a message (dropping one left unfinished by a dead sender); other
@@ -375,7 +390,7 @@ std::unique_ptr<uint8_t[]> CxSysMsgQueue::Receive(uint32_t timeoutMs, CxSysMsgIn
       const bool take = message.Continues(f);
       if (take) ring.CopyOut(r.head + kFrameHeaderSize, message.bytes.get() + f.offset, f.length);
       r.head += frameBytes;
-      ::pthread_cond_broadcast(&r.notFull);
+      Broadcast(r.notFull);
       if (!take) {
         ++r.discarded;
         continue;

@@ -11,6 +11,7 @@
 
 #include <atomic>
 #include <chrono>
+#include <cstdio>
 #include <cstring>
 #include <string>
 #include <thread>
@@ -63,6 +64,7 @@ struct ForkedPeer {
   bool Start(F work) {
     int fds[2];
     if (::pipe(fds) != 0) return false;
+    std::fflush(nullptr);  // the child must not write the test's buffered output again
     pid = ::fork();
     if (pid == 0) {
       ::close(fds[0]);
@@ -173,6 +175,38 @@ TEST_F(MsgQueue, PeerKilledHoldingTheRingLockBlocksNobody) {
   EXPECT_EQ(navmisc::detail::RobustMutexOwner(q.ring()->ringLock), 0);
 }
 
+TEST_F(MsgQueue, PeersKilledWhileWaitingBlockNobody) {
+  // One peer waits for a message, another for room in the full ring; both are killed there.
+  CxSysMsgQueue q(L"waiting", kSmallRingKiB, navmisc::kSysMsgOpenOrCreate);
+  ASSERT_TRUE(q.IsValid());
+  ForkedPeer receiver, sender;
+  ASSERT_TRUE(receiver.Start([&](int ready) {
+    CxSysMsgQueue mine(L"waiting", 0, navmisc::kSysMsgOpenExisting);
+    (void)!::write(ready, "x", 1);
+    mine.Receive(navmisc::kSysMsgWaitForever, nullptr);
+  }));
+  ASSERT_TRUE(Eventually([&] { return q.ring()->notEmpty.waiters == 1; }));
+  receiver.KillNow();
+  int queued = 0;
+  while (Put(q, Pattern(1000, queued), 0)) ++queued;
+  ASSERT_TRUE(sender.Start([&](int ready) {
+    CxSysMsgQueue mine(L"waiting", 0, navmisc::kSysMsgOpenExisting);
+    (void)!::write(ready, "x", 1);
+    Put(mine, "never");
+  }));
+  ASSERT_TRUE(Eventually([&] { return q.ring()->notFull.waiters == 1; }));
+  sender.KillNow();
+
+  // Waking the dead costs nothing; the living go on.
+  for (int i = 0; i < queued; ++i) EXPECT_EQ(Take(q), Pattern(1000, i));
+  std::thread late([&] {
+    std::this_thread::sleep_for(std::chrono::milliseconds(50));
+    EXPECT_TRUE(Put(q, "late"));
+  });
+  EXPECT_EQ(Take(q), "late");
+  late.join();
+}
+
 TEST_F(MsgQueue, SenderKilledHalfWayThroughALargeMessage) {
   CxSysMsgQueue q(L"half", kSmallRingKiB, navmisc::kSysMsgOpenOrCreate);
   ASSERT_TRUE(q.IsValid());
@@ -258,7 +292,7 @@ TEST_F(MsgQueue, EachUserAndDataRootHasItsOwnQueues) {
   // owner or a peer: one readable by others, or (where the test may give it away) one of
   // another user.
   const std::string name =
-      navmisc::PerRootObjectName("planted", navmisc::ChosenDataRoot()) + "-v1";
+      CxSysMsgQueue(L"planted", kSmallRingKiB, navmisc::kSysMsgOpenOrCreate).objectName();
   for (bool otherUser : {false, true}) {
     if (otherUser && ::geteuid() != 0) continue;
     ::shm_unlink(name.c_str());

@@ -3,8 +3,11 @@
 #include <atomic>
 #include <chrono>
 #include <cmath>
+#include <cstdlib>
 #include <cstdio>
 #include <thread>
+
+#include <CLI/CLI.hpp>
 
 #include "navmisc/platform/console.h"
 #include "navmisc/platform/data_root.h"
@@ -19,47 +22,60 @@ namespace navmisc::cli {
 void Fail(const std::string& message, int code) { throw Failure{message, code}; }
 void Usage(const std::string& message) { throw Failure{message + " (see --help)", 2}; }
 
-std::optional<std::string> Args::Option(const std::string& name) {
-  // One-letter options take one dash ("-o FILE"), longer ones two.
-  const std::string flag = (name.size() == 1 ? "-" : "--") + name;
-  for (size_t i = 0; i < args_.size(); ++i) {
-    if (args_[i] == flag) {
-      if (i + 1 >= args_.size()) Usage(flag + " needs a value");
-      std::string v = args_[i + 1];
-      args_.erase(args_.begin() + static_cast<long>(i), args_.begin() + static_cast<long>(i) + 2);
-      return v;
-    }
-    if (args_[i].rfind(flag + "=", 0) == 0) {
-      std::string v = args_[i].substr(flag.size() + 1);
-      args_.erase(args_.begin() + static_cast<long>(i));
-      return v;
-    }
-  }
-  return std::nullopt;
+namespace {
+
+// The data root named on the command line, or the default.
+std::string& ChosenDataRoot() {
+  static std::string root;
+  return root;
 }
 
-bool Args::Flag(const std::string& name) {
-  for (size_t i = 0; i < args_.size(); ++i) {
-    if (args_[i] == "--" + name) {
-      args_.erase(args_.begin() + static_cast<long>(i));
-      return true;
+std::string DefaultDataRoot() {
+  if (const char* x = std::getenv("XDG_DATA_HOME"); x && *x) return std::string(x) + "/navmisc";
+  const char* home = std::getenv("HOME");
+  return std::string(home && *home ? home : "/tmp") + "/.local/share/navmisc";
+}
+
+}  // namespace
+
+void AddGlobalOptions(CLI::App& app) {
+  ChosenDataRoot() = DefaultDataRoot();
+  app.add_option("--data-root", ChosenDataRoot(),
+                 "the data folder (default $XDG_DATA_HOME/navmisc, else ~/.local/share/navmisc)")
+      ->option_text("DIR");
+  // Subcommands made after this pass options they do not know to the program, so that global
+  // options may follow the command's name.
+  app.fallthrough();
+}
+
+CLI::App* AddCommand(CLI::App& app, const std::string& name, const std::string& description,
+                     const std::string& details, std::function<void()> run, bool usesDataRoot) {
+  CLI::App* sub = app.add_subcommand(name, description);
+  sub->footer(details + (details.empty() ? "" : "\n") + "Global options: --data-root DIR (see navmisc --help)");
+  sub->callback([run = std::move(run), usesDataRoot] {
+    if (usesDataRoot) SetDataRoot(ChosenDataRoot());
+    run();
+  });
+  return sub;
+}
+
+void AddHelpCommand(CLI::App& app) {
+  auto command = std::make_shared<std::string>();
+  CLI::App* sub = app.add_subcommand("help", "this text, or a command's own help");
+  sub->add_option("COMMAND", *command, "the command to explain");
+  sub->callback([&app, command] {
+    if (command->empty()) {
+      // App::help would describe the running command, which is this one.
+      std::fputs(app.get_formatter()->make_help(&app, app.get_name(), CLI::AppFormatMode::Normal).c_str(), stdout);
+      return;
     }
-  }
-  return false;
-}
-
-std::vector<std::string> Args::Positionals() {
-  for (const auto& a : args_)
-    if (a.size() > 1 && a[0] == '-' && !(std::isdigit(static_cast<unsigned char>(a[1])) || a[1] == '.'))
-      Usage("unknown option " + a);
-  return args_;
-}
-
-double ParseDouble(const std::string& text, const std::string& what) {
-  char* end = nullptr;
-  const double v = std::strtod(text.c_str(), &end);
-  if (text.empty() || *end || !std::isfinite(v)) Usage(what + " must be a number, not '" + text + "'");
-  return v;
+    const CLI::App* target = nullptr;
+    for (const CLI::App* s : app.get_subcommands({})) {
+      if (s->get_name() == *command) target = s;
+    }
+    if (!target) Usage("no command '" + *command + "'");
+    std::fputs(target->help(app.get_name()).c_str(), stdout);
+  });
 }
 
 long ParseTime(const std::string& text) {

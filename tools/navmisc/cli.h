@@ -3,14 +3,15 @@
 
 #include <functional>
 #include <memory>
-#include <optional>
 #include <string>
-#include <vector>
 
 #include "navmisc/platform/cstring.h"
 #include "navmisc/platform/types.h"
 
 class BLOG_ITEM_INFO;
+namespace CLI {
+class App;
+}
 
 namespace navmisc::cli {
 
@@ -22,22 +23,15 @@ struct Failure {
 [[noreturn]] void Fail(const std::string& message, int code = 1);
 [[noreturn]] void Usage(const std::string& message);
 
-// The arguments of a subcommand, with the options it knows.
-class Args {
- public:
-  explicit Args(std::vector<std::string> args) : args_(std::move(args)) {}
-  // Removes and returns "--name VALUE" (or "--name=VALUE"); nullopt when absent.
-  std::optional<std::string> Option(const std::string& name);
-  // Removes "--name"; true when it was there.
-  bool Flag(const std::string& name);
-  // The remaining positional arguments; any unknown "--option" left is a usage error.
-  std::vector<std::string> Positionals();
+// Adds the options every command accepts, before or after the command's name (--data-root).
+void AddGlobalOptions(CLI::App& app);
 
- private:
-  std::vector<std::string> args_;
-};
+// Adds subcommand `name`: its one-line `description` shows in the command list, `details` under
+// its own help. The callback sets the data root chosen on the command line (unless
+// `usesDataRoot` is false) and then runs `run`, which fails by throwing Failure (see Fail).
+CLI::App* AddCommand(CLI::App& app, const std::string& name, const std::string& description,
+                     const std::string& details, std::function<void()> run, bool usesDataRoot = true);
 
-double ParseDouble(const std::string& text, const std::string& what);
 long ParseTime(const std::string& text);  // seconds since 1970 or "YYYY-MM-DDThh:mm:ss[Z]"
 std::string TimeText(long time);          // "YYYY-MM-DDThh:mm:ssZ", or "-" for none
 
@@ -61,16 +55,20 @@ int ExportTrip(BLOG_ITEM_INFO& trip, const std::string& format, const std::strin
 // The demo's last step: every trip of the demo tree in every export format.
 void DemoExports(const std::string& root);
 
-// Subcommands.
-int CmdDemo(Args& args);
-int CmdTrips(Args& args);
-int CmdOptimize(Args& args);
-int CmdPlot(Args& args);
-int CmdPlace(Args& args);
-int CmdExport(Args& args);
-int CmdProfile(Args& args);
-int CmdTemplates(Args& args);
-int CmdTimeZone(Args& args);
+// The commands, each added to the program's parser with its options, help and callback.
+void AddDemoCommand(CLI::App& app);
+void AddTripsCommand(CLI::App& app);
+void AddOptimizeCommand(CLI::App& app);
+void AddPlotCommand(CLI::App& app);
+void AddPlaceCommand(CLI::App& app);
+void AddExportCommand(CLI::App& app);
+void AddProfileCommand(CLI::App& app);
+void AddTemplatesCommand(CLI::App& app);
+void AddTimeZoneCommand(CLI::App& app);
+// `navmisc channel status`: the data-control channel and its process.
+void AddChannelCommand(CLI::App& app);
+// `navmisc help [COMMAND]`: the program's or a command's help.
+void AddHelpCommand(CLI::App& app);
 
 // The demo's geometry step (demo_geo.cpp): optimises the sample trips, writes a plot.
 void DemoGeometry();

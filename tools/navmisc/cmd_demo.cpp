@@ -2,6 +2,8 @@
 #include <cstdlib>
 #include <string>
 
+#include <CLI/CLI.hpp>
+
 #include "cli.h"
 #include "listing.h"
 #include "navmisc/platform/datetime.h"
@@ -46,24 +48,11 @@ BLOG_ITEM_INFO* SaveTrip(BLOG_ITEM_INFO* trip, const wchar_t* name) {
   return trip;
 }
 
-}  // namespace
-
-int CmdDemo(Args& args) {
-  if (args.Flag("help")) {
-    std::puts("Usage: navmisc demo [DIR]\n\n"
-              "Builds a sample data root in DIR (a fresh temporary folder without it): the four\n"
-              "user profiles, the suite settings and a tree of synthetic trips, then reads them\n"
-              "back and lists them.");
-    return 0;
-  }
-  const auto pos = args.Positionals();
-  if (pos.size() > 1) Usage("demo takes at most one folder");
-  std::string root;
-  if (pos.empty()) {
+void RunDemo(std::string root) {
+  if (root.empty()) {
     root = CreateTempFolder(L"navmisc-demo").ToUtf8();
     if (root.empty()) Fail("cannot create a temporary folder");
   } else {
-    root = pos[0];
     if (!MakeDir(CString::FromUtf8(root))) Fail("cannot create " + root);
   }
   SetDataRoot(root);
@@ -109,7 +98,18 @@ int CmdDemo(Args& args) {
   DemoGeometry();
   DemoExports(root);
   std::printf("\nTry: navmisc --data-root %s trips\n", root.c_str());
-  return 0;
+}
+
+}  // namespace
+
+void AddDemoCommand(CLI::App& app) {
+  auto folder = std::make_shared<std::string>();
+  CLI::App* cmd = AddCommand(app, "demo", "build a sample data root and show what the library does with it",
+                             "Builds a sample data root in DIR (a fresh temporary folder without it): the four\n"
+                             "user profiles, the suite settings and a tree of synthetic trips, then reads them\n"
+                             "back, lists, optimises, draws and exports them.",
+                             [folder] { RunDemo(*folder); }, false);
+  cmd->add_option("DIR", *folder, "the folder to fill (created when missing)");
 }
 
 }  // namespace navmisc::cli

@@ -1,6 +1,9 @@
 #include <algorithm>
 #include <cstdint>
 #include <cstdio>
+#include <optional>
+
+#include <CLI/CLI.hpp>
 
 #include "cli.h"
 #include "navmisc/export/csv_export.h"
@@ -16,8 +19,6 @@ namespace navmisc::cli {
 namespace {
 
 constexpr const char* kExportHelp =
-    "Usage: navmisc export TRIP --format gpx|kml|kmz|tcx|csv [--metric] [--sport N] -o FILE\n"
-    "\n"
     "Writes the trip's tracks (and its photos, where the format has room for them) to FILE,\n"
     "replacing it:\n"
     "  gpx   GPX 1.0: photos as waypoints, then one track per track\n"
@@ -29,7 +30,7 @@ constexpr const char* kExportHelp =
     "        more the lines go to FILE_1.csv, FILE_2.csv, ... (65534 lines each)\n"
     "\n"
     "Points without a time are left out. Ctrl-C stops the export and removes what it wrote.\n"
-    "docs/exported-documents.md describes the documents.\n";
+    "docs/exported-documents.md describes the documents.";
 
 // The number of steps an export of `format` counts for the progress bar.
 int ProgressTotal(BLOG_ITEM_INFO& trip, const std::string& format) {
@@ -89,53 +90,61 @@ int ExportTrip(BLOG_ITEM_INFO& trip, const std::string& format, const std::strin
   return 0;
 }
 
-int CmdExport(Args& args) {
-  if (args.Flag("help")) {
-    std::fputs(kExportHelp, stdout);
-    return 0;
-  }
-  const auto format = args.Option("format");
-  const auto out = args.Option("o");
-  const auto sport = args.Option("sport");
-  const bool metric = args.Flag("metric");
-  const auto pos = args.Positionals();
-  if (pos.size() != 1) Usage("export needs one TRIP");
-  if (!format) Usage("export needs --format");
-  if (*format != "gpx" && *format != "kml" && *format != "kmz" && *format != "tcx" && *format != "csv") {
-    Usage("--format must be gpx, kml, kmz, tcx or csv, not '" + *format + "'");
-  }
-  if (!out) Usage("export needs -o FILE");
-  const int sportType = sport ? static_cast<int>(ParseDouble(*sport, "--sport")) : 1;
-  if (sportType < 0 || sportType > 7) Usage("--sport must be 0 to 7");
-  auto trip = OpenTrip(pos[0]);
+namespace {
+
+struct ExportOptions {
+  std::string trip;
+  std::string format;
+  std::string out;
+  bool metric = false;
+  int sport = 1;
+};
+
+void RunExport(const ExportOptions& o) {
+  auto trip = OpenTrip(o.trip);
 
   int counter = 0;
   bool keepGoing = true;
-  if (!RunWithProgress("reading " + pos[0], 0, counter, keepGoing, [&] { trip->ReadAllWaypoint(0); })) {
+  if (!RunWithProgress("reading " + o.trip, 0, counter, keepGoing, [&] { trip->ReadAllWaypoint(0); })) {
     Fail("stopped; nothing was written");
   }
   std::optional<Failure> failure;
-  RunWithProgress("export " + *format, ProgressTotal(*trip, *format), counter, keepGoing, [&] {
+  RunWithProgress("export " + o.format, ProgressTotal(*trip, o.format), counter, keepGoing, [&] {
     try {
-      ExportTrip(*trip, *format, *out, metric, sportType, &counter, &keepGoing);
+      ExportTrip(*trip, o.format, o.out, o.metric, o.sport, &counter, &keepGoing);
     } catch (const Failure& f) {
       failure = f;
     }
   });
   if (failure) throw *failure;
 
-  const CString path = CString::FromUtf8(*out);
-  if (*format == "csv" && !FileExists(path)) {
+  const CString path = CString::FromUtf8(o.out);
+  if (o.format == "csv" && !FileExists(path)) {
     // The lines went to numbered files.
     for (int n = 1;; ++n) {
       const CString part = CsvSplitFileName(path, n);
       if (!FileExists(part)) break;
       std::printf("%s\n", part.ToUtf8().c_str());
     }
-    return 0;
+    return;
   }
-  std::printf("%s\n", out->c_str());
-  return 0;
+  std::printf("%s\n", o.out.c_str());
+}
+
+}  // namespace
+
+void AddExportCommand(CLI::App& app) {
+  auto o = std::make_shared<ExportOptions>();
+  CLI::App* cmd = AddCommand(app, "export", "write a trip as an interchange document", kExportHelp,
+                             [o] { RunExport(*o); });
+  cmd->add_option("TRIP", o->trip, "the trip")->required();
+  cmd->add_option("--format", o->format, "the document's format")
+      ->required()
+      ->check(CLI::IsMember({"gpx", "kml", "kmz", "tcx", "csv"}));
+  cmd->add_option("-o,--output", o->out, "the file to write")->required()->option_text("FILE");
+  cmd->add_flag("--metric", o->metric, "CSV in metres and metres per hour");
+  cmd->add_option("--sport", o->sport, "TCX sport: 0 biking, 1 running, 2-7 other (default 1)")
+      ->check(CLI::Range(0, 7));
 }
 
 }  // namespace navmisc::cli

@@ -1,6 +1,9 @@
 // navmisc optimize, plot and place: the track geometry of a trip from the command line.
 #include <cmath>
 #include <cstdio>
+#include <optional>
+
+#include <CLI/CLI.hpp>
 
 #include "cli.h"
 #include "geo_cli.h"
@@ -16,8 +19,6 @@ namespace navmisc::cli {
 namespace {
 
 constexpr const char* kOptimizeHelp =
-    "Usage: navmisc optimize TRIP [--off]\n"
-    "\n"
     "Runs the cleaning passes over every track of the trip and stores each point's level:\n"
     "  -2       a bad fix (after a long gap, or a lone jump faster than 120 km/h)\n"
     "  -1       a fix of a stop\n"
@@ -25,26 +26,20 @@ constexpr const char* kOptimizeHelp =
     "  10000    never dropped (tracks too short to simplify)\n"
     "then chooses the trip's display level and saves the trip (settings and point files).\n"
     "\n"
-    "  --off    keep the levels; only choose the display level again\n"
-    "\n"
-    "Ctrl-C stops after the current step; the levels set so far are saved (exit code 130).\n";
+    "Ctrl-C stops after the current step; the levels set so far are saved (exit code 130).";
 
 constexpr const char* kPlotHelp =
-    "Usage: navmisc plot TRIP -o FILE.svg [--size PIXELS]\n"
-    "\n"
     "Draws the trip's tracks as an SVG picture, north up: one pixel per metre when the trip\n"
     "fits into PIXELS (default 800), coarser steps of 0.2 m per pixel until it does. Every point\n"
     "is a dot coloured by its level: red a bad fix, orange a stop, pale to dark blue levels 0\n"
     "to 100, black never dropped. A scale bar and a key sit under the drawing. Run\n"
-    "`navmisc optimize TRIP` first to give the points their levels.\n";
+    "`navmisc optimize TRIP` first to give the points their levels.";
 
 constexpr const char* kPlaceHelp =
-    "Usage: navmisc place TRIP (--time T | --lat LAT --lon LON) [--tolerance M] [--track ID]\n"
-    "\n"
     "Places a photo on the trip's tracks: where the trip was at time T (seconds since 1970 or\n"
     "YYYY-MM-DDThh:mm:ss, UTC), or when it passed nearest to a position (within M metres,\n"
     "default 50), and on which track. A time wins over a position when it falls on a track.\n"
-    "--track tries that track first. Exit code 1 when the trip was not there.\n";
+    "--track tries that track first. Exit code 1 when the trip was not there.";
 
 struct LevelCounts {
   long points = 0, badFixes = 0, stops = 0, essential = 0;
@@ -70,12 +65,6 @@ std::unique_ptr<BLOG_ITEM_INFO> OpenTripWithPoints(const std::string& id) {
   trip->ReadAllWaypoint(0);
   if (trip->tracks.IsEmpty()) Fail("trip '" + id + "' has no track points");
   return trip;
-}
-
-std::string OneTrip(Args& args, const char* command) {
-  const auto pos = args.Positionals();
-  if (pos.size() != 1) Usage(std::string(command) + " takes one trip id");
-  return pos[0];
 }
 
 }  // namespace
@@ -124,76 +113,48 @@ void WritePlot(BLOG_ITEM_INFO& trip, const std::string& path, long size) {
   if (!file.Open(wpath) || !file.Write(svg) || !file.Commit()) Fail("cannot write " + path);
 }
 
-int CmdOptimize(Args& args) {
-  if (args.Flag("help")) {
-    std::fputs(kOptimizeHelp, stdout);
-    return 0;
-  }
-  const bool off = args.Flag("off");
-  auto trip = OpenTripWithPoints(OneTrip(args, "optimize"));
+namespace {
+
+void RunOptimize(const std::string& id, bool off) {
+  auto trip = OpenTripWithPoints(id);
   const bool finished = OptimizeTrip(*trip, !off);
   PrintLevelSummary(stdout, *trip);
-  if (!finished) {
-    std::fprintf(stderr, "navmisc optimize: stopped by Ctrl-C; the levels set so far are saved\n");
-    return 130;
-  }
-  return 0;
+  if (!finished) Fail("stopped by Ctrl-C; the levels set so far are saved", 130);
 }
 
-int CmdPlot(Args& args) {
-  if (args.Flag("help")) {
-    std::fputs(kPlotHelp, stdout);
-    return 0;
-  }
-  const auto out = args.Option("o");
-  if (!out || out->empty()) Usage("plot needs -o FILE.svg");
-  long size = 800;
-  if (const auto s = args.Option("size")) {
-    const double v = ParseDouble(*s, "--size");
-    if (v < 16 || v > 100000 || v != std::floor(v)) Usage("--size must be a whole number of pixels from 16 to 100000");
-    size = static_cast<long>(v);
-  }
-  auto trip = OpenTripWithPoints(OneTrip(args, "plot"));
-  WritePlot(*trip, *out, size);
-  std::printf("%s\n", out->c_str());
-  return 0;
-}
+struct PlaceOptions {
+  std::string trip;
+  std::string time;
+  std::optional<double> lat, lon;
+  double tolerance = 50.0;
+  std::string track;
+};
 
-int CmdPlace(Args& args) {
-  if (args.Flag("help")) {
-    std::fputs(kPlaceHelp, stdout);
-    return 0;
-  }
+void RunPlace(const PlaceOptions& o) {
   long time = -1;
-  double lat = 0.0, lon = 0.0, tolerance = 50.0;
-  const auto timeText = args.Option("time");
-  const auto latText = args.Option("lat"), lonText = args.Option("lon");
-  if (timeText) {
-    time = ParseTime(*timeText);
+  double lat = 0.0, lon = 0.0;
+  const bool byTime = !o.time.empty();
+  const bool byPosition = o.lat.has_value();
+  if (byTime) {
+    time = ParseTime(o.time);
     if (time < 1) Usage("--time must be after 1970-01-01T00:00:00");
   }
-  if (latText.has_value() != lonText.has_value()) Usage("--lat and --lon go together");
-  if (latText) {
-    lat = ParseDouble(*latText, "--lat");
-    lon = ParseDouble(*lonText, "--lon");
-    if (std::fabs(lat) > 90 || std::fabs(lon) > 180) Usage("--lat must lie in -90..90 and --lon in -180..180");
+  if (byPosition) {
+    lat = *o.lat;
+    lon = *o.lon;
     if (lat == 0.0 && lon == 0.0) Usage("0/0 stands for no position; give another one");
   }
-  if (!timeText && !latText) Usage("place needs --time or --lat and --lon");
-  if (const auto t = args.Option("tolerance")) {
-    tolerance = ParseDouble(*t, "--tolerance");
-    if (tolerance <= 0) Usage("--tolerance must be a positive number of metres");
-  }
-  CString trackId = CString::FromUtf8(args.Option("track").value_or(""));
-  auto trip = OpenTripWithPoints(OneTrip(args, "place"));
+  if (!byTime && !byPosition) Usage("place needs --time or --lat and --lon");
+  CString trackId = CString::FromUtf8(o.track);
+  auto trip = OpenTripWithPoints(o.trip);
 
   double altitude = 0.0;
   long speed = 0;
   const long asked = time;
-  if (!MappingGPSAndTrack(trip->tracks, tolerance, trackId, lat, lon, altitude, speed, time)) {
-    Fail(timeText && latText ? "the trip was neither there at that time nor within the tolerance of that position"
-         : timeText          ? "the trip has no track at " + TimeText(asked)
-                             : FormatA("no track of the trip passed within %g m of that position", tolerance));
+  if (!MappingGPSAndTrack(trip->tracks, o.tolerance, trackId, lat, lon, altitude, speed, time)) {
+    Fail(byTime && byPosition ? "the trip was neither there at that time nor within the tolerance of that position"
+         : byTime             ? "the trip has no track at " + TimeText(asked)
+                              : FormatA("no track of the trip passed within %g m of that position", o.tolerance));
   }
   const TRACK_ITEM_INFO* track = nullptr;
   for (auto* t : Items<TRACK_ITEM_INFO>(trip->tracks)) {
@@ -206,12 +167,55 @@ int CmdPlace(Args& args) {
                               "longitude  %.6f\n"
                               "altitude   %.1f m\n"
                               "speed      %.1f km/h",
-                              timeText && time == asked ? "time" : "position",
+                              byTime && time == asked ? "time" : "position",
                               trackId.ToUtf8().c_str(),
                               track ? track->GetName().ToUtf8().c_str() : "",
                               TimeText(time).c_str(), time, lat, lon, altitude, speed / 1000.0)
                           .c_str());
-  return 0;
+}
+
+}  // namespace
+
+void AddOptimizeCommand(CLI::App& app) {
+  auto id = std::make_shared<std::string>();
+  auto off = std::make_shared<bool>(false);
+  CLI::App* cmd = AddCommand(app, "optimize", "set the optimisation levels of a trip's points and save it",
+                             kOptimizeHelp, [id, off] { RunOptimize(*id, *off); });
+  cmd->add_option("TRIP", *id, "the trip")->required();
+  cmd->add_flag("--off", *off, "keep the levels; only choose the display level again");
+}
+
+void AddPlotCommand(CLI::App& app) {
+  struct Options {
+    std::string trip, out;
+    long size = 800;
+  };
+  auto o = std::make_shared<Options>();
+  CLI::App* cmd = AddCommand(app, "plot", "draw a trip's tracks, points coloured by level", kPlotHelp, [o] {
+    auto trip = OpenTripWithPoints(o->trip);
+    WritePlot(*trip, o->out, o->size);
+    std::printf("%s\n", o->out.c_str());
+  });
+  cmd->add_option("TRIP", o->trip, "the trip")->required();
+  cmd->add_option("-o,--output", o->out, "the picture to write")->required()->option_text("FILE.svg");
+  cmd->add_option("--size", o->size, "the picture's size in pixels (default 800)")
+      ->check(CLI::Range(16L, 100000L));
+}
+
+void AddPlaceCommand(CLI::App& app) {
+  auto o = std::make_shared<PlaceOptions>();
+  CLI::App* cmd = AddCommand(app, "place", "where a trip was at a time, or when it passed a position",
+                             kPlaceHelp, [o] { RunPlace(*o); });
+  cmd->add_option("TRIP", o->trip, "the trip")->required();
+  cmd->add_option("--time", o->time, "the time (seconds since 1970 or YYYY-MM-DDThh:mm:ss, UTC)")
+      ->option_text("T");
+  CLI::Option* lat = cmd->add_option("--lat", o->lat, "latitude, degrees")->check(CLI::Range(-90.0, 90.0));
+  CLI::Option* lon = cmd->add_option("--lon", o->lon, "longitude, degrees")->check(CLI::Range(-180.0, 180.0));
+  lat->needs(lon);
+  lon->needs(lat);
+  cmd->add_option("--tolerance", o->tolerance, "how near the track must pass, metres (default 50)")
+      ->check(CLI::PositiveNumber);
+  cmd->add_option("--track", o->track, "the track to try first")->option_text("ID");
 }
 
 }  // namespace navmisc::cli

@@ -2,6 +2,8 @@
 // catalogue and the system's time zone.
 #include <cstdio>
 
+#include <CLI/CLI.hpp>
+
 #include "cli.h"
 #include "navmisc/platform/files.h"
 #include "navmisc/platform/shared_globals.h"
@@ -30,18 +32,7 @@ void ParseDate(const std::string& text, int& month, int& day, int& year) {
   }
 }
 
-}  // namespace
-
-int CmdProfile(Args& args) {
-  if (args.Flag("help")) {
-    std::puts("Usage: navmisc profile [--app trip|sport|tracker|where] [--on MM/DD/YYYY]\n\n"
-              "Shows an application's user profile (default: trip) as the library reads it,\n"
-              "defaults filled in. With --on, also the weight and height in force on that date.");
-    return 0;
-  }
-  const GPS_APP_PROG_TYPE type = ParseApp(args.Option("app").value_or("trip"));
-  const auto on = args.Option("on");
-  if (!args.Positionals().empty()) Usage("profile takes no arguments");
+void ShowProfile(GPS_APP_PROG_TYPE type, const std::string& on) {
   USER_MAP_INFO& p = *GetUserMapInfo(type);  // read when the data root was set
   std::printf("File:            %s\n", p.GetProfilePathName().ToUtf8().c_str());
   std::printf("Name:            %s (%s)\n", p.name.ToUtf8().c_str(), p.male ? "male" : "female");
@@ -58,26 +49,16 @@ int CmdProfile(Args& args) {
   std::printf("Templates:       mode %d, style %d\n", p.tempMode, p.tempStyle);
   std::printf("Lists:           %d markers, %d runners, %d weight entries\n", p.markers.GetCount(),
               p.runners.GetCount(), p.weightHeights.GetCount());
-  if (on) {
+  if (!on.empty()) {
     int month = 0, day = 0, year = 0;
-    ParseDate(*on, month, day, year);
+    ParseDate(on, month, day, year);
     double weight = 0, height = 0;
     if (!p.GetWeightHeight(month, day, year, weight, height)) Fail("the profile has no weight history");
-    std::printf("On %s:   %g kg, %g cm\n", on->c_str(), weight, height);
+    std::printf("On %s:   %g kg, %g cm\n", on.c_str(), weight, height);
   }
-  return 0;
 }
 
-int CmdTemplates(Args& args) {
-  if (args.Flag("help")) {
-    std::puts("Usage: navmisc templates [--language CODE]\n\n"
-              "Lists the page templates of the catalogue Templates/TEMP.INI in the program's\n"
-              "folder, with names and descriptions in the language CODE (for example \"fr\"),\n"
-              "falling back to the default texts.");
-    return 0;
-  }
-  const std::string language = args.Option("language").value_or("");
-  if (!args.Positionals().empty()) Usage("templates takes no arguments");
+void ListTemplates(const std::string& language) {
   FreeTemplateInfo();
   // The catalogue ships beside the program in the build tree and in the shared data folder of
   // an installed program (like the resource texts).
@@ -94,21 +75,43 @@ int CmdTemplates(Args& args) {
     std::printf("%-24s thumbnail %s\n", "", t->thumbnailPath.ToUtf8().c_str());
   }
   FreeTemplateInfo();
-  return 0;
 }
 
-int CmdTimeZone(Args& args) {
-  if (args.Flag("help")) {
-    std::puts("Usage: navmisc timezone\n\n"
-              "Shows the offset of local time from UTC now (seconds) and whether the time zone\n"
-              "observes daylight saving, as the library sees them (TZ is honoured).");
-    return 0;
-  }
-  if (!args.Positionals().empty()) Usage("timezone takes no arguments");
+void ShowTimeZone() {
   const long shift = GetOSTimeZomeShift();
   std::printf("Offset from UTC: %ld s (%+.2f h)\n", shift, shift / 3600.0);
   std::printf("Daylight saving: %s\n", System_DayLight() ? "yes" : "no");
-  return 0;
+}
+
+}  // namespace
+
+void AddProfileCommand(CLI::App& app) {
+  auto application = std::make_shared<std::string>("trip");
+  auto on = std::make_shared<std::string>();
+  CLI::App* cmd = AddCommand(app, "profile", "show an application's user profile",
+                             "Shows an application's user profile (default: trip) as the library reads it,\n"
+                             "defaults filled in. With --on, also the weight and height in force on that date.",
+                             [application, on] { ShowProfile(ParseApp(*application), *on); });
+  cmd->add_option("--app", *application, "trip, sport, tracker or where (default trip)")
+      ->check(CLI::IsMember({"trip", "sport", "tracker", "where"}));
+  cmd->add_option("--on", *on, "a date")->option_text("MM/DD/YYYY");
+}
+
+void AddTemplatesCommand(CLI::App& app) {
+  auto language = std::make_shared<std::string>();
+  CLI::App* cmd = AddCommand(app, "templates", "list the web-page templates of the program's catalogue",
+                             "Lists the page templates of the catalogue Templates/TEMP.INI in the program's\n"
+                             "folder, with names and descriptions in the language CODE (for example \"fr\"),\n"
+                             "falling back to the default texts.",
+                             [language] { ListTemplates(*language); });
+  cmd->add_option("--language", *language, "the language of the names")->option_text("CODE");
+}
+
+void AddTimeZoneCommand(CLI::App& app) {
+  AddCommand(app, "timezone", "the local offset from UTC and whether the zone observes daylight saving",
+             "Shows the offset of local time from UTC now (seconds) and whether the time zone\n"
+             "observes daylight saving, as the library sees them (TZ is honoured).",
+             ShowTimeZone);
 }
 
 }  // namespace navmisc::cli

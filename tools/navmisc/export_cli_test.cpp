@@ -74,7 +74,7 @@ TEST(ExportCommand, WritesEachFormatOrSaysWhyNot) {
       {"gpx", L"missing/t.gpx", 1, "does not exist"},
       {"gpx", L"t.gpx/x.gpx", 1, "t.gpx is not a folder"},
       {"gpx", longName, 1, "cannot write " + (s.root / longName).ToUtf8() + ": File name too long"},
-      {"svg", L"t.svg", 2, "--format must be"},
+      {"svg", L"t.svg", 2, "--format: svg not in {gpx,kml,kmz,tcx,csv}"},
   };
   for (const auto& c : cases) {
     const std::string args = "export " + s.id + " --format " + c.format + " -o " + s.Out(c.out);

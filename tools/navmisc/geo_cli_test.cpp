@@ -112,16 +112,16 @@ TEST_F(GeoCommands, PlaceAnswersByTimeOrPositionAndErrorsSayWhy) {
       {place + "--lat 10 --lon 10", 1, "no track of the trip passed within 50 m"},
       {place + "--time 100", 1, "the trip has no track at 1970-01-01T00:01:40Z"},
       {place, 2, "place needs --time or --lat and --lon"},
-      {place + "--lat 10", 2, "--lat and --lon go together"},
+      {place + "--lat 10", 2, "--lat requires --lon"},
       {place + "--lat 0 --lon 0", 2, "0/0 stands for no position"},
       {place + "--time yesterday", 2, "is not a time"},
       {"optimize NOPE", 1, "no trip 'NOPE'"},
-      {"optimize", 2, "optimize takes one trip id"},
-      {"plot GEOTRIP", 2, "plot needs -o FILE.svg"},
+      {"optimize", 2, "TRIP is required"},
+      {"plot GEOTRIP", 2, "--output is required"},
       {"plot GEOTRIP -o /no/such/folder/x.svg", 1, "the folder /no/such/folder does not exist"},
-      {"plot GEOTRIP -o x.svg --size 3", 2, "--size must be a whole number"},
-      {"optimize --help", 0, "Usage: navmisc optimize TRIP"},
-      {"place --help", 0, "Usage: navmisc place TRIP"},
+      {"plot GEOTRIP -o x.svg --size 3", 2, "--size: Value 3 not in range 16 to 100000"},
+      {"optimize --help", 0, "Usage: navmisc optimize [OPTIONS] TRIP"},
+      {"place --help", 0, "Usage: navmisc place [OPTIONS] TRIP"},
   };
   for (const auto& c : cases) {
     const CommandResult r = RunTool(c.args);

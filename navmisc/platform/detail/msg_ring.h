@@ -12,6 +12,17 @@
 
 namespace navmisc::detail {
 
+// A condition variable that a process dying while it waits cannot break. glibc's
+// process-shared pthread_cond_t keeps per-waiter bookkeeping inside the shared object; a waiter
+// killed in pthread_cond_wait leaves it behind, and a later pthread_cond_broadcast can wait for
+// that waiter for ever. Here the only shared state is a sequence word that the kernel's futex
+// waits on: a dead waiter leaves nothing behind but a too high `waiters` count, which costs a
+// needless wake-up call and nothing else.
+struct SharedCondition {
+  uint32_t seq;      // changed by every broadcast
+  uint32_t waiters;  // processes that may be waiting (an upper bound)
+};
+
 // Why a mutex and condition variables rather than a lock-free ring: any number of senders and
 // receivers share one queue (several threads of an application send requests), both sides need
 // to sleep while there is nothing to do, and a process-shared robust mutex tells the next
@@ -27,8 +38,8 @@ struct MsgRingHeader {
   pthread_mutex_t ringLock;   // guards head, tail, nextSeq and the bytes between them
   pthread_mutex_t writeLock;  // held by a sender for the whole of one message
   pthread_mutex_t readLock;   // held by a receiver for the whole of one message
-  pthread_cond_t notEmpty;    // bytes were put in
-  pthread_cond_t notFull;     // bytes were taken out
+  SharedCondition notEmpty;   // bytes were put in
+  SharedCondition notFull;    // bytes were taken out
 };
 
 // The data area (the ring's bytes) starts here.
