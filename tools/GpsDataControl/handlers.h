@@ -51,6 +51,11 @@ struct RequestContext {
   ReplyChannel& replies;
   const Config& config;
   Product product;
+  // For long work (a log read, a file import), asked between two of its steps: true once a
+  // cancel request (a device block with DC_DEVICE_CANCEL_READ) or the exit block has come.
+  // Requests that arrive meanwhile wait and are served after the work, in order (the cancel
+  // request too, so that it gets its own reply).
+  std::function<bool()> stopRequested = [] { return false; };
 };
 
 using Handler = std::function<void(RequestContext&)>;

@@ -1,0 +1,64 @@
+// What the GPX and TCX readers share: the XML stream, the sink with its counts, the capture of
+// an element's text, and the checked reading of numbers and times.
+#pragma once
+
+#include <string>
+#include <string_view>
+
+#include "navmisc/import/detail/xml_stream.h"
+#include "navmisc/import/track_reader.h"
+
+namespace navmisc::import::detail {
+
+class XmlTrackReader : public TrackReader, protected XmlHandler {
+ public:
+  explicit XmlTrackReader(ImportSink& sink) : sink_(sink), xml_(*this) {}
+  bool Feed(const char* data, size_t size) override;
+  bool Finish() override;
+
+ protected:
+  // Called by Finish after a well-formed end, before the status is settled.
+  virtual void AtEnd() {}
+
+  // The text of the current element is collected from now until its end (at most kMaxText
+  // bytes; the rest is dropped).
+  void Capture() {
+    capturing_ = true;
+    text_.clear();
+  }
+  // The collected text, capture ended.
+  std::string_view TakeText() {
+    capturing_ = false;
+    return text_;
+  }
+  void Text(std::string_view text) override;
+
+  // Checked readings of the collected text; on failure the document stops with
+  // DC_ERR_IMPORT_VALUE and a message naming `what`.
+  bool ReadNumber(std::string_view text, const char* what, bool (*inRange)(double), double& out);
+  bool ReadTime(std::string_view text, const char* what, int64_t& out);
+  // A required coordinate attribute of a point element.
+  bool ReadCoordinate(const char** attributes, const char* name, const char* element,
+                      bool (*inRange)(double), double& out);
+
+  // Sink calls that count and stop the document when the sink says stop.
+  bool Emit(bool accepted);
+  bool EmitTrack(const ImportTrack& track);
+  bool EmitSegment();
+  bool EmitPoint(const ImportPoint& point);
+  bool EmitEndTrack();
+  bool EmitMarker(const ImportMarker& marker);
+  bool EmitDocument(const std::string& name, const std::string& description);
+  // Stops the document with `code`; the message gets the line in front.
+  void StopAt(int32_t code, const std::string& message);
+  bool Stopped() const { return !xml_.status().ok(); }
+
+  ImportSink& sink_;
+
+ private:
+  XmlStream xml_;
+  std::string text_;
+  bool capturing_ = false;
+};
+
+}  // namespace navmisc::import::detail
