@@ -54,6 +54,7 @@ class ChannelRun {
   // Sets g_bExit and waits (handling messages) until the command thread has ended.
   void Stop();
   ReplyLog& log() { return log_; }
+  const ReplyLog& log() const { return log_; }
 
  private:
   TempDir root_;

@@ -12,7 +12,6 @@ const char* DeviceErrorText(int32_t code) {
     case DC_ERR_UNKNOWN_COMMAND: return "unknown command";
     case DC_ERR_NOT_A_REQUEST: return "not a request";
     case DC_ERR_NO_DEVICE: return "no logger is connected";
-    case DC_ERR_DEVICE_BUSY: return "the logger is busy with a read of its log";
     case DC_ERR_DEVICE_GONE: return "the logger went away";
     case DC_ERR_DEVICE_WRITE: return "the logger's files could not be written";
     case DC_ERR_LOG_NOT_READ: return "the log has not been read yet (clear after download is set)";

@@ -8,7 +8,6 @@
 
 enum : int32_t {
   DC_ERR_NO_DEVICE = 9201,          // no logger is connected
-  DC_ERR_DEVICE_BUSY = 9202,        // a read of the log is running; only CancelRead is taken
   DC_ERR_DEVICE_GONE = 9203,        // the logger went away while the command ran
   DC_ERR_DEVICE_WRITE = 9204,       // the logger's files could not be written
   DC_ERR_LOG_NOT_READ = 9205,       // clear refused: clear-after-download is set and a log is unread

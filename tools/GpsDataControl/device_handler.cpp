@@ -15,7 +15,7 @@ bool DeviceConnected(const Config& config) {
 void RegisterDeviceHandlers(HandlerTable& table) {
   table.Set(DC_CMD_DEVICE, [](RequestContext& ctx) {
     if (DeviceService* service = RunningDeviceService()) {
-      service->Handle(ctx.request);
+      service->Handle(ctx);
       return;
     }
     CDataControlCmdBlkKVDevice device{};

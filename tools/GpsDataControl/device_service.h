@@ -15,9 +15,9 @@ class DeviceService {
   virtual ~DeviceService() = default;
   // Whether the device is connected now; brings the shared device globals up to date.
   virtual bool Connected() = 0;
-  // Handles a device request (kind 1). Every request gets a reply; a read of the log replies
-  // when it ends, and meanwhile the service takes further requests (CancelRead among them).
-  virtual void Handle(const CUnpackageBlk& request) = 0;
+  // Handles a device request (kind 1) and replies. A read of the log asks
+  // ctx.stopRequested() between points: CancelRead (or the exit block) stops it.
+  virtual void Handle(RequestContext& ctx) = 0;
 };
 
 std::unique_ptr<DeviceService> MakeTracerService(ReplyChannel& replies, const Config& config);

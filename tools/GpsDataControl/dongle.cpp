@@ -32,19 +32,24 @@ constexpr int kWaitMicroseconds = 250000;
 // The position script is written at most this often.
 constexpr auto kScriptPeriod = std::chrono::seconds(1);
 
-s_gps_info InfoOf(const gps_fix_t& fix, int satellites) {
-  s_gps_info info{};
+// Takes what a report of gpsd carries into `info`: a report may leave out values (the first of
+// a cycle has no time, one made from RMC alone no altitude), which then keep their last value.
+void Accumulate(const gps_data_t& data, s_gps_info& info) {
+  const gps_fix_t& fix = data.fix;
   info.nFixQuality = fix.mode < MODE_2D ? 0 : fix.status > 0 ? fix.status : 1;
-  info.nSatellites = satellites;
-  info.dLatitude = fix.latitude;
-  info.dLongitude = fix.longitude;
-  info.dAltitude = std::isfinite(fix.altMSL) ? fix.altMSL
-                   : std::isfinite(fix.altHAE) ? fix.altHAE
-                                               : 0.0;
-  info.nSpeed = std::isfinite(fix.speed) ? static_cast<int32_t>(std::lround(fix.speed * 3600.0)) : 0;
-  info.nCourse = std::isfinite(fix.track) ? static_cast<int32_t>(std::lround(fix.track)) % 360 : -1;
-  info.tTime = static_cast<int32_t>(fix.time.tv_sec);
-  return info;
+  if (fix.mode >= MODE_2D && std::isfinite(fix.latitude) && std::isfinite(fix.longitude)) {
+    info.dLatitude = fix.latitude;
+    info.dLongitude = fix.longitude;
+  }
+  if (std::isfinite(fix.altMSL)) {
+    info.dAltitude = fix.altMSL;
+  } else if (std::isfinite(fix.altHAE)) {
+    info.dAltitude = fix.altHAE;
+  }
+  if (std::isfinite(fix.speed)) info.nSpeed = static_cast<int32_t>(std::lround(fix.speed * 3600.0));
+  if (std::isfinite(fix.track)) info.nCourse = static_cast<int32_t>(std::lround(fix.track)) % 360;
+  if (data.set & SATELLITE_SET) info.nSatellites = data.satellites_used;
+  if (fix.time.tv_sec > 0) info.tTime = static_cast<int32_t>(fix.time.tv_sec);
 }
 
 class DongleService : public DeviceService {
@@ -72,9 +77,9 @@ class DongleService : public DeviceService {
     return connected;
   }
 
-  void Handle(const CUnpackageBlk& request) override {
+  void Handle(RequestContext& ctx) override {
     CDataControlCmdBlkKVDevice device{};
-    navmisc::datactrl::UnpackBlock(request, device);
+    navmisc::datactrl::UnpackBlock(ctx.request, device);
     device.nLastError = DC_ERR_NOT_AVAILABLE;
     replies_.Send(device);
   }
@@ -139,11 +144,11 @@ class DongleService : public DeviceService {
       lastReport = Clock::now();
       if (device.empty()) device = data.dev.path;
       SetConnected(true, device);
-      if (data.fix.mode < MODE_2D || !std::isfinite(data.fix.latitude) ||
-          !std::isfinite(data.fix.longitude))
-        continue;
-      const s_gps_info info = InfoOf(data.fix, data.satellites_used);
-      g_gps_info = info;
+      Accumulate(data, current_);
+      // A position counts once it has a fix and a time of its own.
+      if (current_.nFixQuality == 0 || data.fix.time.tv_sec <= 0) continue;
+      const s_gps_info info = current_;
+      navmisc::datactrl::PublishGpsInfo(info);
       if (Clock::now() - lastScript >= kScriptPeriod) {
         lastScript = Clock::now();
         if (prepared_ || (prepared_ = where_.Prepare()))
@@ -156,6 +161,7 @@ class DongleService : public DeviceService {
   const std::string host_;
   const std::string port_;
   std::atomic<bool> connected_{false};
+  s_gps_info current_{0, 0, 0, 0, 0, 0, -1, 0};  // the position as the reports build it up
   WherePosition where_;
   bool prepared_ = false;
   std::thread thread_;

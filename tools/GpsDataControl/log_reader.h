@@ -2,8 +2,8 @@
 // log").
 #pragma once
 
-#include <atomic>
 #include <cstdint>
+#include <functional>
 #include <string>
 #include <vector>
 
@@ -24,9 +24,10 @@ struct LogReadResult {
 
 // Turns every log of `logger` into a trip of application `app` (one trip per log, one track per
 // segment of the log), sending progress blocks (source 1) for each log and every thousand
-// points. All or nothing: when `cancel` turns true (looked at between points), when a log
-// cannot be read or the logger goes away, the trips made so far are removed again.
+// points. All or nothing: when `stopRequested` says so (asked between points), when a log
+// cannot be read or when the logger goes away, the trips made so far are removed again. Logs
+// without any point (empty ones too) make no trip but count as read.
 LogReadResult ReadLoggerLogs(const LoggerFolder& logger, GPS_APP_PROG_TYPE app,
-                             ReplyChannel& replies, const std::atomic<bool>& cancel);
+                             ReplyChannel& replies, const std::function<bool()>& stopRequested);
 
 }  // namespace gpsdc

@@ -1,7 +1,7 @@
-// "/Tracer": the logger that appears as a folder. Commands run on the server's thread, except a
-// read of the log, which runs on a thread of its own so that CancelRead can reach it; while it
-// runs every other command is answered DC_ERR_DEVICE_BUSY. A watcher looks for the logger once a
-// second and announces when it comes or goes.
+// "/Tracer": the logger that appears as a folder. Commands run on the server's thread; a read of
+// the log asks the server between points whether CancelRead (or the exit block) has come, and
+// requests that come meanwhile are served after it. A watcher looks for the logger once a second
+// and announces when it comes or goes.
 #include <algorithm>
 #include <atomic>
 #include <condition_variable>
@@ -72,33 +72,28 @@ class TracerService : public DeviceService {
     }
     stopCv_.notify_all();
     watcher_.join();
-    // A read still running is stopped the way CancelRead stops it: no trip is left behind.
-    cancel_ = true;
-    if (reader_.joinable()) reader_.join();
   }
 
   bool Connected() override { return Refresh().has_value(); }
 
-  void Handle(const CUnpackageBlk& request) override {
+  void Handle(RequestContext& ctx) override {
     CDataControlCmdBlkKVDevice device{};
-    UnpackBlock(request, device);
+    UnpackBlock(ctx.request, device);
     const int32_t cmd = device.nDeviceCmd;
     if (cmd == DC_DEVICE_CANCEL_READ) {
-      cancel_ = reading_.load();
-      replies_.Send(device);
+      // A read it was meant for has stopped already (requests wait while a read runs).
+      ctx.replies.Send(device);
       return;
     }
     std::optional<LoggerFolder> logger = Refresh();
     // A KV-11 logger's settings travel in that family's block, but a plain device block with
     // options may be written to it too (the wizard writes g_devConfig to every model).
-    if (UsesKV11Block(cmd) && !(cmd == DC_DEVICE_WRITE_SETTING && request.Has("nInterval"))) {
+    if (UsesKV11Block(cmd) && !(cmd == DC_DEVICE_WRITE_SETTING && ctx.request.Has("nInterval"))) {
       auto kv11 = std::make_unique<CDataControlCmdBlkKVDevice11>();
       InitKV11BlockDefaults(*kv11);
-      UnpackBlock(request, *kv11);
-      kv11->nLastError = reading_ ? DC_ERR_DEVICE_BUSY
-                         : !logger ? DC_ERR_NO_DEVICE
-                                   : RunKV11(*kv11, *logger);
-      replies_.Send(*kv11);
+      UnpackBlock(ctx.request, *kv11);
+      kv11->nLastError = logger ? RunKV11(*kv11, *logger) : int32_t{DC_ERR_NO_DEVICE};
+      ctx.replies.Send(*kv11);
       return;
     }
     switch (cmd) {
@@ -108,29 +103,21 @@ class TracerService : public DeviceService {
       case DC_DEVICE_WRITE_SETTING:
       case DC_DEVICE_RESET:
       case DC_DEVICE_WRITE_NAVI:
+        device.nLastError = logger ? Run(device, *logger, ctx) : int32_t{DC_ERR_NO_DEVICE};
         break;
       default:
         device.nLastError = DC_ERR_UNKNOWN_COMMAND;
-        replies_.Send(device);
-        return;
+        break;
     }
-    if (reading_ || !logger) {
-      device.nLastError = reading_ ? DC_ERR_DEVICE_BUSY : DC_ERR_NO_DEVICE;
-      replies_.Send(device);
-      return;
-    }
-    if (cmd == DC_DEVICE_READ_LOG) {
-      StartRead(device, *logger);  // replies when it ends
-      return;
-    }
-    device.nLastError = Run(device, *logger);
     Refresh();  // the memory in use may have changed
-    replies_.Send(device);
+    ctx.replies.Send(device);
   }
 
  private:
-  int32_t Run(CDataControlCmdBlkKVDevice& block, LoggerFolder& logger) {
+  int32_t Run(CDataControlCmdBlkKVDevice& block, LoggerFolder& logger, RequestContext& ctx) {
     switch (block.nDeviceCmd) {
+      case DC_DEVICE_READ_LOG:
+        return ReadLog(block, logger, ctx);
       case DC_DEVICE_CLEAR_LOG:
         return ClearLogs(logger);
       case DC_DEVICE_READ_SETTING: {
@@ -189,30 +176,21 @@ class TracerService : public DeviceService {
     return logger.DeleteLogs(logs) ? int32_t{DC_ERR_NONE} : int32_t{DC_ERR_DEVICE_WRITE};
   }
 
-  void StartRead(const CDataControlCmdBlkKVDevice& request, const LoggerFolder& logger) {
-    if (reader_.joinable()) reader_.join();  // the last read has replied and is ending
-    cancel_ = false;
-    reading_ = true;
-    reader_ = std::thread([this, request, logger] {
-      CDataControlCmdBlkKVDevice reply = request;
-      const LogReadResult result = ReadLoggerLogs(logger, TripApplication(), replies_, cancel_);
-      reply.nLastError = result.error;
-      if (result.error == DC_ERR_NONE) {
-        {
-          std::lock_guard lock(mutex_);
-          readLogs_.insert(readLogs_.end(), result.read.begin(), result.read.end());
-        }
-        // Only after every log has become a trip; a log that changed since is kept.
-        if (g_bClearLog) logger.DeleteLogs(result.read);
-        if (result.firstTime >= 0) {
-          reply.tPointStartTime = CovertTimeTToOleDateTime(result.firstTime);
-          reply.tPointEndTime = CovertTimeTToOleDateTime(result.lastTime);
-        }
-      }
-      Refresh();
-      reading_ = false;
-      replies_.Send(reply);
-    });
+  int32_t ReadLog(CDataControlCmdBlkKVDevice& block, const LoggerFolder& logger, RequestContext& ctx) {
+    const LogReadResult result =
+        ReadLoggerLogs(logger, TripApplication(), ctx.replies, ctx.stopRequested);
+    if (result.error != DC_ERR_NONE) return result.error;
+    {
+      std::lock_guard lock(mutex_);
+      readLogs_.insert(readLogs_.end(), result.read.begin(), result.read.end());
+    }
+    // Only after every log has become a trip; a log that changed since is kept.
+    if (g_bClearLog) logger.DeleteLogs(result.read);
+    if (result.firstTime >= 0) {
+      block.tPointStartTime = CovertTimeTToOleDateTime(result.firstTime);
+      block.tPointEndTime = CovertTimeTToOleDateTime(result.lastTime);
+    }
+    return DC_ERR_NONE;
   }
 
   CString DeviceIdText() const { return CString::FromUtf8(g_szDeviceId); }
@@ -256,9 +234,6 @@ class TracerService : public DeviceService {
   const Config config_;
   std::mutex mutex_;               // the shared globals' updates and readLogs_
   std::vector<LogFile> readLogs_;  // logs that became trips in this run
-  std::thread reader_;
-  std::atomic<bool> reading_{false};
-  std::atomic<bool> cancel_{false};
   std::thread watcher_;
   std::mutex stopMutex_;
   std::condition_variable stopCv_;

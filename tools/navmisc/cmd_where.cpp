@@ -29,7 +29,8 @@ void Follow(int count, double seconds) {
   const auto end = std::chrono::steady_clock::now() +
                    std::chrono::milliseconds(seconds > 0 ? static_cast<long>(seconds * 1000) : 0);
   // Positions already known belong to an earlier run.
-  int32_t lastTime = g_gps_info.tTime;
+  s_gps_info known{};
+  int32_t lastTime = datactrl::ReadGpsInfo(known) ? known.tTime : 0;
   bool connected = !channel.connected();
   int shown = 0;
   for (;;) {
@@ -39,8 +40,8 @@ void Follow(int count, double seconds) {
                             : "Waiting for a receiver through gpsd ([DONGLE] in GpsDataControl.ini)...\n");
       std::fflush(stdout);
     }
-    if (g_gps_info.tTime != lastTime && g_gps_info.nFixQuality > 0) {
-      const s_gps_info position = g_gps_info;
+    s_gps_info position;
+    if (datactrl::ReadGpsInfo(position) && position.tTime != lastTime && position.nFixQuality > 0) {
       lastTime = position.tTime;
       PrintPosition(position);
       if (++shown == count) return;
