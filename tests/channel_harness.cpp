@@ -1,6 +1,11 @@
 #include "channel_harness.h"
 
+#include <arpa/inet.h>
+#include <netinet/in.h>
+#include <signal.h>
 #include <stdlib.h>
+#include <sys/socket.h>
+#include <unistd.h>
 
 #include "navmisc/datactrl/block_codec.h"
 #include "navmisc/datactrl/device_state.h"
@@ -107,6 +112,34 @@ std::string SyntheticGpx(long start, int points) {
   }
   gpx += "</trkseg></trk>\n</gpx>\n";
   return gpx;
+}
+
+int FreePort() {
+  const int fd = ::socket(AF_INET, SOCK_STREAM, 0);
+  sockaddr_in addr{};
+  addr.sin_family = AF_INET;
+  addr.sin_addr.s_addr = htonl(INADDR_LOOPBACK);
+  socklen_t len = sizeof addr;
+  ::bind(fd, reinterpret_cast<sockaddr*>(&addr), sizeof addr);
+  ::getsockname(fd, reinterpret_cast<sockaddr*>(&addr), &len);
+  ::close(fd);
+  return ntohs(addr.sin_port);
+}
+
+bool GpsFake::Start(int port, const std::string& log) {
+  SpawnOptions quiet;
+  quiet.nullStdin = quiet.nullStdout = quiet.nullStderr = true;
+  // setsid makes gpsfake the leader of a process group that its gpsd joins.
+  return process_.Start({"/usr/bin/setsid", "gpsfake", "-q", "-1", "-c", "0.05", "-P",
+                         std::to_string(port), log},
+                        quiet);
+}
+
+void GpsFake::Stop() {
+  if (!process_.IsRunning()) return;
+  ::kill(-process_.pid(), SIGTERM);
+  if (!process_.WaitFor(5000)) ::kill(-process_.pid(), SIGKILL);
+  process_.Kill();
 }
 
 void MakeLogger(const CString& dir, int model, int serial, const std::string& extra) {

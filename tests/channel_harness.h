@@ -12,6 +12,7 @@
 
 #include "navmisc/datactrl/cmd_blocks.h"
 #include "navmisc/platform/cstring.h"
+#include "navmisc/platform/process.h"
 #include "navmisc/platform/types.h"
 #include "navmisc/platform/window.h"
 #include "testutil.h"
@@ -70,6 +71,26 @@ bool Until(const std::function<bool()>& done, int ms = 30000);
 // A GPX 1.1 track of `points` points, one a second from `start`, heading north-east from
 // latitude 47, longitude 8.
 std::string SyntheticGpx(long start, int points);
+
+// A TCP port of 127.0.0.1 that nobody uses now.
+int FreePort();
+
+// gpsfake (which replays an NMEA log through a gpsd of its own on `port`) in a session of its
+// own, ended with that gpsd whatever happens. Needs gpsfake and setsid on PATH.
+class GpsFake {
+ public:
+  GpsFake() = default;
+  ~GpsFake() { Stop(); }
+  GpsFake(const GpsFake&) = delete;
+  GpsFake& operator=(const GpsFake&) = delete;
+  // Replays `log` once, a sentence every 50 ms, once a client has connected.
+  bool Start(int port, const std::string& log);
+  // Ends gpsfake and its gpsd: politely, then for sure.
+  void Stop();
+
+ private:
+  ChildProcess process_;
+};
 
 // Makes a logger folder at `dir`: the description file with `model` and `serial` (and
 // `extra`, more lines of its [LOGGER] section) and the log folder.

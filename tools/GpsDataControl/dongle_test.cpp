@@ -1,10 +1,6 @@
 // The where-am-I receiver ("/Dongle") through gpsd: gpsfake replays an NMEA log on a private
 // port, the real process follows it.
-#include <arpa/inet.h>
 #include <gtest/gtest.h>
-#include <netinet/in.h>
-#include <signal.h>
-#include <sys/socket.h>
 #include <unistd.h>
 
 #include <cmath>
@@ -16,7 +12,6 @@
 #include "navmisc/datactrl/device_commands.h"
 #include "navmisc/datactrl/device_state.h"
 #include "navmisc/platform/files.h"
-#include "navmisc/platform/process.h"
 #include "navmisc/platform/settings.h"
 #include "navmisc/platform/shared_globals.h"
 #include "navmisc/records/trip.h"
@@ -25,48 +20,14 @@
 namespace {
 
 using navmisc::testutil::ChannelRun;
+using navmisc::testutil::FreePort;
+using navmisc::testutil::GpsFake;
 using navmisc::testutil::ReadFileBytes;
 using navmisc::testutil::TempDir;
 using navmisc::testutil::Until;
 using navmisc::testutil::WriteFileBytes;
 
 constexpr long kLogStart = 1714723200;  // 2024-05-03T08:00:00Z, the log's first fix
-
-// A TCP port of 127.0.0.1 that nobody uses now.
-int FreePort() {
-  const int fd = ::socket(AF_INET, SOCK_STREAM, 0);
-  sockaddr_in addr{};
-  addr.sin_family = AF_INET;
-  addr.sin_addr.s_addr = htonl(INADDR_LOOPBACK);
-  socklen_t len = sizeof addr;
-  ::bind(fd, reinterpret_cast<sockaddr*>(&addr), sizeof addr);
-  ::getsockname(fd, reinterpret_cast<sockaddr*>(&addr), &len);
-  ::close(fd);
-  return ntohs(addr.sin_port);
-}
-
-// gpsfake (and the gpsd it runs) in a session of their own, ended with it whatever happens.
-class GpsFake {
- public:
-  bool Start(int port, const std::string& log) {
-    navmisc::SpawnOptions quiet;
-    quiet.nullStdin = quiet.nullStdout = quiet.nullStderr = true;
-    return process_.Start({"/usr/bin/setsid", "gpsfake", "-q", "-1", "-c", "0.05", "-P",
-                           std::to_string(port), log},
-                          quiet);
-  }
-  // Ends gpsfake and its gpsd: politely, then for sure.
-  void Stop() {
-    if (!process_.IsRunning()) return;
-    ::kill(-process_.pid(), SIGTERM);
-    if (!process_.WaitFor(5000)) ::kill(-process_.pid(), SIGKILL);
-    process_.Kill();
-  }
-  ~GpsFake() { Stop(); }
-
- private:
-  navmisc::ChildProcess process_;
-};
 
 bool LastDeviceStatus(const ChannelRun& run, bool connected) {
   for (auto it = run.log().statuses.rbegin(); it != run.log().statuses.rend(); ++it)

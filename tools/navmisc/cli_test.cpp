@@ -47,7 +47,7 @@ TEST(CommandLine, GlobalOptionsGoAnywhereAndEveryCommandExplainsItself) {
   }
   // Every command answers -h and --help with its own usage and nothing else.
   for (const char* command : {"demo", "trips", "optimize", "plot", "place", "export", "profile", "templates",
-                              "timezone", "help"}) {
+                              "timezone", "channel", "device", "where", "help"}) {
     for (const char* flag : {"-h", "--help"}) {
       const CommandResult r = Tool(std::string(command) + " " + flag);
       EXPECT_EQ(r.status, 0) << command << " " << flag << "\n" << r.out;

@@ -97,6 +97,7 @@ void RunDemo(std::string root) {
   std::printf("  (tracker day: %ld cell fixes, %ld help points)\n", cells, help);
   DemoGeometry();
   DemoExports(root);
+  DemoDevice(root);
   std::printf("\nTry: navmisc --data-root %s trips\n", root.c_str());
 }
 

@@ -2,6 +2,7 @@
 #include <unistd.h>
 
 #include <algorithm>
+#include <cstring>
 #include <cstdio>
 #include <iostream>
 #include <memory>
@@ -17,8 +18,11 @@
 #include "navmisc/datactrl/device_commands.h"
 #include "navmisc/datactrl/device_fields.h"
 #include "navmisc/datactrl/device_state.h"
+#include "navmisc/datactrl/navi_points.h"
 #include "navmisc/datactrl/reply_dialog.h"
 #include "navmisc/datactrl/wiz_config_sheet.h"
+#include "navmisc/import/import_errors.h"
+#include "navmisc/import/read_track_file.h"
 #include "navmisc/platform/files.h"
 #include "navmisc/records/trip.h"
 #include "navmisc/util/device_identity.h"
@@ -267,6 +271,66 @@ void Modes(const std::string& logger) {
               sheet.bMotionDetect);
 }
 
+// The navigation points of a GPX file: its waypoints and route points, in document order.
+class NaviPoints : public import::ImportSink {
+ public:
+  bool BeginTrack(const import::ImportTrack& track) override {
+    inRoute_ = track.kind == import::TrackKind::kRoute;
+    name_ = track.name;
+    return true;
+  }
+  bool BeginSegment() override { return true; }
+  bool Point(const import::ImportPoint& p) override {
+    if (inRoute_ && p.hasPosition) Add(p.latitude, p.longitude, p.hasAltitude ? p.altitude : 0, name_);
+    return true;
+  }
+  bool EndTrack() override {
+    inRoute_ = false;
+    return true;
+  }
+  bool Marker(const import::ImportMarker& m) override {
+    Add(m.latitude, m.longitude, m.hasAltitude ? m.altitude : 0, m.name);
+    return true;
+  }
+  std::vector<NAVI_POINT_INFO> points;
+
+ private:
+  void Add(double lat, double lon, double alt, const std::string& text) {
+    NAVI_POINT_INFO p;
+    p.dLatitude = lat;
+    p.dLongitude = lon;
+    p.dAltitude = alt;
+    // The text as bytes, terminated, cut at a whole character.
+    size_t n = std::min(text.size(), sizeof p.szText - 1);
+    while (n > 0 && n < text.size() && (static_cast<unsigned char>(text[n]) & 0xC0) == 0x80) --n;
+    std::memcpy(p.szText, text.data(), n);
+    points.push_back(p);
+  }
+  bool inRoute_ = false;
+  std::string name_;
+};
+
+void WriteNavi(const std::string& logger, const std::string& file) {
+  NaviPoints sink;
+  import::ReadFileOptions options;
+  options.format.format = import::Format::kGpx;
+  const import::ReadFileResult read = import::ReadTrackFile(CString::FromUtf8(file), sink, options);
+  if (!read.status.ok() && read.status.code != DC_ERR_IMPORT_NO_POINTS) Fail(file + ": " + read.status.message);
+  if (sink.points.empty()) Fail(file + ": no waypoints or route points");
+  const size_t kept = std::min<size_t>(sink.points.size(), datactrl::kNaviMaxEntries);
+  if (kept < sink.points.size())
+    std::fprintf(stderr, "navmisc device navi: only the first %zu of %zu points go to the logger\n", kept,
+                 sink.points.size());
+  DeviceChannel channel(GPS_APP_TRIP, logger);
+  RequireLogger(channel);
+  CxPtrList list;
+  for (NAVI_POINT_INFO& p : sink.points) list.AddTail(&p);
+  channel.Request(DC_DEVICE_WRITE_NAVI, [&] { DC_KVDEVICE_WriteNaviData(list); });
+  channel.WaitDeviceReply();
+  FailOnError(channel.lastError(), "cannot write the navigation points");
+  std::printf("%zu navigation point%s written.\n", kept, kept == 1 ? "" : "s");
+}
+
 }  // namespace
 
 void AddDeviceCommand(CLI::App& app) {
@@ -313,6 +377,13 @@ void AddDeviceCommand(CLI::App& app) {
   AddCommand(*group, "modes",
              "the configuration wizard's six logging modes and time-zone choices for this logger",
              "", [logger] { Modes(*logger); });
+
+  auto file = std::make_shared<std::string>();
+  CLI::App* navi = AddCommand(
+      *group, "navi", "send a GPX file's waypoints and route points to the logger as navigation points",
+      "At most 100 points; loggers of the KV-11 family (models 8, 9, 18, 20, 21, 22) take them.",
+      [logger, file] { WriteNavi(*logger, *file); });
+  navi->add_option("FILE", *file, "a GPX file")->required();
 }
 
 }  // namespace navmisc::cli

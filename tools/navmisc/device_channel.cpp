@@ -9,6 +9,7 @@
 #include "navmisc/datactrl/device_commands.h"
 #include "navmisc/datactrl/device_errors.h"
 #include "navmisc/datactrl/request_queue.h"
+#include "navmisc/import/import_errors.h"
 #include "navmisc/platform/console.h"
 #include "navmisc/platform/shared_globals.h"
 
@@ -122,6 +123,7 @@ bool DeviceChannel::WaitDeviceReply(unsigned ms, bool* interrupted) {
 
 std::string DeviceErrorMessage(int32_t code) {
   std::string text = datactrl::DeviceErrorText(code);
+  if (text.empty()) text = import::ImportErrorText(code);
   if (text.empty()) text = "error";
   return text + " (" + std::to_string(code) + ")";
 }
