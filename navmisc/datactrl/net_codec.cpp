@@ -1,4 +1,6 @@
-// The packed form of the web-service and file blocks and of the records nested in them.
+// The packed form of the web-service and file blocks and of the records nested in them. Each
+// record lists its fields once, in package order (Fields below); packing and unpacking are two
+// visitors over that one list, so the two directions cannot drift apart.
 #include <algorithm>
 #include <type_traits>
 #include <vector>
@@ -12,345 +14,268 @@ using namespace detail;
 
 namespace {
 
-// Each record has one Pack and one Unpack; a nested record is a package of its own added under
-// its name.
+template <class R, class T>
+constexpr bool kIs = std::is_same_v<std::remove_const_t<R>, T>;
 
-void Pack(const DC_NET_POINT_INFO& r, CPackageBlk& out) {
-  PutDateTime(out, "oleTime", r.oleTime);
-  PutDouble(out, "dLatitude", r.dLatitude);
-  PutDouble(out, "dLongitude", r.dLongitude);
-  PutDouble(out, "dAltitude", r.dAltitude);
-  PutInt32(out, "nSpeed", r.nSpeed);
-  PutInt32(out, "nPushToLog", r.nPushToLog);
+// A list in the package: its count under `count`, entry i under `entry` with i from 0.
+template <class V>
+struct List {
+  const char* count;
+  const char* entry;
+  V& items;  // a std::vector of records or of texts, const when packing
+};
+template <class V>
+List(const char*, const char*, V&) -> List<V>;
+
+// Fields of each record, in package order. `R` is the record, const for packing; `v` is called
+// with a name and a field, or with a List.
+template <class R, class Visit>
+  requires kIs<R, DC_NET_POINT_INFO>
+void Fields(R& r, Visit&& v) {
+  v("oleTime", r.oleTime);
+  v("dLatitude", r.dLatitude);
+  v("dLongitude", r.dLongitude);
+  v("dAltitude", r.dAltitude);
+  v("nSpeed", r.nSpeed);
+  v("nPushToLog", r.nPushToLog);
 }
 
-void Unpack(const CUnpackageBlk& in, DC_NET_POINT_INFO& r) {
-  GetDateTime(in, "oleTime", r.oleTime);
-  GetDouble(in, "dLatitude", r.dLatitude);
-  GetDouble(in, "dLongitude", r.dLongitude);
-  GetDouble(in, "dAltitude", r.dAltitude);
-  GetInt32(in, "nSpeed", r.nSpeed);
-  GetInt32(in, "nPushToLog", r.nPushToLog);
+template <class R, class Visit>
+  requires kIs<R, DC_NET_POI_INFO>
+void Fields(R& r, Visit&& v) {
+  v("szPoiId", r.szPoiId);
+  v("szTrackId", r.szTrackId);
+  v("szIcon", r.szIcon);
+  v("szTitle", r.szTitle);
+  v("szDesc", r.szDesc);
+  v("dLatitude", r.dLatitude);
+  v("dLongitude", r.dLongitude);
+  v("dAltitude", r.dAltitude);
+  v("nSegment", r.nSegment);
+  v("tTime", r.tTime);
+  v("sEmbeddedCode", r.sEmbeddedCode);
 }
 
-void Pack(const DC_NET_POI_INFO& r, CPackageBlk& out) {
-  PutText(out, "szPoiId", r.szPoiId);
-  PutText(out, "szTrackId", r.szTrackId);
-  PutText(out, "szIcon", r.szIcon);
-  PutText(out, "szTitle", r.szTitle);
-  PutText(out, "szDesc", r.szDesc);
-  PutDouble(out, "dLatitude", r.dLatitude);
-  PutDouble(out, "dLongitude", r.dLongitude);
-  PutDouble(out, "dAltitude", r.dAltitude);
-  PutInt32(out, "nSegment", r.nSegment);
-  PutDateTime(out, "tTime", r.tTime);
-  PutText(out, "sEmbeddedCode", r.sEmbeddedCode);
+template <class R, class Visit>
+  requires kIs<R, DC_NET_TRACK_INFO>
+void Fields(R& r, Visit&& v) {
+  v("szTrackId", r.szTrackId);
+  v("szOwnerId", r.szOwnerId);
+  v("szSubject", r.szSubject);
+  v("szAuthKey", r.szAuthKey);
+  v("szTag", r.szTag);
+  v("szURL", r.szURL);
+  v("bListed", r.bListed);
+  v("nMode", r.nMode);
+  v("lTimeZone", r.lTimeZone);
+  v("nStyle", r.nStyle);
+  v("nPageId", r.nPageId);
+  v("tUploadTime", r.tUploadTime);
+  v(List{"ptrPtList_Count", "ptrPtList_%d", r.ptrPtList});
+  v(List{"ptrPOIList_Count", "ptrPOIList_%d", r.ptrPOIList});
+  v("szMetaInfo", r.szMetaInfo);
+  v("szDesc", r.szDesc);
+  v("szModelId", r.szModelId);
+  v("szLang", r.szLang);
+  v("szTrackData", r.szTrackData);
+  v("szTimeZone", r.szTimeZone);
+  v("ptStart", r.ptStart);
+  v("ptEnd", r.ptEnd);
+  v("nCoverId", r.nCoverId);
 }
 
-void Unpack(const CUnpackageBlk& in, DC_NET_POI_INFO& r) {
-  GetText(in, "szPoiId", r.szPoiId);
-  GetText(in, "szTrackId", r.szTrackId);
-  GetText(in, "szIcon", r.szIcon);
-  GetText(in, "szTitle", r.szTitle);
-  GetText(in, "szDesc", r.szDesc);
-  GetDouble(in, "dLatitude", r.dLatitude);
-  GetDouble(in, "dLongitude", r.dLongitude);
-  GetDouble(in, "dAltitude", r.dAltitude);
-  GetInt32(in, "nSegment", r.nSegment);
-  GetDateTime(in, "tTime", r.tTime);
-  GetText(in, "sEmbeddedCode", r.sEmbeddedCode);
-}
-
-void Pack(const DC_NET_THUMB_INFO& r, CPackageBlk& out) {
-  PutText(out, "szDownloadURL", r.szDownloadURL);
+template <class R, class Visit>
+  requires kIs<R, DC_NET_THUMB_INFO>
+void Fields(R& r, Visit&& v) {
+  v("szDownloadURL", r.szDownloadURL);
   for (int i = 0; i < kNetThumbCount; ++i) {
-    PutText(out, NumberedName("szURL_%d", i), r.thumbs[i].szURL);
-    PutUInt32(out, NumberedName("dwSize_%d", i), r.thumbs[i].dwSize);
+    v(NumberedName("szURL_%d", i), r.thumbs[i].szURL);
+    v(NumberedName("dwSize_%d", i), r.thumbs[i].dwSize);
   }
 }
 
-void Unpack(const CUnpackageBlk& in, DC_NET_THUMB_INFO& r) {
-  GetText(in, "szDownloadURL", r.szDownloadURL);
-  for (int i = 0; i < kNetThumbCount; ++i) {
-    GetText(in, NumberedName("szURL_%d", i), r.thumbs[i].szURL);
-    GetUInt32(in, NumberedName("dwSize_%d", i), r.thumbs[i].dwSize);
+template <class R, class Visit>
+  requires kIs<R, DC_NET_PHOTO_INFO>
+void Fields(R& r, Visit&& v) {
+  v("szPhotoId", r.szPhotoId);
+  v("szOwnerId", r.szOwnerId);
+  v("szTrackId", r.szTrackId);
+  v("szTrackPhotoId", r.szTrackPhotoId);
+  v("szName", r.szName);
+  v("szAuthKey", r.szAuthKey);
+  v("szType", r.szType);
+  v("szFilePath", r.szFilePath);
+  v("szTitle", r.szTitle);
+  v("szDesc", r.szDesc);
+  v("szIcon", r.szIcon);
+  v("time", r.time);
+  v("bListed", r.bListed);
+  v("nSegment", r.nSegment);
+  v("dwSize", r.dwSize);
+  v("nWidth", r.nWidth);
+  v("nHeight", r.nHeight);
+  v("nFlags", r.nFlags);
+  v("dLat", r.dLat);
+  v("dLong", r.dLong);
+  v("dAlt", r.dAlt);
+  v("thumbInfo", r.thumbInfo);
+}
+
+template <class R, class Visit>
+  requires kIs<R, DC_NET_USER_INFO>
+void Fields(R& r, Visit&& v) {
+  v("szUid", r.szUid);
+  v("szOwnerId", r.szOwnerId);
+  v("szToken", r.szToken);
+  v("szUserName", r.szUserName);
+  v("szPassword", r.szPassword);
+  v("szDisplayName", r.szDisplayName);
+}
+
+template <class R, class Visit>
+  requires kIs<R, DC_NET_FILE_INFO>
+void Fields(R& r, Visit&& v) {
+  v("sTrackId", r.sTrackId);
+  v("sName", r.sName);
+  v("sType", r.sType);
+  v("sFilePath", r.sFilePath);
+  v("nWidth", r.nWidth);
+  v("nHeight", r.nHeight);
+}
+
+template <class R, class Visit>
+  requires kIs<R, DC_NET_TAG_ITEM>
+void Fields(R& r, Visit&& v) {
+  v("sTagId", r.sTagId);
+  v("sDisplayName", r.sDisplayName);
+  v("count", r.count);
+}
+
+template <class R, class Visit>
+  requires kIs<R, DC_NET_TAG_INFO>
+void Fields(R& r, Visit&& v) {
+  v("Tag_Lang", r.Tag_Lang);
+  v(List{"Tag_Count", "lstTag_%d", r.lstTag});
+}
+
+template <class R, class Visit>
+  requires kIs<R, DC_NET_CELL_INFO>
+void Fields(R& r, Visit&& v) {
+  v(List{"CountCellInfo", "CellInfo_%d", r.CellInfo});
+  v(List{"CountGpsInfo", "GpsInfo_%d", r.GpsInfo});
+}
+
+// The photo list sits in a package of its own.
+template <class Photos>
+struct PhotoInfo {
+  Photos& photos;
+};
+template <class R, class Visit>
+  requires kIs<R, PhotoInfo<const std::vector<DC_NET_PHOTO_INFO>>> ||
+           kIs<R, PhotoInfo<std::vector<DC_NET_PHOTO_INFO>>>
+void Fields(R& r, Visit&& v) {
+  v(List{"ptrPhotoList_Count", "ptrPhotoList_%d", r.photos});
+}
+
+// The web-service and file blocks after their header.
+template <class R, class Visit>
+  requires kIs<R, CDataControlCmdBlkNet>
+void Fields(R& b, Visit&& v) {
+  v("nNetCmd", b.nNetCmd);
+  v("userinfo", b.userInfo);
+  v("trackinfo", b.trackInfo);
+  auto photos = PhotoInfo<std::remove_reference_t<decltype((b.photoInfo))>>{b.photoInfo};
+  v("photoinfo", photos);
+  v("fileinfo", b.fileInfo);
+  v("taginfo", b.tagInfo);
+  v("cellinfo", b.cellInfo);
+  v("tPointStartTime", b.tPointStartTime);
+  v("tPointEndTime", b.tPointEndTime);
+}
+
+template <class R, class Visit>
+  requires kIs<R, CDataControlCmdBlkFile>
+void Fields(R& b, Visit&& v) {
+  v("nFileCmd", b.nFileCmd);
+  v("szFilePath", b.szFilePath);
+  v("tPointStartTime", b.tPointStartTime);
+  v("tPointEndTime", b.tPointEndTime);
+  v("nTimeZone", b.nTimeZone);
+  v("trackinfo", b.trackInfo);
+}
+
+// Writes each field in its encoding; a record becomes a nested package.
+struct Packer {
+  CPackageBlk& out;
+
+  void operator()(const char* name, const CString& text) const { PutText(out, name, text); }
+  void operator()(const char* name, const COleDateTime& time) const { PutDateTime(out, name, time); }
+  void operator()(const char* name, double value) const { PutDouble(out, name, value); }
+  void operator()(const char* name, int32_t value) const { PutInt32(out, name, value); }
+  void operator()(const char* name, uint32_t value) const { PutUInt32(out, name, value); }
+  void operator()(const char* name, uint8_t flag) const { PutFlag(out, name, flag); }
+  template <class Record>
+  void operator()(const char* name, const Record& record) const {
+    CPackageBlk nested;
+    Fields(record, Packer{nested});
+    out.Add(name, nested);
   }
-}
-
-void Pack(const DC_NET_PHOTO_INFO& r, CPackageBlk& out) {
-  PutText(out, "szPhotoId", r.szPhotoId);
-  PutText(out, "szOwnerId", r.szOwnerId);
-  PutText(out, "szTrackId", r.szTrackId);
-  PutText(out, "szTrackPhotoId", r.szTrackPhotoId);
-  PutText(out, "szName", r.szName);
-  PutText(out, "szAuthKey", r.szAuthKey);
-  PutText(out, "szType", r.szType);
-  PutText(out, "szFilePath", r.szFilePath);
-  PutText(out, "szTitle", r.szTitle);
-  PutText(out, "szDesc", r.szDesc);
-  PutText(out, "szIcon", r.szIcon);
-  PutDateTime(out, "time", r.time);
-  PutFlag(out, "bListed", r.bListed);
-  PutInt32(out, "nSegment", r.nSegment);
-  PutUInt32(out, "dwSize", r.dwSize);
-  PutInt32(out, "nWidth", r.nWidth);
-  PutInt32(out, "nHeight", r.nHeight);
-  PutUInt32(out, "nFlags", r.nFlags);
-  PutDouble(out, "dLat", r.dLat);
-  PutDouble(out, "dLong", r.dLong);
-  PutDouble(out, "dAlt", r.dAlt);
-  CPackageBlk thumbs;
-  Pack(r.thumbInfo, thumbs);
-  out.Add("thumbInfo", thumbs);
-}
-
-void Unpack(const CUnpackageBlk& in, DC_NET_PHOTO_INFO& r) {
-  GetText(in, "szPhotoId", r.szPhotoId);
-  GetText(in, "szOwnerId", r.szOwnerId);
-  GetText(in, "szTrackId", r.szTrackId);
-  GetText(in, "szTrackPhotoId", r.szTrackPhotoId);
-  GetText(in, "szName", r.szName);
-  GetText(in, "szAuthKey", r.szAuthKey);
-  GetText(in, "szType", r.szType);
-  GetText(in, "szFilePath", r.szFilePath);
-  GetText(in, "szTitle", r.szTitle);
-  GetText(in, "szDesc", r.szDesc);
-  GetText(in, "szIcon", r.szIcon);
-  GetDateTime(in, "time", r.time);
-  GetFirstByte(in, "bListed", r.bListed);
-  GetInt32(in, "nSegment", r.nSegment);
-  GetUInt32(in, "dwSize", r.dwSize);
-  GetInt32(in, "nWidth", r.nWidth);
-  GetInt32(in, "nHeight", r.nHeight);
-  GetUInt32(in, "nFlags", r.nFlags);
-  GetDouble(in, "dLat", r.dLat);
-  GetDouble(in, "dLong", r.dLong);
-  GetDouble(in, "dAlt", r.dAlt);
-  CUnpackageBlk thumbs;
-  if (GetNested(in, "thumbInfo", thumbs)) Unpack(thumbs, r.thumbInfo);
-}
-
-void Pack(const DC_NET_TAG_ITEM& r, CPackageBlk& out) {
-  PutText(out, "sTagId", r.sTagId);
-  PutText(out, "sDisplayName", r.sDisplayName);
-  PutInt32(out, "count", r.count);
-}
-
-void Unpack(const CUnpackageBlk& in, DC_NET_TAG_ITEM& r) {
-  GetText(in, "sTagId", r.sTagId);
-  GetText(in, "sDisplayName", r.sDisplayName);
-  GetInt32(in, "count", r.count);
-}
-
-void PackNested(const char* name, const DC_NET_POINT_INFO& r, CPackageBlk& out) {
-  CPackageBlk nested;
-  Pack(r, nested);
-  out.Add(name, nested);
-}
-
-void UnpackNested(const CUnpackageBlk& in, const char* name, DC_NET_POINT_INFO& r) {
-  CUnpackageBlk nested;
-  if (GetNested(in, name, nested)) Unpack(nested, r);
-}
-
-// A list: its count under `countName`, then entry i under `entryFormat` with i from 0, each a
-// nested package (or, for texts, the text itself).
-template <class T>
-void PackList(const std::vector<T>& list, const char* countName, const char* entryFormat,
-              CPackageBlk& out) {
-  PutInt32(out, countName, static_cast<int32_t>(list.size()));
-  for (size_t i = 0; i < list.size(); ++i) {
-    if constexpr (std::is_same_v<T, CString>) {
-      PutText(out, NumberedName(entryFormat, static_cast<int>(i)), list[i]);
-    } else {
-      CPackageBlk entry;
-      Pack(list[i], entry);
-      out.Add(NumberedName(entryFormat, static_cast<int>(i)), entry);
-    }
+  template <class V>
+  void operator()(const List<V>& list) const {
+    PutInt32(out, list.count, static_cast<int32_t>(list.items.size()));
+    for (size_t i = 0; i < list.items.size(); ++i)
+      (*this)(NumberedName(list.entry, static_cast<int>(i)), list.items[i]);
   }
-}
+};
 
-// Reads a list. The count is believed only as far as the package holds entries (a count of a
-// billion in a small package costs nothing); a missing or malformed entry keeps its place as an
-// empty record, so later entries keep their positions.
-template <class T>
-void UnpackList(const CUnpackageBlk& in, const char* countName, const char* entryFormat,
-                std::vector<T>& list) {
-  int32_t count = 0;
-  if (!GetInt32(in, countName, count) || count <= 0) return;
-  const uint32_t n = std::min<uint32_t>(static_cast<uint32_t>(count), in.GetCount());
-  list.assign(n, T{});
-  for (uint32_t i = 0; i < n; ++i) {
-    const NumberedName name(entryFormat, static_cast<int>(i));
-    if constexpr (std::is_same_v<T, CString>) {
-      GetText(in, name, list[i]);
-    } else {
-      CUnpackageBlk entry;
-      if (GetNested(in, name, entry)) Unpack(entry, list[i]);
-    }
+// Reads each field that is present; a record from its nested package.
+struct Unpacker {
+  const CUnpackageBlk& in;
+
+  void operator()(const char* name, CString& text) const { GetText(in, name, text); }
+  void operator()(const char* name, COleDateTime& time) const { GetDateTime(in, name, time); }
+  void operator()(const char* name, double& value) const { GetDouble(in, name, value); }
+  void operator()(const char* name, int32_t& value) const { GetInt32(in, name, value); }
+  void operator()(const char* name, uint32_t& value) const { GetUInt32(in, name, value); }
+  void operator()(const char* name, uint8_t& flag) const { GetFirstByte(in, name, flag); }
+  template <class Record>
+  void operator()(const char* name, Record& record) const {
+    CUnpackageBlk nested;
+    if (GetNested(in, name, nested)) Fields(record, Unpacker{nested});
   }
-}
-
-void Pack(const DC_NET_TRACK_INFO& r, CPackageBlk& out) {
-  PutText(out, "szTrackId", r.szTrackId);
-  PutText(out, "szOwnerId", r.szOwnerId);
-  PutText(out, "szSubject", r.szSubject);
-  PutText(out, "szAuthKey", r.szAuthKey);
-  PutText(out, "szTag", r.szTag);
-  PutText(out, "szURL", r.szURL);
-  PutFlag(out, "bListed", r.bListed);
-  PutInt32(out, "nMode", r.nMode);
-  PutInt32(out, "lTimeZone", r.lTimeZone);
-  PutInt32(out, "nStyle", r.nStyle);
-  PutInt32(out, "nPageId", r.nPageId);
-  PutDateTime(out, "tUploadTime", r.tUploadTime);
-  PackList(r.ptrPtList, "ptrPtList_Count", "ptrPtList_%d", out);
-  PackList(r.ptrPOIList, "ptrPOIList_Count", "ptrPOIList_%d", out);
-  PutText(out, "szMetaInfo", r.szMetaInfo);
-  PutText(out, "szDesc", r.szDesc);
-  PutText(out, "szModelId", r.szModelId);
-  PutText(out, "szLang", r.szLang);
-  PutText(out, "szTrackData", r.szTrackData);
-  PutText(out, "szTimeZone", r.szTimeZone);
-  PackNested("ptStart", r.ptStart, out);
-  PackNested("ptEnd", r.ptEnd, out);
-  PutInt32(out, "nCoverId", r.nCoverId);
-}
-
-void Unpack(const CUnpackageBlk& in, DC_NET_TRACK_INFO& r) {
-  GetText(in, "szTrackId", r.szTrackId);
-  GetText(in, "szOwnerId", r.szOwnerId);
-  GetText(in, "szSubject", r.szSubject);
-  GetText(in, "szAuthKey", r.szAuthKey);
-  GetText(in, "szTag", r.szTag);
-  GetText(in, "szURL", r.szURL);
-  GetFirstByte(in, "bListed", r.bListed);
-  GetInt32(in, "nMode", r.nMode);
-  GetInt32(in, "lTimeZone", r.lTimeZone);
-  GetInt32(in, "nStyle", r.nStyle);
-  GetInt32(in, "nPageId", r.nPageId);
-  GetDateTime(in, "tUploadTime", r.tUploadTime);
-  UnpackList(in, "ptrPtList_Count", "ptrPtList_%d", r.ptrPtList);
-  UnpackList(in, "ptrPOIList_Count", "ptrPOIList_%d", r.ptrPOIList);
-  GetText(in, "szMetaInfo", r.szMetaInfo);
-  GetText(in, "szDesc", r.szDesc);
-  GetText(in, "szModelId", r.szModelId);
-  GetText(in, "szLang", r.szLang);
-  GetText(in, "szTrackData", r.szTrackData);
-  GetText(in, "szTimeZone", r.szTimeZone);
-  UnpackNested(in, "ptStart", r.ptStart);
-  UnpackNested(in, "ptEnd", r.ptEnd);
-  GetInt32(in, "nCoverId", r.nCoverId);
-}
-
-void PackTrack(const DC_NET_TRACK_INFO& track, CPackageBlk& out) {
-  CPackageBlk nested;
-  Pack(track, nested);
-  out.Add("trackinfo", nested);
-}
-
-void UnpackTrack(const CUnpackageBlk& in, DC_NET_TRACK_INFO& track) {
-  CUnpackageBlk nested;
-  if (GetNested(in, "trackinfo", nested)) Unpack(nested, track);
-}
+  // The count is believed only as far as the package holds entries (a count of a billion in a
+  // small package costs nothing); a missing or malformed entry keeps its place as an empty
+  // record, so later entries keep their positions.
+  template <class V>
+  void operator()(const List<V>& list) const {
+    int32_t count = 0;
+    if (!GetInt32(in, list.count, count) || count <= 0) return;
+    const uint32_t n = std::min<uint32_t>(static_cast<uint32_t>(count), in.GetCount());
+    list.items.assign(n, typename V::value_type{});
+    for (uint32_t i = 0; i < n; ++i) (*this)(NumberedName(list.entry, static_cast<int>(i)), list.items[i]);
+  }
+};
 
 }  // namespace
 
 void PackBlock(const CDataControlCmdBlkNet& b, CPackageBlk& out) {
   PackBlock(static_cast<const CDataControlCmdBlk&>(b), out);
-  PutInt32(out, "nNetCmd", b.nNetCmd);
-
-  CPackageBlk user;
-  PutText(user, "szUid", b.userInfo.szUid);
-  PutText(user, "szOwnerId", b.userInfo.szOwnerId);
-  PutText(user, "szToken", b.userInfo.szToken);
-  PutText(user, "szUserName", b.userInfo.szUserName);
-  PutText(user, "szPassword", b.userInfo.szPassword);
-  PutText(user, "szDisplayName", b.userInfo.szDisplayName);
-  out.Add("userinfo", user);
-
-  PackTrack(b.trackInfo, out);
-
-  CPackageBlk photos;
-  PackList(b.photoInfo, "ptrPhotoList_Count", "ptrPhotoList_%d", photos);
-  out.Add("photoinfo", photos);
-
-  CPackageBlk file;
-  PutText(file, "sTrackId", b.fileInfo.sTrackId);
-  PutText(file, "sName", b.fileInfo.sName);
-  PutText(file, "sType", b.fileInfo.sType);
-  PutText(file, "sFilePath", b.fileInfo.sFilePath);
-  PutInt32(file, "nWidth", b.fileInfo.nWidth);
-  PutInt32(file, "nHeight", b.fileInfo.nHeight);
-  out.Add("fileinfo", file);
-
-  CPackageBlk tags;
-  PutText(tags, "Tag_Lang", b.tagInfo.Tag_Lang);
-  PackList(b.tagInfo.lstTag, "Tag_Count", "lstTag_%d", tags);
-  out.Add("taginfo", tags);
-
-  CPackageBlk cells;
-  PackList(b.cellInfo.CellInfo, "CountCellInfo", "CellInfo_%d", cells);
-  PackList(b.cellInfo.GpsInfo, "CountGpsInfo", "GpsInfo_%d", cells);
-  out.Add("cellinfo", cells);
-
-  PutDateTime(out, "tPointStartTime", b.tPointStartTime);
-  PutDateTime(out, "tPointEndTime", b.tPointEndTime);
+  Fields(b, Packer{out});
 }
 
 void UnpackBlock(const CUnpackageBlk& in, CDataControlCmdBlkNet& b) {
   UnpackHeader(in, b);
-  GetInt32(in, "nNetCmd", b.nNetCmd);
-  CUnpackageBlk nested;
-  if (GetNested(in, "userinfo", nested)) {
-    GetText(nested, "szUid", b.userInfo.szUid);
-    GetText(nested, "szOwnerId", b.userInfo.szOwnerId);
-    GetText(nested, "szToken", b.userInfo.szToken);
-    GetText(nested, "szUserName", b.userInfo.szUserName);
-    GetText(nested, "szPassword", b.userInfo.szPassword);
-    GetText(nested, "szDisplayName", b.userInfo.szDisplayName);
-  }
-  UnpackTrack(in, b.trackInfo);
-  if (GetNested(in, "photoinfo", nested))
-    UnpackList(nested, "ptrPhotoList_Count", "ptrPhotoList_%d", b.photoInfo);
-  if (GetNested(in, "fileinfo", nested)) {
-    GetText(nested, "sTrackId", b.fileInfo.sTrackId);
-    GetText(nested, "sName", b.fileInfo.sName);
-    GetText(nested, "sType", b.fileInfo.sType);
-    GetText(nested, "sFilePath", b.fileInfo.sFilePath);
-    GetInt32(nested, "nWidth", b.fileInfo.nWidth);
-    GetInt32(nested, "nHeight", b.fileInfo.nHeight);
-  }
-  if (GetNested(in, "taginfo", nested)) {
-    GetText(nested, "Tag_Lang", b.tagInfo.Tag_Lang);
-    UnpackList(nested, "Tag_Count", "lstTag_%d", b.tagInfo.lstTag);
-  }
-  if (GetNested(in, "cellinfo", nested)) {
-    UnpackList(nested, "CountCellInfo", "CellInfo_%d", b.cellInfo.CellInfo);
-    UnpackList(nested, "CountGpsInfo", "GpsInfo_%d", b.cellInfo.GpsInfo);
-  }
-  GetDateTime(in, "tPointStartTime", b.tPointStartTime);
-  GetDateTime(in, "tPointEndTime", b.tPointEndTime);
+  Fields(b, Unpacker{in});
 }
 
 void PackBlock(const CDataControlCmdBlkFile& b, CPackageBlk& out) {
   PackBlock(static_cast<const CDataControlCmdBlk&>(b), out);
-  PutInt32(out, "nFileCmd", b.nFileCmd);
-  PutText(out, "szFilePath", b.szFilePath);
-  PutDateTime(out, "tPointStartTime", b.tPointStartTime);
-  PutDateTime(out, "tPointEndTime", b.tPointEndTime);
-  PutInt32(out, "nTimeZone", b.nTimeZone);
-  PackTrack(b.trackInfo, out);
+  Fields(b, Packer{out});
 }
 
 void UnpackBlock(const CUnpackageBlk& in, CDataControlCmdBlkFile& b) {
   UnpackHeader(in, b);
-  GetInt32(in, "nFileCmd", b.nFileCmd);
-  GetText(in, "szFilePath", b.szFilePath);
-  GetDateTime(in, "tPointStartTime", b.tPointStartTime);
-  GetDateTime(in, "tPointEndTime", b.tPointEndTime);
-  GetInt32(in, "nTimeZone", b.nTimeZone);
-  UnpackTrack(in, b.trackInfo);
+  Fields(b, Unpacker{in});
 }
 
 }  // namespace navmisc::datactrl

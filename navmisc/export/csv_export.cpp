@@ -1,5 +1,6 @@
 #include "navmisc/export/csv_export.h"
 
+#include <optional>
 #include <unordered_set>
 #include <vector>
 
@@ -17,6 +18,8 @@ namespace {
 using navmisc::AppendFixed;
 using navmisc::AppendInt;
 using navmisc::exportdetail::DocumentWriter;
+using navmisc::exportdetail::ForEachPoint;
+using navmisc::exportdetail::PointCount;
 using navmisc::exportdetail::Progress;
 
 // Spreadsheets of the time held 65536 rows: one header and 65534 points leave room to spare.
@@ -63,22 +66,35 @@ class CsvWriter {
   }
 
   bool Open(const CString& path, std::string_view header) {
-    writer_.Close();
-    if (!writer_.Open(path)) return false;
+    Close();
+    if (!writer_.Open(path)) {
+      if (error_.empty()) error_ = writer_.error();
+      return false;
+    }
     written_.push_back(path);
     writer_.text() += header;
     return true;
   }
-  void Close() { writer_.Close(); }
+  void Close() {
+    writer_.Close();
+    if (error_.empty()) error_ = writer_.error();
+  }
+  // The first failure of any file: opening, writing or closing it.
+  const std::string& error() const { return error_; }
   // Deletes every file written so far.
   void RemoveAll() {
     writer_.Remove();
     for (const CString& file : written_) DeleteFileRetry(file);
   }
 
+  // Where the track's previous written point lies.
+  struct Previous {
+    double latitude, longitude;
+  };
+
   // `first` and `last` tell the point's place in its track's list; `prev` is the track's
-  // previous written point, or null.
-  void WriteLine(const WAYPOINT_ITEM_INFO& p, const WAYPOINT_ITEM_INFO* prev, bool first, bool last) {
+  // previous written point, if any.
+  void WriteLine(const WAYPOINT_ITEM_INFO& p, const std::optional<Previous>& prev, bool first, bool last) {
     std::string& out = writer_.text();
     int year, month, day, hour, minute, second;
     GetDateTimeInfo(static_cast<long>(p.time) + shift_, year, month, day, hour, minute, second);
@@ -134,6 +150,7 @@ class CsvWriter {
   CGPSHelper helper_;
   DocumentWriter writer_;
   std::vector<CString> written_;
+  std::string error_;
 };
 
 }  // namespace
@@ -143,48 +160,60 @@ CString CsvSplitFileName(const wchar_t* path, int number) {
 }
 
 int ExportCsv(CString path, CPtrList& tracks, CPtrList& photos, BLOG_ITEM_INFO* trip, bool metric) {
-  return ExportCsv(path, tracks, photos, trip, metric, nullptr, nullptr);
+  ExportControl control;
+  return ExportCsv(path, tracks, photos, trip, metric, control);
 }
 
 int ExportCsv(CString path, CPtrList& tracks, CPtrList& photos, BLOG_ITEM_INFO* trip, bool metric,
-              int* counter, bool* keepGoing) {
+              ExportControl& control) {
+  control.error.clear();
+  const bool fromFile = control.pointsFromFiles;
   ClearTargetFile(path);
   long long total = 0;
   for (const TRACK_ITEM_INFO* track : navmisc::Items<TRACK_ITEM_INFO>(tracks)) {
-    if (track) total += track->points.GetCount();
+    if (track) total += PointCount(*track, fromFile);
   }
   const bool split = total >= kPointsPerFile;
   int number = 1;
 
-  Progress progress{counter, keepGoing};
+  Progress progress{control.counter, control.keepGoing};
   CsvWriter csv(photos, trip, metric);
-  if (!csv.Open(split ? CsvSplitFileName(path, number) : path, kFirstHeader)) return 0;
+  if (!csv.Open(split ? CsvSplitFileName(path, number) : path, kFirstHeader)) {
+    control.error = csv.error();
+    return 0;
+  }
   int lines = 0;
+  bool stopped = false;
   for (const TRACK_ITEM_INFO* track : navmisc::Items<TRACK_ITEM_INFO>(tracks)) {
     if (!track) continue;
-    const int count = track->points.GetCount();
-    int index = 0;
-    const WAYPOINT_ITEM_INFO* prev = nullptr;
-    for (const WAYPOINT_ITEM_INFO* p : navmisc::Items<WAYPOINT_ITEM_INFO>(track->points)) {
+    const long long count = PointCount(*track, fromFile);
+    long long index = 0;
+    std::optional<CsvWriter::Previous> prev;
+    const bool finished = ForEachPoint(*track, fromFile, [&](const WAYPOINT_ITEM_INFO* p) {
       if (p && p->time != -1) {
         // A point that is both first and last is typed as first.
         csv.WriteLine(*p, prev, index == 0, index == count - 1);
-        prev = p;
+        prev = CsvWriter::Previous{p->latitude, p->longitude};
       }
       ++index;
       // Points without a time take their place in the file's count all the same.
       if (++lines == kPointsPerFile) {
         csv.Close();
         ++number;
-        if (!csv.Open(CsvSplitFileName(path, number), kContinuationHeader)) return 0;
+        if (!csv.Open(CsvSplitFileName(path, number), kContinuationHeader)) return false;
         lines = 0;
       }
-      if (!progress.Step()) {
-        csv.RemoveAll();
-        return 0;
-      }
+      if (progress.Step()) return true;
+      csv.RemoveAll();
+      stopped = true;
+      return false;
+    });
+    if (!finished) {
+      control.error = stopped ? "stopped" : csv.error();
+      return 0;
     }
   }
   csv.Close();
+  control.error = csv.error();
   return 1;
 }

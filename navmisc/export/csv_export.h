@@ -1,6 +1,7 @@
 // CSV export of track points, one point a line, for spreadsheets.
 #pragma once
 
+#include "navmisc/export/export_control.h"
 #include "navmisc/platform/cstring.h"
 #include "navmisc/platform/lists.h"
 
@@ -26,15 +27,16 @@ class BLOG_ITEM_INFO;
 // later files begin with a header ending in "Exception" instead of "Essential". A total of
 // exactly 65534 therefore gives a second file holding only that header.
 //
-// Returns 1 when written, 0 when a file cannot be opened.
+// Returns 1 when written, 0 when a file cannot be opened. Write errors after opening do not
+// change the result.
 int ExportCsv(CString path, CPtrList& tracks, CPtrList& photos, BLOG_ITEM_INFO* trip, bool metric);
 
 // The name of numbered file `number` (from 1) of a split export to `path`:
 // "<folder>/<title>_<number>.csv".
 CString CsvSplitFileName(const wchar_t* path, int number);
 
-// The same with progress: `*counter` (may be null) goes up by one per track point. When
-// `*keepGoing` (may be null) turns false the export stops, deletes the files it wrote and
-// returns 0.
+// The same under `control`: progress (one step per track point), stopping (the files written
+// so far are deleted), points read from the point files, and the reason when a file could not be
+// opened or a write failed (a write error leaves the result at 1).
 int ExportCsv(CString path, CPtrList& tracks, CPtrList& photos, BLOG_ITEM_INFO* trip, bool metric,
-              int* counter, bool* keepGoing);
+              ExportControl& control);

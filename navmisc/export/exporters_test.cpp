@@ -15,8 +15,8 @@
 #include "navmisc/export/gpx_export.h"
 #include "navmisc/export/kml_export.h"
 #include "navmisc/export/tcx_export.h"
+#include "navmisc/platform/atomic_file.h"
 #include "navmisc/platform/format.h"
-#include "navmisc/platform/output_file.h"
 #include "navmisc/records/trip.h"
 #include "testutil.h"
 
@@ -32,7 +32,7 @@ using Points = std::vector<std::string>;
 struct Exporter {
   const wchar_t* extension;
   int steps;  // what a full export counts: track points, and item entries where items are written
-  std::function<int(const CString& path, int* counter, bool* keepGoing)> run;
+  std::function<int(const CString& path, ExportControl& control)> run;
 };
 
 // A trip folder with two photos and one track (one of its points without a time), all inside
@@ -80,11 +80,11 @@ struct Fixture {
     lap->calories = 320;  // the schema requires calories
     lap->tracks.AddTail(track.get());
     exporters = {
-        {L"gpx", 6, [this](const CString& p, int* c, bool* k) { return ExportGpx(p, tracks, items, c, k); }},
-        {L"kml", 6, [this](const CString& p, int* c, bool* k) { return ExportKml(p, tracks, items, 0, c, k); }},
-        {L"kmz", 6, [this](const CString& p, int* c, bool* k) { return ExportKmz(p, tracks, items, nullptr, c, k); }},
-        {L"tcx", 4, [this](const CString& p, int* c, bool* k) { return ExportTcx(p, activity, c, k); }},
-        {L"csv", 4, [this](const CString& p, int* c, bool* k) { return ExportCsv(p, tracks, items, &trip, true, c, k); }},
+        {L"gpx", 6, [this](const CString& p, ExportControl& c) { return ExportGpx(p, tracks, items, c); }},
+        {L"kml", 6, [this](const CString& p, ExportControl& c) { return ExportKml(p, tracks, items, 0, c); }},
+        {L"kmz", 6, [this](const CString& p, ExportControl& c) { return ExportKmz(p, tracks, items, nullptr, c); }},
+        {L"tcx", 4, [this](const CString& p, ExportControl& c) { return ExportTcx(p, activity, c); }},
+        {L"csv", 4, [this](const CString& p, ExportControl& c) { return ExportCsv(p, tracks, items, &trip, true, c); }},
     };
   }
   std::string Path(const wchar_t* name) const { return ShellQuote((root / name).ToUtf8()); }
@@ -99,14 +99,20 @@ TEST(Exporters, CountProgressReplaceTargetsAndAStoppedExportLeavesNothing) {
     ASSERT_EQ(::chmod(navmisc::NativePath(path).c_str(), 0444), 0);
     int counter = 0;
     bool keepGoing = true;
-    EXPECT_EQ(e.run(path, &counter, &keepGoing), 1) << e.extension;
+    ExportControl control;
+    control.counter = &counter;
+    control.keepGoing = &keepGoing;
+    control.error = "left over";
+    EXPECT_EQ(e.run(path, control), 1) << e.extension;
     EXPECT_EQ(counter, e.steps) << e.extension;
+    EXPECT_EQ(control.error, "") << e.extension;
     EXPECT_EQ(ReadFileBytes(path).find("xxxx"), std::string::npos) << e.extension;
     // The flag is read after every step: cleared from the start, the export stops after one.
     keepGoing = false;
     counter = 0;
-    EXPECT_EQ(e.run(path, &counter, &keepGoing), 0) << e.extension;
+    EXPECT_EQ(e.run(path, control), 0) << e.extension;
     EXPECT_EQ(counter, 1) << e.extension;
+    EXPECT_EQ(control.error, "stopped") << e.extension;
     EXPECT_FALSE(FileExists(path)) << e.extension;
   }
 }
@@ -122,12 +128,87 @@ TEST(Exporters, UnwritableTargetsGiveZeroAndAReason) {
                  {f.root.path(), "Is a directory"}};
   for (const Exporter& e : f.exporters) {
     for (const auto& t : targets) {
-      EXPECT_EQ(e.run(t.target, nullptr, nullptr), 0) << e.extension << " " << t.target.ToUtf8();
-      EXPECT_EQ(navmisc::LastOpenError(), t.why) << e.extension << " " << t.target.ToUtf8();
+      ExportControl control;
+      EXPECT_EQ(e.run(t.target, control), 0) << e.extension << " " << t.target.ToUtf8();
+      EXPECT_EQ(control.error, t.why) << e.extension << " " << t.target.ToUtf8();
     }
   }
   EXPECT_EQ(ReadFileBytes(f.root / L"file"), "x");
   EXPECT_FALSE(FileExists(f.root / L"missing"));
+}
+
+TEST(Exporters, AFullDiskIsReportedThoughTheResultStaysOne) {
+  Fixture f;
+  for (const Exporter& e : f.exporters) {
+    for (long long budget : {0LL, 100LL}) {
+      const CString path = f.root / (CString(L"full.") + e.extension);
+      ExportControl control;
+      navmisc::testing::FailAtomicWritesAfter(budget);
+      const int result = e.run(path, control);
+      navmisc::testing::FailAtomicWritesAfter(-1);
+      // A KMZ packs the written document into an archive: a short document is noticed there
+      // too, and an archive that cannot be finished fails the call.
+      if (std::wstring(e.extension) != L"kmz") {
+        EXPECT_EQ(result, 1) << e.extension << " " << budget;
+      }
+      EXPECT_EQ(control.error, "No space left on device") << e.extension << " " << budget;
+    }
+  }
+}
+
+TEST(Exporters, PointsReadFromTheFilesGiveTheDocumentOfTheLoadedPoints) {
+  Fixture f;
+  // The fixture's track, a one-point track (loaded as two) and an empty one, saved with the trip;
+  // the streamed export gets copies that know only the tracks' ids.
+  CPtrList saved, unloaded;
+  std::vector<std::unique_ptr<TRACK_ITEM_INFO>> owned;
+  const std::vector<std::vector<Pt>> shapes = {
+      {{47.376887, 8.541694, 408.5, 1714543200, 5400, 90, 3},
+       {1, 1, 1, -1},
+       {47.3770015, 8.5421234, 409.25, 1714543210, 7200, -1, -2}},
+      {{-33.856784, -70.250001, -2.5, 1714550400, 3600}},
+      {}};
+  for (const auto& shape : shapes) {
+    auto loaded = MakeTrack(L"T & <b>", shape);
+    loaded->trip = &f.trip;
+    loaded->WriteAllWaypoint(1, nullptr, nullptr);
+    loaded->ReadAllWaypoint(1);  // as a loaded trip holds it: a lone point has its copy
+    auto bare = std::make_unique<TRACK_ITEM_INFO>(&f.trip);
+    bare->id = loaded->id;
+    bare->description = loaded->description;
+    saved.AddTail(loaded.get());
+    unloaded.AddTail(bare.get());
+    owned.push_back(std::move(loaded));
+    owned.push_back(std::move(bare));
+  }
+  const struct {
+    const wchar_t* extension;
+    std::function<int(CPtrList& tracks, const CString& path, ExportControl& control)> run;
+  } exporters[] = {
+      {L"gpx", [&](CPtrList& t, const CString& p, ExportControl& c) { return ExportGpx(p, t, f.items, c); }},
+      {L"kml", [&](CPtrList& t, const CString& p, ExportControl& c) { return ExportKml(p, t, f.items, 0, c); }},
+      {L"csv", [&](CPtrList& t, const CString& p, ExportControl& c) { return ExportCsv(p, t, f.items, &f.trip, false, c); }},
+  };
+  for (const auto& e : exporters) {
+    const CString expected = f.root / (CString(L"loaded.") + e.extension);
+    const CString streamed = f.root / (CString(L"streamed.") + e.extension);
+    int loadedSteps = 0, streamedSteps = 0;
+    ExportControl plain, fromFiles;
+    plain.counter = &loadedSteps;
+    fromFiles.counter = &streamedSteps;
+    fromFiles.pointsFromFiles = true;
+    ASSERT_EQ(e.run(saved, expected, plain), 1) << e.extension;
+    ASSERT_EQ(e.run(unloaded, streamed, fromFiles), 1) << e.extension << " " << fromFiles.error;
+    EXPECT_EQ(MaskKmlDate(ReadFileBytes(streamed)), MaskKmlDate(ReadFileBytes(expected))) << e.extension;
+    EXPECT_EQ(streamedSteps, loadedSteps) << e.extension;
+  }
+  for (auto* t : navmisc::Items<TRACK_ITEM_INFO>(unloaded)) EXPECT_TRUE(t->points.IsEmpty());
+  // The TCX laps need the loaded points' working values.
+  ExportControl fromFiles;
+  fromFiles.pointsFromFiles = true;
+  EXPECT_EQ(ExportTcx(f.root / L"streamed.tcx", f.activity, fromFiles), 0);
+  EXPECT_EQ(fromFiles.error, "a TCX export needs the points loaded");
+  EXPECT_FALSE(FileExists(f.root / L"streamed.tcx"));
 }
 
 // "lat,lon" of every row of a gpsbabel unicsv listing (whose first columns are No, Latitude,

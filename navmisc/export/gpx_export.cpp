@@ -1,5 +1,8 @@
 #include "navmisc/export/gpx_export.h"
 
+#include <algorithm>
+#include <string_view>
+
 #include "navmisc/export/detail/export_common.h"
 #include "navmisc/platform/format.h"
 #include "navmisc/records/photo.h"
@@ -8,6 +11,7 @@
 namespace {
 
 using navmisc::AppendFixed;
+using navmisc::WriteFixed;
 using navmisc::exportdetail::DocumentWriter;
 using navmisc::exportdetail::Progress;
 using navmisc::exportdetail::TimeTextZWriter;
@@ -43,30 +47,36 @@ void WriteWaypoint(std::string& out, const PHOTO_ITEM_INFO& item, TimeTextZWrite
 }
 
 // False when the caller stopped the export.
-bool WriteTrack(DocumentWriter& w, const TRACK_ITEM_INFO& track, TimeTextZWriter& times,
+bool WriteTrack(DocumentWriter& w, const TRACK_ITEM_INFO& track, bool fromFile, TimeTextZWriter& times,
                 Progress& progress) {
   std::string& out = w.text();
   out += "\r\n<trk>\r\n<name>";
   out += Utf8Field(track.GetName().view(), kTextBuffer);
   // The document's colour is the same for every track, whatever its colour in the trip.
   out += "</name>\r\n<desc>Color:004000ff</desc>\r\n<trkseg>";
-  for (const WAYPOINT_ITEM_INFO* p : navmisc::Items<WAYPOINT_ITEM_INFO>(track.points)) {
+  const bool finished = navmisc::exportdetail::ForEachPoint(track, fromFile, [&](const WAYPOINT_ITEM_INFO* p) {
     if (p && p->time != -1) {
-      out += "\r\n<trkpt lat=\"";
-      AppendFixed(out, p->latitude, 6);
-      out += "\" lon=\"";
-      AppendFixed(out, p->longitude, 6);
-      out += "\">\r\n<ele>";
-      AppendFixed(out, p->altitude, 6);
-      out += "</ele>\r\n<time>";
-      times.Append(out, p->time);
-      out += "</time>\r\n<speed>";
-      AppendFixed(out, p->speed * kMetresPerHourToMetresPerSecond, 2);
-      out += "</speed>\r\n</trkpt>";
+      // The hot path of a long track: the element is built in place, then appended once.
+      char element[128 + 4 * 340];
+      char* at = element;
+      const auto put = [&at](std::string_view text) { at = std::copy(text.begin(), text.end(), at); };
+      put("\r\n<trkpt lat=\"");
+      at = WriteFixed(at, p->latitude, 6);
+      put("\" lon=\"");
+      at = WriteFixed(at, p->longitude, 6);
+      put("\">\r\n<ele>");
+      at = WriteFixed(at, p->altitude, 6);
+      put("</ele>\r\n<time>");
+      at = times.Write(at, p->time);
+      put("</time>\r\n<speed>");
+      at = WriteFixed(at, p->speed * kMetresPerHourToMetresPerSecond, 2);
+      put("</speed>\r\n</trkpt>");
+      out.append(element, static_cast<size_t>(at - element));
       w.MaybeFlush();
     }
-    if (!progress.Step()) return false;
-  }
+    return progress.Step();
+  });
+  if (!finished) return false;
   out += "\r\n</trkseg>\r\n</trk>";
   return true;
 }
@@ -74,13 +84,18 @@ bool WriteTrack(DocumentWriter& w, const TRACK_ITEM_INFO& track, TimeTextZWriter
 }  // namespace
 
 int ExportGpx(CString path, CPtrList& tracks, CPtrList& items) {
-  return ExportGpx(path, tracks, items, nullptr, nullptr);
+  ExportControl control;
+  return ExportGpx(path, tracks, items, control);
 }
 
-int ExportGpx(CString path, CPtrList& tracks, CPtrList& items, int* counter, bool* keepGoing) {
+int ExportGpx(CString path, CPtrList& tracks, CPtrList& items, ExportControl& control) {
+  control.error.clear();
   DocumentWriter w;
-  if (!w.Open(path)) return 0;
-  Progress progress{counter, keepGoing};
+  if (!w.Open(path)) {
+    control.error = w.error();
+    return 0;
+  }
+  Progress progress{control.counter, control.keepGoing};
   TimeTextZWriter times;
   std::string& out = w.text();
   out += "<?xml version=\"1.0\" encoding=\"UTF-8\" standalone=\"yes\" ?>\r\n<gpx creator=\"Corvane ";
@@ -93,18 +108,15 @@ int ExportGpx(CString path, CPtrList& tracks, CPtrList& items, int* counter, boo
   for (const PHOTO_ITEM_INFO* item : navmisc::Items<PHOTO_ITEM_INFO>(items)) {
     if (item) WriteWaypoint(out, *item, times);
     w.MaybeFlush();
-    if (!progress.Step()) {
-      w.Remove();
-      return 0;
-    }
+    if (!progress.Step()) return navmisc::exportdetail::Stopped(w, control);
   }
   for (const TRACK_ITEM_INFO* track : navmisc::Items<TRACK_ITEM_INFO>(tracks)) {
-    if (track && !WriteTrack(w, *track, times, progress)) {
-      w.Remove();
-      return 0;
+    if (track && !WriteTrack(w, *track, control.pointsFromFiles, times, progress)) {
+      return navmisc::exportdetail::Stopped(w, control);
     }
   }
   out += "\r\n</gpx>";
   w.Close();
+  control.error = w.error();
   return 1;
 }

@@ -1,6 +1,7 @@
 // GPX 1.0 export of tracks and located items (photos, markers).
 #pragma once
 
+#include "navmisc/export/export_control.h"
 #include "navmisc/platform/cstring.h"
 #include "navmisc/platform/lists.h"
 
@@ -14,12 +15,10 @@
 // document ill-formed; a description's CR LF pairs become "&#13;". Texts are UTF-8, cut at a
 // whole character to at most 2047 bytes.
 //
-// Returns 1 when the document was written, 0 when the target could not be opened for writing
-// (LastOpenError() in platform/output_file.h says why). Write errors after opening are not
-// detected.
+// Returns 1 when the document was written, 0 when the target could not be opened for writing.
+// Write errors after opening do not change the result.
 int ExportGpx(CString path, CPtrList& tracks, CPtrList& items);
 
-// The same with progress: `*counter` (may be null) goes up by one per item and per track point
-// (written or not). When `*keepGoing` (may be null) turns false the export stops, deletes what
-// it wrote and returns 0.
-int ExportGpx(CString path, CPtrList& tracks, CPtrList& items, int* counter, bool* keepGoing);
+// The same under `control` (progress, stopping, points read from the point files), which also
+// receives the reason when the target could not be opened or a write failed.
+int ExportGpx(CString path, CPtrList& tracks, CPtrList& items, ExportControl& control);

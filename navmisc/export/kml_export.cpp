@@ -82,8 +82,12 @@ struct PackEntry {
 // Writes one document; lives for one export call.
 class KmlWriter {
  public:
-  KmlWriter(CPtrList& tracks, CPtrList& items, int photoSourceMode, Progress progress)
-      : tracks_(tracks), items_(items), photoSourceMode_(photoSourceMode), progress_(progress) {}
+  KmlWriter(CPtrList& tracks, CPtrList& items, int photoSourceMode, ExportControl& control)
+      : tracks_(tracks),
+        items_(items),
+        photoSourceMode_(photoSourceMode),
+        control_(control),
+        progress_{control.counter, control.keepGoing} {}
 
   // Photos are then copied into `scratchFolder` and referred to by their bare copy names.
   void SetKmz(const CString& scratchFolder) {
@@ -95,11 +99,18 @@ class KmlWriter {
   bool stopped() const { return stopped_; }
 
   // False when the target cannot be opened or the caller stopped the export (nothing is left at
-  // the target then).
+  // the target then). The control's error tells why, and any write error.
   bool Write(const CString& path) {
-    if (path.IsEmpty()) return false;
+    control_.error.clear();
+    if (path.IsEmpty()) {
+      control_.error = "no target path";
+      return false;
+    }
     DocumentWriter w;
-    if (!w.Open(path)) return false;
+    if (!w.Open(path)) {
+      control_.error = w.error();
+      return false;
+    }
     std::string& out = w.text();
     out += "<?xml version=\"1.0\" encoding=\"UTF-8\"?><kml xmlns=\"http://earth.google.com/kml/2.1\">"
            "<Folder><name>";
@@ -115,12 +126,13 @@ class KmlWriter {
     }
     out += "</Folder></kml>";
     w.Close();
+    control_.error = w.error();
     return true;
   }
 
  private:
   bool Stop(DocumentWriter& w) {
-    w.Remove();
+    Stopped(w, control_);
     stopped_ = true;
     return false;
   }
@@ -137,7 +149,7 @@ class KmlWriter {
     out += kStyleUrl;
     out += "</styleUrl><Style><LineStyle id=\"khLineStyle989\"><color>7f8000ff</color><width>4</width>"
            "</LineStyle></Style><LineString><tessellate>1</tessellate><coordinates>\r\n";
-    for (const WAYPOINT_ITEM_INFO* p : navmisc::Items<WAYPOINT_ITEM_INFO>(track.points)) {
+    const bool finished = ForEachPoint(track, control_.pointsFromFiles, [&](const WAYPOINT_ITEM_INFO* p) {
       if (p && p->time != -1) {
         AppendFixed(out, p->longitude, 6);
         out += ',';
@@ -145,8 +157,9 @@ class KmlWriter {
         out += ",0 ";
         w.MaybeFlush();
       }
-      if (!progress_.Step()) return false;
-    }
+      return progress_.Step();
+    });
+    if (!finished) return false;
     out += "</coordinates></LineString></Placemark>";
     return true;
   }
@@ -234,6 +247,7 @@ class KmlWriter {
   CPtrList& tracks_;
   CPtrList& items_;
   int photoSourceMode_ = 0;
+  ExportControl& control_;
   Progress progress_;
   bool kmz_ = false;
   bool stopped_ = false;
@@ -242,50 +256,33 @@ class KmlWriter {
   std::vector<PackEntry> pack_;
 };
 
-int Fail(KmzExportFailure* failure, KmzExportFailure::Stage stage, const PackEntry* entry,
+int Fail(KmzExportFailure& failure, KmzExportFailure::Stage stage, const PackEntry* entry,
          const std::string& message) {
-  if (failure) {
-    failure->stage = stage;
-    if (entry) {
-      failure->file = entry->path;
-      failure->photo = entry->photo;
-    }
-    failure->message = CString::FromUtf8(message);
+  failure.stage = stage;
+  if (entry) {
+    failure.file = entry->path;
+    failure.photo = entry->photo;
   }
+  failure.message = CString::FromUtf8(message);
   return 0;
 }
 
-}  // namespace
-
-int ExportKml(CString path, CPtrList& tracks, CPtrList& items, int photoSourceMode) {
-  return ExportKml(path, tracks, items, photoSourceMode, nullptr, nullptr);
-}
-
-int ExportKml(CString path, CPtrList& tracks, CPtrList& items, int photoSourceMode, int* counter,
-              bool* keepGoing) {
-  KmlWriter writer(tracks, items, photoSourceMode, Progress{counter, keepGoing});
-  return writer.Write(path) ? 1 : 0;
-}
-
-int ExportKmz(CString path, CPtrList& tracks, CPtrList& items) {
-  return ExportKmz(path, tracks, items, nullptr);
-}
-
-int ExportKmz(CString path, CPtrList& tracks, CPtrList& items, KmzExportFailure* failure,
-              int* counter, bool* keepGoing) {
-  if (failure) *failure = KmzExportFailure{};
+int PackKmz(const CString& path, CPtrList& tracks, CPtrList& items, KmzExportFailure& failure,
+            ExportControl& control) {
   navmisc::ScopedTempFolder scratch(L"KMZ_Temp");
   if (scratch.path().IsEmpty()) {
     return Fail(failure, KmzExportFailure::kScratchFolder, nullptr,
                 "cannot create a scratch folder under $TMPDIR");
   }
-  KmlWriter writer(tracks, items, 0, Progress{counter, keepGoing});
+  KmlWriter writer(tracks, items, 0, control);
   writer.SetKmz(scratch.path());
   if (!writer.Write(path)) {
     if (writer.stopped()) return Fail(failure, KmzExportFailure::kStopped, nullptr, "stopped");
-    return Fail(failure, KmzExportFailure::kDocument, nullptr,
-                path.IsEmpty() ? "no target path" : navmisc::LastOpenError());
+    return Fail(failure, KmzExportFailure::kDocument, nullptr, control.error);
   }
+  // A document that lost bytes on the way is still packed, as a whole one would be; the caller
+  // learns of it from the control.
+  const std::string documentError = control.error;
 
   // The document travels last, named after the target.
   PackEntry document{PathJoin(scratch.path(), PathFileTitle(path) + L".kml"), nullptr};
@@ -310,5 +307,33 @@ int ExportKmz(CString path, CPtrList& tracks, CPtrList& items, KmzExportFailure*
   if (!archive.Close()) {
     return Fail(failure, KmzExportFailure::kCloseArchive, nullptr, archive.error());
   }
+  control.error = documentError;
   return 1;
+}
+
+}  // namespace
+
+int ExportKml(CString path, CPtrList& tracks, CPtrList& items, int photoSourceMode) {
+  ExportControl control;
+  return ExportKml(path, tracks, items, photoSourceMode, control);
+}
+
+int ExportKml(CString path, CPtrList& tracks, CPtrList& items, int photoSourceMode, ExportControl& control) {
+  KmlWriter writer(tracks, items, photoSourceMode, control);
+  return writer.Write(path) ? 1 : 0;
+}
+
+int ExportKmz(CString path, CPtrList& tracks, CPtrList& items) {
+  ExportControl control;
+  return ExportKmz(path, tracks, items, nullptr, control);
+}
+
+int ExportKmz(CString path, CPtrList& tracks, CPtrList& items, KmzExportFailure* failure,
+              ExportControl& control) {
+  KmzExportFailure local;
+  if (!failure) failure = &local;
+  *failure = KmzExportFailure{};
+  const int result = PackKmz(path, tracks, items, *failure, control);
+  if (!result) control.error = failure->message.ToUtf8();
+  return result;
 }

@@ -1,6 +1,7 @@
 // KML 2.1 export of tracks and located items, and its zipped form KMZ with copies of the photos.
 #pragma once
 
+#include "navmisc/export/export_control.h"
 #include "navmisc/platform/cstring.h"
 #include "navmisc/platform/lists.h"
 
@@ -22,14 +23,13 @@ class PHOTO_ITEM_INFO;
 // carries the same LineStyle id, so a document with two or more tracks is readable but not
 // schema-valid.
 //
-// Returns 1 on success, 0 when `path` is empty or cannot be opened for writing.
+// Returns 1 on success, 0 when `path` is empty or cannot be opened for writing. Write errors
+// after opening do not change the result.
 int ExportKml(CString path, CPtrList& tracks, CPtrList& items, int photoSourceMode);
 
-// The same with progress: `*counter` (may be null) goes up by one per item and per track point.
-// When `*keepGoing` (may be null) turns false the export stops, deletes what it wrote and
-// returns 0.
-int ExportKml(CString path, CPtrList& tracks, CPtrList& items, int photoSourceMode, int* counter,
-              bool* keepGoing);
+// The same under `control` (progress, stopping, points read from the point files), which also
+// receives the reason when the target could not be opened or a write failed.
+int ExportKml(CString path, CPtrList& tracks, CPtrList& items, int photoSourceMode, ExportControl& control);
 
 // Writes the same document (pictures referred to by bare names) and packs it with numbered
 // copies of the photos ("1.jpg", "2.jpg", ... in item order) into a zip archive at `path`; the
@@ -57,8 +57,9 @@ struct KmzExportFailure {
   CString message;                         // the reason in the system's words
 };
 
-// ExportKmz that also says why it failed and reports progress: `failure` (may be null) is reset,
-// then filled when the result is 0; `counter` and `keepGoing` as for ExportKml. A stopped export
-// leaves nothing at `path`.
+// ExportKmz under `control` (as for ExportKml) that also says why it failed: `failure` (may be
+// null) is reset, then filled when the result is 0, and its message goes to the control's error.
+// A document that lost bytes on the way is still packed (result 1); the control's error says so.
+// A stopped export leaves nothing at `path`.
 int ExportKmz(CString path, CPtrList& tracks, CPtrList& items, KmzExportFailure* failure,
-              int* counter = nullptr, bool* keepGoing = nullptr);
+              ExportControl& control);

@@ -172,7 +172,9 @@ TEST(ExportKmz, PhotoThatCannotBeAddedIsNamed) {
   const PHOTO_ITEM_INFO* gone = f.owned[2].get();
   ASSERT_TRUE(DeleteFile(gone->GetFilePathName()));
   KmzExportFailure failure;
-  EXPECT_EQ(ExportKmz(f.root / L"trip.kmz", f.tracks, f.items, &failure), 0);
+  ExportControl control;
+  EXPECT_EQ(ExportKmz(f.root / L"trip.kmz", f.tracks, f.items, &failure, control), 0);
+  EXPECT_EQ(control.error, "No such file or directory");
   EXPECT_EQ(failure.stage, KmzExportFailure::kAddFile);
   EXPECT_EQ(failure.photo, gone);
   EXPECT_EQ(PathFileName(failure.file), L"2.png");

@@ -142,11 +142,20 @@ class Utf8Document {
 }  // namespace
 
 int ExportTcx(CString path, CTcxActivities& activity) {
-  return ExportTcx(path, activity, nullptr, nullptr);
+  ExportControl control;
+  return ExportTcx(path, activity, control);
 }
 
-int ExportTcx(CString path, CTcxActivities& activity, int* counter, bool* keepGoing) {
-  if (activity.Id.IsEmpty() || activity.sportType < 0 || activity.sportType > 7) return 0;
+int ExportTcx(CString path, CTcxActivities& activity, ExportControl& control) {
+  control.error.clear();
+  if (activity.Id.IsEmpty() || activity.sportType < 0 || activity.sportType > 7) {
+    control.error = "the activity has no Id or a sport type outside 0 to 7";
+    return 0;
+  }
+  if (control.pointsFromFiles) {
+    control.error = "a TCX export needs the points loaded";
+    return 0;
+  }
 
   // The document's frame; the laps are rendered one by one, and their Trackpoints one at a
   // time, so that a long activity never has to be held as elements in memory.
@@ -160,8 +169,11 @@ int ExportTcx(CString path, CTcxActivities& activity, int* counter, bool* keepGo
   id->SetText(activity.Id.str());
 
   DocumentWriter w;
-  if (!w.Open(path)) return 0;
-  Progress progress{counter, keepGoing};
+  if (!w.Open(path)) {
+    control.error = w.error();
+    return 0;
+  }
+  Progress progress{control.counter, control.keepGoing};
   Utf8Document text(w);
   std::wstring& piece = text.piece();
   piece = kPrologue;
@@ -188,10 +200,7 @@ int ExportTcx(CString path, CTcxActivities& activity, int* counter, bool* keepGo
           tp.Render(piece);
           text.Put();
         }
-        if (!progress.Step()) {
-          w.Remove();
-          return 0;
-        }
+        if (!progress.Step()) return navmisc::exportdetail::Stopped(w, control);
       }
       trackNode.RenderEnd(piece);
     }
@@ -204,8 +213,12 @@ int ExportTcx(CString path, CTcxActivities& activity, int* counter, bool* keepGo
   if (!text.ok()) {
     // Nothing of a failed conversion reaches the file.
     w.Remove();
-    if (!w.Open(path)) return 0;
+    if (!w.Open(path)) {
+      control.error = w.error();
+      return 0;
+    }
   }
   w.Close();
+  control.error = w.error();
   return 1;
 }

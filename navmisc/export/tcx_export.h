@@ -3,6 +3,7 @@
 
 #include <cstdint>
 
+#include "navmisc/export/export_control.h"
 #include "navmisc/platform/cstring.h"
 #include "navmisc/platform/lists.h"
 
@@ -50,7 +51,8 @@ class CTcxActivities {
 // and then no file is touched, or when the target cannot be opened.
 int ExportTcx(CString path, CTcxActivities& activity);
 
-// The same with progress: `*counter` (may be null) goes up by one per track point of the laps.
-// When `*keepGoing` (may be null) turns false the export stops, deletes what it wrote and
-// returns 0.
-int ExportTcx(CString path, CTcxActivities& activity, int* counter, bool* keepGoing);
+// The same under `control`: progress (one step per track point of the laps), stopping, and the
+// reason when the activity is rejected, the target could not be opened or a write failed (a
+// write error leaves the result at 1). The points must be loaded: with pointsFromFiles set the
+// call returns 0 without touching the target.
+int ExportTcx(CString path, CTcxActivities& activity, ExportControl& control);

@@ -10,6 +10,7 @@
 #include <atomic>
 #include <cerrno>
 
+#include "navmisc/platform/detail/write_fault.h"
 #include "navmisc/platform/files.h"
 
 namespace navmisc {
@@ -24,25 +25,10 @@ constexpr mode_t kNewFileMode = 0644;
 // while the rest is still being produced and the final fsync has little left to wait for.
 constexpr off_t kWritebackChunk = 8 << 20;
 
-// Bytes that may still be written before the injected fault; negative = no fault.
-std::atomic<long long> g_write_budget{-1};
-
-// How many of `wanted` bytes the fault injection lets through (all of them when it is off).
-size_t TakeWriteBudget(size_t wanted) {
-  long long budget = g_write_budget.load(std::memory_order_relaxed);
-  for (;;) {
-    if (budget < 0) return wanted;
-    const long long granted = std::min<long long>(budget, static_cast<long long>(wanted));
-    if (g_write_budget.compare_exchange_weak(budget, budget - granted, std::memory_order_relaxed)) {
-      return static_cast<size_t>(granted);
-    }
-  }
-}
-
 // Writes everything or fails; retries interrupted and partial writes. A shortened grant from
 // the fault injection writes what it allows and then fails with ENOSPC, like a full disk.
 bool WriteAll(int fd, const char* data, size_t size) {
-  const size_t allowed = TakeWriteBudget(size);
+  const size_t allowed = detail::TakeWriteBudget(size);
   size_t done = 0;
   while (done < allowed) {
     const ssize_t n = ::write(fd, data + done, allowed - done);
@@ -94,7 +80,7 @@ std::string ResolveTarget(const std::string& path) {
 
 namespace testing {
 void FailAtomicWritesAfter(long long bytes) {
-  g_write_budget.store(bytes < 0 ? -1 : bytes, std::memory_order_relaxed);
+  detail::g_write_budget.store(bytes < 0 ? -1 : bytes, std::memory_order_relaxed);
 }
 }  // namespace testing
 
@@ -129,6 +115,7 @@ bool AtomicFile::Open(const wchar_t* path) {
   fd_ = fd;
   temp_ = std::move(temp);
   failed_ = false;
+  keepTimes_ = false;
   written_ = writtenBack_ = 0;
   buffer_.clear();
   buffer_.reserve(kBufferSize);
@@ -172,31 +159,50 @@ void AtomicFile::StartWriteback() {
   writtenBack_ = written_;
 }
 
-bool AtomicFile::Commit() {
+void AtomicFile::SetTimes(const struct timespec& accessed, const struct timespec& modified) {
+  times_[0] = accessed;
+  times_[1] = modified;
+  keepTimes_ = true;
+}
+
+bool AtomicFile::Commit() { return Seal(true) && Publish(true); }
+
+bool AtomicFile::Seal(bool durable) {
   if (fd_ < 0) return false;
   // The data must be on disk before the rename makes it visible, or a crash could leave the
-  // target name pointing at an empty or partial file.
-  bool ok = Flush() && FsyncRetry(fd_);
+  // target name pointing at an empty or partial file: here, or by the caller before Publish. The
+  // times are set after the last write, which would otherwise move the modification time again.
+  bool ok = Flush() && (!keepTimes_ || ::futimens(fd_, times_) == 0) && (!durable || FsyncRetry(fd_));
   const int fd = fd_;
   fd_ = -1;
   if (RetryClose(fd) != 0) ok = false;
-  if (ok && ::rename(temp_.c_str(), target_.c_str()) != 0) ok = false;
-  if (!ok) {
-    ::unlink(temp_.c_str());
-    temp_.clear();
-    buffer_.clear();
-    failed_ = false;
+  // Many sealed files may wait for their Publish: none keeps its buffer meanwhile.
+  std::string().swap(buffer_);
+  if (!ok) Abandon();
+  return ok;
+}
+
+bool AtomicFile::Publish(bool syncFolder) {
+  if (fd_ >= 0 || temp_.empty()) return false;
+  if (::rename(temp_.c_str(), target_.c_str()) != 0) {
+    Abandon();
     return false;
   }
   temp_.clear();
   // Make the rename itself durable. The new content is in place either way, so a folder that
   // cannot be synced does not fail the commit.
-  const int dir = ::open(FolderOf(target_).c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC);
+  if (syncFolder) SyncFolder(FolderOf(target_));
+  return true;
+}
+
+const std::string& AtomicFile::TempPath() const { return temp_; }
+
+void SyncFolder(const std::string& folder) {
+  const int dir = ::open(folder.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC);
   if (dir >= 0) {
     FsyncRetry(dir);
     RetryClose(dir);
   }
-  return true;
 }
 
 void AtomicFile::Abandon() {

@@ -5,6 +5,7 @@
 #pragma once
 
 #include <sys/types.h>
+#include <time.h>
 
 #include <cstddef>
 #include <string>
@@ -29,8 +30,20 @@ class AtomicFile {
   bool Write(const void* data, size_t size) {
     return Write(std::string_view(static_cast<const char*>(data), size));
   }
+  // Gives the new file these access and modification times instead of the time of the write
+  // (for a file whose content changes in a way its user should not see as an edit).
+  void SetTimes(const struct timespec& accessed, const struct timespec& modified);
   // Flushes, syncs and renames over the target. False (target untouched) on any failure.
   bool Commit();
+  // The same in two steps, for many files made durable together (one sync of the file system
+  // instead of one per file): Seal writes out and closes the temporary file, waiting for the
+  // disk only when `durable`; Publish renames it over the target and, with `syncFolder`, makes
+  // the rename durable. Between the two, the caller makes the data durable (SyncFileSystem) and
+  // may still Abandon. Both false (target untouched, temporary file removed) on failure.
+  bool Seal(bool durable);
+  bool Publish(bool syncFolder);
+  // The temporary file while the object holds one (for syncing its file system).
+  const std::string& TempPath() const;
   // Removes the temporary file; the target stays as it was.
   void Abandon();
 
@@ -41,15 +54,20 @@ class AtomicFile {
   off_t written_ = 0;      // bytes in the temporary file
   off_t writtenBack_ = 0;  // bytes whose writing out has been started
   bool failed_ = false;
+  bool keepTimes_ = false;
+  struct timespec times_[2] = {};
   std::string target_;
   std::string temp_;
   std::string buffer_;
 };
 
+// Makes the entries of a folder durable (fsync of the folder), after files were renamed into it.
+void SyncFolder(const std::string& folder);
+
 namespace testing {
-// Fault injection for tests: after `bytes` more bytes have been written through AtomicFile in
-// this process, every further write fails as a full disk would. A negative value switches the
-// fault off.
+// Fault injection for tests: after `bytes` more bytes have been written through AtomicFile or
+// OutputFile in this process, every further write fails as a full disk would. A negative value
+// switches the fault off.
 void FailAtomicWritesAfter(long long bytes);
 }  // namespace testing
 

@@ -1,7 +1,15 @@
 #include "navmisc/platform/console.h"
 
+#include <fcntl.h>
 #include <signal.h>
 #include <unistd.h>
+
+#include <cerrno>
+#include <cstdio>
+
+#include "navmisc/platform/detail/error_text.h"
+#include "navmisc/platform/detail/unique_fd.h"
+#include "navmisc/platform/files.h"
 
 namespace navmisc {
 namespace {
@@ -14,6 +22,34 @@ void OnInterrupt(int) { g_interrupted = 1; }
 }  // namespace
 
 bool StderrIsTerminal() { return ::isatty(STDERR_FILENO) == 1; }
+
+bool CopyFileToStdout(const wchar_t* path, std::string& error) {
+  const detail::UniqueFd in(::open(NativePath(path).c_str(), O_RDONLY | O_CLOEXEC));
+  if (in.get() < 0) {
+    error = detail::ErrorText(errno);
+    return false;
+  }
+  std::fflush(stdout);
+  char buf[1 << 16];
+  for (;;) {
+    const ssize_t n = ::read(in.get(), buf, sizeof buf);
+    if (n < 0 && errno == EINTR) continue;
+    if (n < 0) {
+      error = detail::ErrorText(errno);
+      return false;
+    }
+    if (n == 0) return true;
+    for (ssize_t done = 0; done < n;) {
+      const ssize_t w = ::write(STDOUT_FILENO, buf + done, static_cast<size_t>(n - done));
+      if (w < 0 && errno == EINTR) continue;
+      if (w < 0) {
+        error = detail::ErrorText(errno);
+        return false;
+      }
+      done += w;
+    }
+  }
+}
 
 InterruptWatch::InterruptWatch() {
   g_interrupted = 0;

@@ -11,6 +11,7 @@
 
 #include <algorithm>
 #include <cstdlib>
+#include <filesystem>
 #include <cwctype>
 #include <string>
 #include <string_view>
@@ -275,6 +276,42 @@ bool IsDirectory(const wchar_t* path) {
   return !p.empty() && ::stat(p.c_str(), &st) == 0 && S_ISDIR(st.st_mode);
 }
 
+bool GetFileBirthTime(const wchar_t* path, long long& seconds, long& nanoseconds) {
+  std::string p = NativePath(path);
+  if (p.empty()) return false;
+  Fd fd(::open(p.c_str(), O_RDONLY | O_CLOEXEC | O_NONBLOCK));
+  if (!fd.ok()) return false;
+  struct statx sx {};
+  if (::statx(fd.get(), "", AT_EMPTY_PATH, STATX_BTIME | STATX_CTIME, &sx) == 0) {
+    const struct statx_timestamp& t = (sx.stx_mask & STATX_BTIME) ? sx.stx_btime : sx.stx_ctime;
+    seconds = t.tv_sec;
+    nanoseconds = static_cast<long>(t.tv_nsec);
+    return true;
+  }
+  struct stat st;
+  if (::fstat(fd.get(), &st) != 0) return false;
+  seconds = st.st_ctim.tv_sec;
+  nanoseconds = st.st_ctim.tv_nsec;
+  return true;
+}
+
+bool IsFileWritable(const wchar_t* path) {
+  const int mode = GetFileMode(path);
+  return mode >= 0 && (mode & 0222) != 0 && ::access(NativePath(path).c_str(), W_OK) == 0;
+}
+
+int GetFileMode(const wchar_t* path) {
+  std::string p = NativePath(path);
+  struct stat st;
+  if (p.empty() || ::stat(p.c_str(), &st) != 0) return -1;
+  return static_cast<int>(st.st_mode & 07777);
+}
+
+bool SetFileMode(const wchar_t* path, int mode) {
+  std::string p = NativePath(path);
+  return !p.empty() && mode >= 0 && ::chmod(p.c_str(), static_cast<mode_t>(mode & 07777)) == 0;
+}
+
 bool SetFileNormal(const wchar_t* path) {
   std::string p = NativePath(path);
   struct stat st;
@@ -327,6 +364,13 @@ CString UserConfigFolder() {
   if (const char* x = std::getenv("XDG_CONFIG_HOME"); x && *x == '/') return CString::FromUtf8(x);
   const char* home = std::getenv("HOME");
   return CString::FromUtf8(std::string(home && *home ? home : "/tmp") + "/.config");
+}
+
+CString AbsolutePath(const wchar_t* path) {
+  std::error_code ec;
+  const std::filesystem::path abs = std::filesystem::absolute(NativePath(path), ec);
+  if (ec || NativePath(path).empty()) return {};
+  return CString::FromUtf8(abs.lexically_normal().string());
 }
 
 CString PathJoin(const wchar_t* folder, const wchar_t* name) {

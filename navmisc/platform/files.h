@@ -29,6 +29,17 @@ int PathStatus(const wchar_t* path);
 bool FileExists(const wchar_t* path);
 // True when the path leads to a folder, following symbolic links.
 bool IsDirectory(const wchar_t* path);
+// When the file was made: its birth time where the file system records one, else the time its
+// status last changed (the nearest a Linux file system without birth times comes to it). Seconds
+// and nanoseconds since 1970 (UTC). False when the file cannot be opened for reading.
+bool GetFileBirthTime(const wchar_t* path, long long& seconds, long& nanoseconds);
+// True when the calling user may write the file: it has a write permission bit (a file without
+// any counts as write-protected even for root, who could write it) and the system grants this
+// user writing.
+bool IsFileWritable(const wchar_t* path);
+// The permission bits of a file (07777), following a symbolic link; -1 when it cannot be read.
+int GetFileMode(const wchar_t* path);
+bool SetFileMode(const wchar_t* path, int mode);
 // Makes the file writable by its owner ("attributes normal").
 bool SetFileNormal(const wchar_t* path);
 // The clearing of an export's target: up to 3 attempts; stop when the file-name part is empty or
@@ -44,6 +55,10 @@ CString GetCurrentExecPath();
 // The user's folder for settings: $XDG_CONFIG_HOME when it is an absolute path, else
 // $HOME/.config (/tmp/.config without a home).
 CString UserConfigFolder();
+
+// `path` made absolute against the current folder, with "." and ".." steps removed (links are
+// not resolved). Empty when the current folder cannot be found.
+CString AbsolutePath(const wchar_t* path);
 
 // Path text helpers (no file system access).
 CString PathJoin(const wchar_t* folder, const wchar_t* name);

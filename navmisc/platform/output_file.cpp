@@ -3,18 +3,14 @@
 #include <cerrno>
 #include <cstring>
 
+#include "navmisc/platform/detail/error_text.h"
+#include "navmisc/platform/detail/write_fault.h"
 #include "navmisc/platform/files.h"
 
 namespace navmisc {
 namespace {
 
 thread_local std::string t_last_open_error;
-
-std::string ErrorText(int err) {
-  char buf[256];
-  // The GNU strerror_r returns the text, which may or may not live in `buf`.
-  return strerror_r(err, buf, sizeof buf);
-}
 
 }  // namespace
 
@@ -40,9 +36,13 @@ bool OutputFile::Open(const wchar_t* path) {
 
 bool OutputFile::Write(std::string_view bytes) {
   if (!file_ || failed_) return false;
+  // An injected fault writes what its budget allows and then fails like a full disk.
+  const size_t allowed = detail::TakeWriteBudget(bytes.size());
   errno = 0;
-  if (!bytes.empty() && std::fwrite(bytes.data(), 1, bytes.size(), file_) != bytes.size()) {
+  if (allowed > 0 && std::fwrite(bytes.data(), 1, allowed, file_) != allowed) {
     Failed(errno ? errno : EIO);
+  } else if (allowed < bytes.size()) {
+    Failed(ENOSPC);
   }
   return !failed_;
 }
@@ -57,7 +57,7 @@ bool OutputFile::Close() {
 }
 
 void OutputFile::Failed(int err) {
-  if (!failed_) error_ = ErrorText(err);
+  if (!failed_) error_ = detail::ErrorText(err);
   failed_ = true;
 }
 

@@ -15,6 +15,7 @@
 #include <string>
 #include <string_view>
 #include <unordered_map>
+#include <unordered_set>
 #include <utility>
 #include <vector>
 
@@ -100,6 +101,18 @@ bool NameToUtf8(const wchar_t* name, std::string& out) {
 // The parsed file: values (UTF-8, escapes undone) by EntryKey.
 using Index = std::unordered_map<std::string, std::string>;
 
+// The section names of a file in the order they first appear, each once.
+struct SectionList {
+  std::vector<std::string> names;
+  std::unordered_set<std::string> folded;
+
+  void Add(const std::string& name) {
+    std::string key;
+    FoldInto(key, name);
+    if (folded.insert(std::move(key)).second) names.push_back(name);
+  }
+};
+
 // Undoes the quoting of a value that starts with '"'. False when the closing quote is missing.
 // Text after the closing quote is ignored.
 bool Unquote(std::string_view raw, std::string& out) {
@@ -162,7 +175,7 @@ std::string CleanName(std::string_view s) {
 // has to be in memory and an absurdly long line costs time in proportion to its length only.
 class Parser {
  public:
-  explicit Parser(Index& index) : index_(index) {}
+  Parser(Index& index, SectionList& sections) : index_(index), sections_(sections) {}
 
   void Feed(std::string_view bytes) {
     while (!bytes.empty()) {
@@ -213,6 +226,7 @@ class Parser {
       if (!IsValidSectionName(name)) return;
       section_ = CleanName(name);
       section_ok_ = true;
+      sections_.Add(section_);
       return;
     }
     const size_t eq = line.find('=');
@@ -231,6 +245,7 @@ class Parser {
   }
 
   Index& index_;
+  SectionList& sections_;
   std::string pending_;
   bool overlong_ = false;
   std::string section_;  // keys above the first header belong to the section ""
@@ -305,7 +320,7 @@ ssize_t ReadFull(int fd, char* buf, size_t size) {
 
 // Reads and indexes the file. False when it cannot be opened or read, or is not a regular file
 // (a pipe or a device could block or never end).
-bool LoadFile(const std::string& path, Index& index) {
+bool LoadFile(const std::string& path, Index& index, SectionList& sections) {
   Fd fd(::open(path.c_str(), O_RDONLY | O_CLOEXEC));
   if (fd.get() < 0) return false;
   struct stat st;
@@ -316,7 +331,7 @@ bool LoadFile(const std::string& path, Index& index) {
   if (n < 0) return false;
   std::string_view first(chunk.data(), static_cast<size_t>(n));
 
-  Parser parser(index);
+  Parser parser(index, sections);
   enum class Encoding { kUtf8, kUtf16Le, kUtf16Be } encoding = Encoding::kUtf8;
   if (first.starts_with("\xEF\xBB\xBF")) {
     first.remove_prefix(3);
@@ -356,6 +371,7 @@ bool LoadFile(const std::string& path, Index& index) {
 
 struct Reader {
   Index index;
+  SectionList sections;
 
   // The stored value of section/key, or null.
   const std::string* Find(const wchar_t* section, const wchar_t* key) const {
@@ -516,7 +532,7 @@ void WriteText(unsigned long handle, const wchar_t* section, const wchar_t* key,
 unsigned long RD_BEGIN(const wchar_t* path) {
   if (!path || !*path) return 0;
   auto reader = std::make_shared<Reader>();
-  if (!LoadFile(navmisc::NativePath(path), reader->index)) return 0;
+  if (!LoadFile(navmisc::NativePath(path), reader->index, reader->sections)) return 0;
   return Readers().Add(std::move(reader));
 }
 
@@ -556,6 +572,13 @@ CString RD_STRING(unsigned long handle, const wchar_t* section, const wchar_t* k
 bool RD_EXISTS(unsigned long handle, const wchar_t* section, const wchar_t* key) {
   const auto reader = Readers().Get(handle);
   return reader && reader->Find(section, key) != nullptr;
+}
+
+int RD_SECTIONS(unsigned long handle, CStringList& names) {
+  const auto reader = Readers().Get(handle);
+  if (!reader) return 0;
+  for (const std::string& name : reader->sections.names) names.AddTail(CString::FromUtf8(name));
+  return static_cast<int>(reader->sections.names.size());
 }
 
 void RD_END(unsigned long handle) { Readers().Take(handle); }

@@ -9,6 +9,7 @@
 #pragma once
 
 #include "navmisc/platform/cstring.h"
+#include "navmisc/platform/lists.h"
 
 // Opens `path` for reading; 0 when it cannot be opened.
 unsigned long RD_BEGIN(const wchar_t* path);
@@ -18,6 +19,10 @@ CString RD_STRING(unsigned long handle, const wchar_t* section, const wchar_t* k
                   const wchar_t* def = L"");
 // True when the key is present in the section (whatever its value).
 bool RD_EXISTS(unsigned long handle, const wchar_t* section, const wchar_t* key);
+// Appends the names of the file's sections to `names` in the order they first appear, each
+// once; returns how many. Lets a reader visit what a file holds instead of trying every name a
+// count inside the file promises.
+int RD_SECTIONS(unsigned long handle, CStringList& names);
 void RD_END(unsigned long handle);
 
 // Starts a new document for `path`; 0 when `path` is empty.

@@ -114,6 +114,17 @@ TEST(SettingsTest, NamesMatchWithoutCaseAndRewritesReplaceInPlace) {
   EXPECT_FALSE(RD_EXISTS(r, L"Straße", L"ä"));
   EXPECT_FALSE(RD_EXISTS(r, L"Trip", L"n"));
   RD_END(r);
+
+  // Sections in the order they first appear, each once whatever its spelling later.
+  TempDir other;
+  const unsigned long s = ReadBytes(other, "k=top\n[File.1]\na=1\n[B]\n[file.1]\nb=2\n[File.0]\n");
+  CStringList sections;
+  EXPECT_EQ(RD_SECTIONS(s, sections), 3);
+  std::vector<std::wstring> names;
+  for (POSITION pos = sections.GetHeadPosition(); pos;) names.push_back(sections.GetNext(pos).str());
+  EXPECT_EQ(names, (std::vector<std::wstring>{L"File.1", L"B", L"File.0"}));
+  RD_END(s);
+  EXPECT_EQ(RD_SECTIONS(s, sections), 0) << "an ended handle";
 }
 
 TEST(SettingsTest, NumbersRoundTripExactlyAndBadTextGivesDefault) {

@@ -12,6 +12,12 @@ enum GPS_APP_PROG_TYPE : int32_t {
   GPS_APP_WHEREAMI = 1000  // where-am-I viewer, "WhereRes"
 };
 
+// A file time: 100-nanosecond intervals since 1601-01-01 00:00 UTC, in two 32-bit halves.
+struct FILETIME {
+  uint32_t dwLowDateTime = 0;
+  uint32_t dwHighDateTime = 0;
+};
+
 // A screen point in pixels.
 struct CPoint {
   long x = 0;

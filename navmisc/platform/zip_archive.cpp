@@ -8,23 +8,19 @@
 #include <cerrno>
 #include <cstring>
 
+#include "navmisc/platform/detail/error_text.h"
 #include "navmisc/platform/files.h"
 #include "navmisc/platform/textconv.h"
 
 namespace navmisc {
 namespace {
 
-std::string SystemError(int err) {
-  char buf[256];
-  return strerror_r(err, buf, sizeof buf);
-}
-
 // libzip reads added files only when the archive is written. Opening the file now turns a
 // missing or unreadable file into an error of its own addition rather than of the close.
 bool CheckReadable(const std::string& native, std::string& error) {
   const int fd = ::open(native.c_str(), O_RDONLY | O_CLOEXEC);
   if (fd < 0) {
-    error = SystemError(errno);
+    error = detail::ErrorText(errno);
     return false;
   }
   struct stat st;

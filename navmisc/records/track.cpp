@@ -9,8 +9,8 @@
 #include "navmisc/records/photo.h"
 #include "navmisc/records/point_codec.h"
 #include "navmisc/records/point_file_format.h"
+#include "navmisc/records/track_point_reader.h"
 #include "navmisc/records/trip.h"
-#include "navmisc/records/user_profile.h"
 
 namespace pf = navmisc::point_file;
 using navmisc::DeleteAll;
@@ -180,21 +180,14 @@ void TRACK_ITEM_INFO::ReadAllWaypoint(int force) {
   // A thinned copy shares its points with the real track: reloading would free them under it.
   if (!ownsPoints_) return;
   if (!force && !points.IsEmpty()) return;
-  const long shift = trip ? GetProfileTimeShift(trip->appType) : 0;
-  navmisc::LineReader reader(pf::kMaxLine);
-  if (reader.Open(GetFilePathName())) {
+  navmisc::TrackPointReader reader;
+  if (reader.Open(*this)) {
     DeleteAll<WAYPOINT_ITEM_INFO>(points);
-    std::string_view line;
-    while (reader.Next(line)) {
-      auto* p = new WAYPOINT_ITEM_INFO(nullptr);
-      pf::ScanPointLine(line, *p);
-      // Times stored by the old release need the profile's shift; the writer never removes it.
-      p->time = static_cast<int32_t>(static_cast<uint32_t>(p->time) + static_cast<uint32_t>(shift));
-      points.AddTail(p);
-    }
-    reader.Close();
+    WAYPOINT_ITEM_INFO p;
+    while (reader.Next(p)) points.AddTail(new WAYPOINT_ITEM_INFO(p));
   }
-  // Every loaded track has at least two points.
+  // Every loaded track has at least two points (the reader sees to that for what it reads; a
+  // list kept because its file is missing gets the same).
   if (points.GetCount() == 1) {
     auto* second = new WAYPOINT_ITEM_INFO(static_cast<WAYPOINT_ITEM_INFO*>(points.GetHead()));
     second->time = static_cast<int32_t>(static_cast<uint32_t>(second->time) + 1u);  // wraps, never overflows

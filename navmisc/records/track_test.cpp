@@ -16,6 +16,7 @@
 #include "navmisc/platform/files.h"
 #include "navmisc/platform/format.h"
 #include "navmisc/records/point_codec.h"
+#include "navmisc/records/track_point_reader.h"
 #include "navmisc/records/trip.h"
 #include "record_fixture.h"
 
@@ -166,6 +167,37 @@ TEST_F(TrackFiles, LoadingRulesOfTheApplicationType) {
   other.cellFixes.AddTail(new BASE_ITEM_INFO(nullptr));
   other.WriteAllWaypoint(1, nullptr, nullptr);
   EXPECT_EQ(ReadFileBytes(other.GetCellIDFilePathName()), "keep me\r\n");
+}
+
+TEST_F(TrackFiles, ThePointReaderYieldsWhatLoadingHolds) {
+  std::tie(g_TrackerMapInfo.timeZoneShiftOn, g_TrackerMapInfo.timeZoneShift) = std::tuple(true, 3600);
+  auto trip = MakeTrip(GPS_APP_TRACKER);
+  TRACK_ITEM_INFO track(trip.get());
+  const std::string files[] = {
+      "",
+      "1000000000,1.5,2.5,3.5,4,5,6,7,8\r\n",  // a lone point: loaded with its copy
+      "100,1.5,2.5,3.5,4,5,6,7,8\n200,1.5,oops\r\n\r\n" + std::string(300, '7') + "\n300,1,2",
+  };
+  for (const std::string& content : files) {
+    WriteFileBytes(track.GetFilePathName(), content);
+    track.ReadAllWaypoint(1);
+    navmisc::TrackPointReader reader;
+    ASSERT_TRUE(reader.Open(track));
+    WAYPOINT_ITEM_INFO p;
+    int n = 0;
+    for (const auto* loaded : navmisc::Items<WAYPOINT_ITEM_INFO>(track.points)) {
+      ASSERT_TRUE(reader.Next(p)) << content << " point " << n;
+      EXPECT_TRUE(p == *loaded) << content << " point " << n;
+      ++n;
+    }
+    EXPECT_FALSE(reader.Next(p)) << content;
+    EXPECT_EQ(navmisc::TrackPointReader::Count(track), n) << content;
+  }
+  EXPECT_EQ(track.points.GetCount(), 6);
+  DeleteFile(track.GetFilePathName());
+  navmisc::TrackPointReader reader;
+  EXPECT_FALSE(reader.Open(track));
+  EXPECT_EQ(navmisc::TrackPointReader::Count(track), 0);
 }
 
 TEST_F(TrackFiles, StoppedWritesShortenAndFailedWritesKeepTheOldFile) {

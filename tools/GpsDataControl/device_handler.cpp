@@ -5,6 +5,11 @@
 #include "navmisc/datactrl/dc_errors.h"
 
 namespace gpsdc {
+namespace {
+
+int32_t NotAvailable(CDataControlCmdBlkKVDevice&, RequestContext&) { return DC_ERR_NOT_AVAILABLE; }
+
+}  // namespace
 
 bool DeviceConnected(const Config& config) {
   if (DeviceService* service = RunningDeviceService()) return service->Connected();
@@ -19,9 +24,7 @@ void RegisterDeviceHandlers(HandlerTable& table) {
       return;
     }
     CDataControlCmdBlkKVDevice device{};
-    navmisc::datactrl::UnpackBlock(ctx.request, device);
-    device.nLastError = DC_ERR_NOT_AVAILABLE;
-    ctx.replies.Send(device);
+    AnswerInPlace(ctx, device, NotAvailable);
   });
 }
 

@@ -106,9 +106,7 @@ int32_t RunFileCommand(CDataControlCmdBlkFile& block, RequestContext& ctx) {
 void RegisterFileHandlers(HandlerTable& table) {
   table.Set(DC_CMD_FILE, [](RequestContext& ctx) {
     CDataControlCmdBlkFile file;
-    navmisc::datactrl::UnpackBlock(ctx.request, file);
-    file.nLastError = RunFileCommand(file, ctx);
-    ctx.replies.Send(file);
+    AnswerInPlace(ctx, file, RunFileCommand);
   });
 }
 

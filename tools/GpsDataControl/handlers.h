@@ -75,6 +75,15 @@ class HandlerTable {
 // Every handler of the process.
 HandlerTable MakeHandlerTable();
 
+// The common answer to a command: reads the request into `block` (holding its starting values),
+// lets `run` fill it in for the reply and give the code for nLastError, and sends it back.
+template <class Block>
+void AnswerInPlace(RequestContext& ctx, Block& block, int32_t (*run)(Block&, RequestContext&)) {
+  navmisc::datactrl::UnpackBlock(ctx.request, block);
+  block.nLastError = run(block, ctx);
+  ctx.replies.Send(block);
+}
+
 void RegisterStatusHandlers(HandlerTable& table);  // kinds 4 and 5
 void RegisterDeviceHandlers(HandlerTable& table);  // kind 1
 void RegisterFileHandlers(HandlerTable& table);    // kind 3

@@ -27,9 +27,7 @@ bool WebServiceConnected(const Config& config) {
 void RegisterNetHandlers(HandlerTable& table) {
   table.Set(DC_CMD_NET, [](RequestContext& ctx) {
     CDataControlCmdBlkNet net;
-    navmisc::datactrl::UnpackBlock(ctx.request, net);
-    net.nLastError = RunNetCommand(net, ctx);
-    ctx.replies.Send(net);
+    AnswerInPlace(ctx, net, RunNetCommand);
   });
 }
 

@@ -4,12 +4,15 @@
 #include <chrono>
 #include <functional>
 #include <memory>
+#include <optional>
 #include <string>
+#include <vector>
 
 #include "navmisc/platform/cstring.h"
 #include "navmisc/platform/types.h"
 
 class BLOG_ITEM_INFO;
+class TRACK_ITEM_INFO;
 namespace CLI {
 class App;
 }
@@ -33,15 +36,27 @@ void AddGlobalOptions(CLI::App& app);
 CLI::App* AddCommand(CLI::App& app, const std::string& name, const std::string& description,
                      const std::string& details, std::function<void()> run, bool usesDataRoot = true);
 
-long ParseTime(const std::string& text);  // seconds since 1970 or "YYYY-MM-DDThh:mm:ss[Z]"
-std::string TimeText(long time);          // "YYYY-MM-DDThh:mm:ssZ", or "-" for none
+// Dates and times as the user gives them: ISO 8601 ("2024-05-31", "2024-05-31T14:05:00Z",
+// "2024-05-31T16:05+02:00"; UTC when no zone is given), and the older forms (dates
+// "05/31/2024", times in seconds since 1970). Anything else is a usage error.
+struct Date {
+  int year, month, day;
+};
+Date ParseDate(const std::string& text);
+long ParseTime(const std::string& text);
+std::string DateText(const Date& date);  // "YYYY-MM-DD"
+std::string TimeText(long time);         // "YYYY-MM-DDThh:mm:ssZ", or "-" for none
 
 // Sets the data root (and the program folder) for this run.
 void SetDataRoot(const std::string& root);
 std::string DataRoot();
 
-// Finds and reads the trip whose id is `id`, in any application folder of the data root.
-std::unique_ptr<BLOG_ITEM_INFO> OpenTrip(const std::string& id);
+// Finds and reads (without its points) the trip that `name` names in any application folder of
+// the data root: its id, the start of exactly one trip's id, or exactly one trip's name. Fails
+// listing the candidates when none or several match.
+std::unique_ptr<BLOG_ITEM_INFO> OpenTrip(const std::string& name);
+// The track of `trip` that `name` names, the same way (its id, the start of one id, one name).
+TRACK_ITEM_INFO& FindTrack(BLOG_ITEM_INFO& trip, const std::string& name);
 
 // A progress bar on stderr (only when stderr is a terminal, and only once the work has taken
 // more than a moment): a bar while the total is known, a spinner with the time otherwise.
@@ -66,12 +81,24 @@ class ProgressDisplay {
 bool RunWithProgress(const std::string& label, int total, int& counter, bool& keepGoing,
                      const std::function<void()>& work);
 
-// Writes `trip` (points loaded) in one of the export formats; fails with a message. `counter`
-// and `keepGoing` (may be null) follow and stop the export.
-int ExportTrip(BLOG_ITEM_INFO& trip, const std::string& format, const std::string& out, bool metric,
-               int sport, int* counter = nullptr, bool* keepGoing = nullptr);
-// The demo's last step: every trip of the demo tree in every export format.
-void DemoExports(const std::string& root);
+// Fails unless the folder of the output file `path` exists and `path` is not a folder.
+void CheckOutputFolder(const std::string& path);
+
+// One run of `navmisc export`.
+struct ExportRequest {
+  std::string trip;             // as the user names it (see OpenTrip)
+  std::string out;              // the file to write, or "-" for standard output
+  std::string format;           // gpx, kml, kmz, tcx or csv, any case; empty: out's extension
+  bool metric = false;          // csv only
+  std::optional<int> sport;     // tcx only (default running)
+  std::string track;            // one track (see FindTrack); empty: all
+  std::optional<int> level;     // only the points kept at this display level
+};
+// Writes the document, with a progress bar, beside its target first and then in its place.
+// Returns the files written ("-" for standard output). Fails with a message.
+std::vector<std::string> RunExport(const ExportRequest& request);
+// The demo's last step: each of the demo's trips (ids) in every export format.
+void DemoExports(const std::string& root, const std::vector<std::string>& trips);
 
 // The commands, each added to the program's parser with its options, help and callback.
 void AddDemoCommand(CLI::App& app);
@@ -89,11 +116,15 @@ void AddChannelCommand(CLI::App& app);
 // data-control process.
 void AddDeviceCommand(CLI::App& app);
 void AddWhereCommand(CLI::App& app);
+// `navmisc photos add|list` and `navmisc geotag` (cmd_photos.cpp).
+void AddPhotosCommand(CLI::App& app);
+void AddGeotagCommand(CLI::App& app);
 // `navmisc help [COMMAND]`: the program's or a command's help.
 void AddHelpCommand(CLI::App& app);
 
-// The demo's geometry step (demo_geo.cpp): optimises the sample trips, writes a plot.
-void DemoGeometry();
+// The demo's geometry step (demo_geo.cpp): optimises the demo's trips (ids), draws one and
+// places a photo on it.
+void DemoGeometry(const std::vector<std::string>& trips);
 // The demo's logger step (demo_device.cpp): a logger folder with two days of NMEA logs under
 // `root`, read into trips through the data-control process.
 void DemoDevice(const std::string& root);

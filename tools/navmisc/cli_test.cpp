@@ -4,17 +4,14 @@
 #include <string>
 
 #include "testutil.h"
+#include "tool_test_support.h"
 
 namespace {
 
 using navmisc::testutil::CommandResult;
-using navmisc::testutil::RunCommand;
+using navmisc::testutil::RunTool;
 using navmisc::testutil::ShellQuote;
 using navmisc::testutil::TempDir;
-
-CommandResult Tool(const std::string& args) {
-  return RunCommand(ShellQuote(NAVMISC_TOOL_PATH) + " " + args + " 2>&1 </dev/null");
-}
 
 TEST(CommandLine, GlobalOptionsGoAnywhereAndEveryCommandExplainsItself) {
   TempDir root;
@@ -41,7 +38,7 @@ TEST(CommandLine, GlobalOptionsGoAnywhereAndEveryCommandExplainsItself) {
       {"--version", 0, "navmisc "},
   };
   for (const auto& c : cases) {
-    const CommandResult r = Tool(c.args);
+    const CommandResult r = RunTool(c.args);
     EXPECT_EQ(r.status, c.status) << c.args << "\n" << r.out;
     EXPECT_NE(r.out.find(c.shows), std::string::npos) << c.args << "\n" << r.out;
   }
@@ -49,7 +46,7 @@ TEST(CommandLine, GlobalOptionsGoAnywhereAndEveryCommandExplainsItself) {
   for (const char* command : {"demo", "trips", "optimize", "plot", "place", "export", "profile", "templates",
                               "timezone", "channel", "device", "where", "help"}) {
     for (const char* flag : {"-h", "--help"}) {
-      const CommandResult r = Tool(std::string(command) + " " + flag);
+      const CommandResult r = RunTool(std::string(command) + " " + flag);
       EXPECT_EQ(r.status, 0) << command << " " << flag << "\n" << r.out;
       EXPECT_EQ(r.out.find("Usage: navmisc " + std::string(command)), r.out.find('\n') + 1)
           << command << " " << flag << "\n" << r.out;

@@ -10,9 +10,10 @@
 #include "navmisc/geo/gps_mapping.h"
 #include "navmisc/geo/optimize.h"
 #include "navmisc/geo/track_plot.h"
-#include "navmisc/platform/atomic_file.h"
 #include "navmisc/platform/files.h"
 #include "navmisc/platform/format.h"
+#include "navmisc/platform/output_file.h"
+#include "navmisc/platform/staging_folder.h"
 #include "navmisc/records/trip.h"
 
 namespace navmisc::cli {
@@ -29,11 +30,12 @@ constexpr const char* kOptimizeHelp =
     "Ctrl-C stops after the current step; the levels set so far are saved (exit code 130).";
 
 constexpr const char* kPlotHelp =
-    "Draws the trip's tracks as an SVG picture, north up: one pixel per metre when the trip\n"
-    "fits into PIXELS (default 800), coarser steps of 0.2 m per pixel until it does. Every point\n"
-    "is a dot coloured by its level: red a bad fix, orange a stop, pale to dark blue levels 0\n"
-    "to 100, black never dropped. A scale bar and a key sit under the drawing. Run\n"
-    "`navmisc optimize TRIP` first to give the points their levels.";
+    "Draws the trip's tracks as a square SVG picture of --size pixels, north up, filled with the\n"
+    "trip: each track's line in its own colour, every point a dot coloured by its level (red a\n"
+    "bad fix, orange a stop, pale to dark blue levels 0 to 100, black never dropped), the start\n"
+    "(green) and the end (dark square) marked, the trip's name and times as the title, a scale\n"
+    "bar and a key underneath. Bad fixes stay out of the frame, so one wild fix cannot shrink\n"
+    "the drawing. Run `navmisc optimize TRIP` first to give the points their levels.";
 
 constexpr const char* kPlaceHelp =
     "Places a photo on the trip's tracks: where the trip was at time T (seconds since 1970 or\n"
@@ -103,14 +105,17 @@ void PrintLevelSummary(std::FILE* out, BLOG_ITEM_INFO& trip) {
 }
 
 void WritePlot(BLOG_ITEM_INFO& trip, const std::string& path, long size) {
-  const CString wpath = CString::FromUtf8(path);
-  const CString folder = PathFolder(wpath);
-  if (!folder.IsEmpty() && !IsDirectory(folder)) Fail("the folder " + folder.ToUtf8() + " does not exist");
+  CheckOutputFolder(path);
   TrackPlotOptions options;
   options.size = size;
   const std::string svg = RenderTrackPlotSvg(trip, options);
-  AtomicFile file;
-  if (!file.Open(wpath) || !file.Write(svg) || !file.Commit()) Fail("cannot write " + path);
+  StagingFolder staging(PathFolder(CString::FromUtf8(path)), PathFileName(CString::FromUtf8(path)));
+  if (staging.path().IsEmpty()) Fail("cannot write " + path + ": " + staging.error());
+  OutputFile file;
+  const bool written = file.Open(PathJoin(staging.path(), PathFileName(CString::FromUtf8(path)))) &&
+                       file.Write(svg) && file.Close();
+  if (!written) Fail("cannot write " + path + ": " + file.error());
+  if (!staging.Publish()) Fail("cannot write " + path + ": " + staging.error());
 }
 
 namespace {
@@ -145,8 +150,8 @@ void RunPlace(const PlaceOptions& o) {
     if (lat == 0.0 && lon == 0.0) Usage("0/0 stands for no position; give another one");
   }
   if (!byTime && !byPosition) Usage("place needs --time or --lat and --lon");
-  CString trackId = CString::FromUtf8(o.track);
   auto trip = OpenTripWithPoints(o.trip);
+  CString trackId = o.track.empty() ? CString() : FindTrack(*trip, o.track).id;
 
   double altitude = 0.0;
   long speed = 0;
@@ -192,14 +197,16 @@ void AddPlotCommand(CLI::App& app) {
   };
   auto o = std::make_shared<Options>();
   CLI::App* cmd = AddCommand(app, "plot", "draw a trip's tracks, points coloured by level", kPlotHelp, [o] {
+    const std::string extension = PathExtension(CString::FromUtf8(o->out)).ToUtf8();
+    if (extension != "svg" && extension != "SVG") Usage("the plot is an SVG picture: name it FILE.svg");
     auto trip = OpenTripWithPoints(o->trip);
     WritePlot(*trip, o->out, o->size);
     std::printf("%s\n", o->out.c_str());
   });
   cmd->add_option("TRIP", o->trip, "the trip")->required();
   cmd->add_option("-o,--output", o->out, "the picture to write")->required()->option_text("FILE.svg");
-  cmd->add_option("--size", o->size, "the picture's size in pixels (default 800)")
-      ->check(CLI::Range(16L, 100000L));
+  cmd->add_option("--size", o->size, "the picture's width and height in pixels (default 800)")
+      ->check(CLI::Range(200L, 100000L));
 }
 
 void AddPlaceCommand(CLI::App& app) {
@@ -215,7 +222,8 @@ void AddPlaceCommand(CLI::App& app) {
   lon->needs(lat);
   cmd->add_option("--tolerance", o->tolerance, "how near the track must pass, metres (default 50)")
       ->check(CLI::PositiveNumber);
-  cmd->add_option("--track", o->track, "the track to try first")->option_text("ID");
+  cmd->add_option("--track", o->track, "the track to try first: its id, the start of its id, or its name")
+      ->option_text("ID");
 }
 
 }  // namespace navmisc::cli

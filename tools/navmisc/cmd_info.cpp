@@ -1,6 +1,7 @@
 // Read-only views of what the library keeps besides trips: user profiles, the page template
 // catalogue and the system's time zone.
 #include <cstdio>
+#include <optional>
 
 #include <CLI/CLI.hpp>
 
@@ -24,15 +25,9 @@ GPS_APP_PROG_TYPE ParseApp(const std::string& app) {
 
 const char* YesNo(bool b) { return b ? "yes" : "no"; }
 
-// "MM/DD/YYYY", the order the weight history keeps its dates in.
-void ParseDate(const std::string& text, int& month, int& day, int& year) {
-  if (std::sscanf(text.c_str(), "%d/%d/%d", &month, &day, &year) != 3 || month < 1 || month > 12 ||
-      day < 1 || day > 31) {
-    Usage("'" + text + "' is not a date (MM/DD/YYYY)");
-  }
-}
-
 void ShowProfile(GPS_APP_PROG_TYPE type, const std::string& on) {
+  // A bad date fails before anything is shown.
+  const std::optional<Date> date = on.empty() ? std::nullopt : std::optional<Date>(ParseDate(on));
   USER_MAP_INFO& p = *GetUserMapInfo(type);  // read when the data root was set
   std::printf("File:            %s\n", p.GetProfilePathName().ToUtf8().c_str());
   std::printf("Name:            %s (%s)\n", p.name.ToUtf8().c_str(), p.male ? "male" : "female");
@@ -49,12 +44,12 @@ void ShowProfile(GPS_APP_PROG_TYPE type, const std::string& on) {
   std::printf("Templates:       mode %d, style %d\n", p.tempMode, p.tempStyle);
   std::printf("Lists:           %d markers, %d runners, %d weight entries\n", p.markers.GetCount(),
               p.runners.GetCount(), p.weightHeights.GetCount());
-  if (!on.empty()) {
-    int month = 0, day = 0, year = 0;
-    ParseDate(on, month, day, year);
+  if (date) {
     double weight = 0, height = 0;
-    if (!p.GetWeightHeight(month, day, year, weight, height)) Fail("the profile has no weight history");
-    std::printf("On %s:   %g kg, %g cm\n", on.c_str(), weight, height);
+    if (!p.GetWeightHeight(date->month, date->day, date->year, weight, height)) {
+      Fail("the profile has no weight history");
+    }
+    std::printf("On %s:   %g kg, %g cm\n", DateText(*date).c_str(), weight, height);
   }
 }
 
@@ -94,7 +89,7 @@ void AddProfileCommand(CLI::App& app) {
                              [application, on] { ShowProfile(ParseApp(*application), *on); });
   cmd->add_option("--app", *application, "trip, sport, tracker or where (default trip)")
       ->check(CLI::IsMember({"trip", "sport", "tracker", "where"}));
-  cmd->add_option("--on", *on, "a date")->option_text("MM/DD/YYYY");
+  cmd->add_option("--on", *on, "a date (YYYY-MM-DD)")->option_text("DATE");
 }
 
 void AddTemplatesCommand(CLI::App& app) {

@@ -1,34 +1,27 @@
-// The demo's export step: every trip of the demo tree written in every export format.
+// The demo's export step: each of the demo's trips written in every export format.
 #include <cstdio>
-#include <functional>
 #include <string>
+#include <vector>
 
 #include "cli.h"
 #include "navmisc/platform/files.h"
-#include "navmisc/records/trip_tree.h"
 
 namespace navmisc::cli {
 
-void DemoExports(const std::string& root) {
-  BLOG_TREE_NODE tree(nullptr);
-  if (tree.ReadInfo(0, nullptr) != 1) Fail("the demo's trip tree cannot be read for the exports");
+void DemoExports(const std::string& root, const std::vector<std::string>& trips) {
   const CString folder = PathJoin(CString::FromUtf8(root), L"exports");
   if (!MakeDir(folder)) Fail("cannot create " + folder.ToUtf8());
-
-  std::puts("\nExports (navmisc export TRIP --format F -o FILE):");
-  std::function<void(BLOG_TREE_NODE&)> exportNode = [&](BLOG_TREE_NODE& node) {
-    for (auto* trip : Items<BLOG_ITEM_INFO>(node.trips)) {
-      trip->ReadAllWaypoint(0);
-      for (const char* format : {"gpx", "kml", "kmz", "tcx", "csv"}) {
-        const std::string out = PathJoin(folder, trip->tripId + L"." + CString::FromUtf8(format)).ToUtf8();
-        // Metric CSV and running laps, as a sport user would export them.
-        ExportTrip(*trip, format, out, true, 1);
-        std::printf("  %-4s %s\n", format, out.c_str());
-      }
+  std::puts("\nExports (navmisc export TRIP -o FILE):");
+  for (const std::string& id : trips) {
+    for (const char* format : {"gpx", "kml", "kmz", "tcx", "csv"}) {
+      ExportRequest request;
+      request.trip = id;
+      request.out = PathJoin(folder, CString::FromUtf8(id + "." + format)).ToUtf8();
+      // Metric CSV, as a sport user would export it.
+      request.metric = request.out.ends_with(".csv");
+      for (const std::string& file : RunExport(request)) std::printf("  %-4s %s\n", format, file.c_str());
     }
-    for (auto* child : Items<BLOG_TREE_NODE>(node.children)) exportNode(*child);
-  };
-  exportNode(tree);
+  }
 }
 
 }  // namespace navmisc::cli

@@ -1,14 +1,17 @@
 // navmisc optimize, plot and place, run as a user runs them.
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <cstdlib>
 #include <string>
 
 #include "geo_reference.h"
+#include "navmisc/platform/datetime.h"
 #include "navmisc/platform/files.h"
 #include "navmisc/platform/format.h"
 #include "navmisc/records/trip.h"
 #include "testutil.h"
+#include "tool_test_support.h"
 
 namespace {
 
@@ -48,8 +51,7 @@ class GeoCommands : public ::testing::Test {
 
   // The program on the test's data root with `args`, standard error folded into the output.
   CommandResult RunTool(const std::string& args) {
-    return navmisc::testutil::RunCommand(std::string(NAVMISC_TOOL_PATH) + " --data-root " +
-                                         root.path().ToUtf8() + " " + args + " 2>&1");
+    return navmisc::testutil::RunTool("--data-root " + root.path().ToUtf8() + " " + args);
   }
 
   navmisc::testutil::TempDir root;
@@ -85,10 +87,18 @@ TEST_F(GeoCommands, OptimizeStoresTheLibrarysLevelsAndPlotDrawsThem) {
   ASSERT_EQ(plot.status, 0) << plot.out;
   const std::string text = navmisc::testutil::ReadFileBytes(CString::FromUtf8(svg));
   ASSERT_EQ(text.rfind("<?xml", 0), 0u);
+  EXPECT_NE(text.find("width=\"500\" height=\"500\""), std::string::npos);
+  const size_t points = text.find("<g id=\"points\">");
   size_t dots = 0;
-  for (size_t at = 0; (at = text.find("<circle cx", at)) != std::string::npos; ++at) ++dots;
-  EXPECT_EQ(dots, 3000u + 6u);  // every point, and the six dots of the key
-  for (const char* key : {"bad fix (-2)", "stop (-1)", "level 0", "never dropped", "#d62728", "#ff7f0e"}) {
+  for (size_t at = points; (at = text.find("<circle", at + 1)) < text.find("</g>", points);) ++dots;
+  // Every point but the bad fixes outside the frame.
+  const std::vector<int32_t> levels = Levels(*saved);
+  const size_t badFixes = static_cast<size_t>(std::count(levels.begin(), levels.end(), -2));
+  ASSERT_GT(badFixes, 0u);
+  EXPECT_LE(dots, 3000u);
+  EXPECT_GE(dots, 3000u - badFixes);
+  for (const char* key : {">Noisy  ", "bad fix (-2)", "stop (-1)", "level 0", "never dropped", "start", "end",
+                          "#d62728", "#ff7f0e"}) {
     EXPECT_NE(text.find(key), std::string::npos) << key;
   }
   if (HaveProgram("xmllint")) {
@@ -102,6 +112,9 @@ TEST_F(GeoCommands, PlaceAnswersByTimeOrPositionAndErrorsSayWhy) {
   const std::string lat = navmisc::FormatA("%.6f", fix->latitude);
   const std::string lon = navmisc::FormatA("%.6f", fix->longitude);
   const std::string place = "place GEOTRIP ";
+  // The fix's time in ISO form, in UTC and as two hours ahead of it.
+  const std::string iso = CString(TimeTToStdStringTime(fix->time)).ToUtf8();
+  const std::string plusTwo = CString(TimeTToStdStringTime(fix->time + 7200)).ToUtf8();
   const struct {
     std::string args;
     int status;
@@ -115,11 +128,16 @@ TEST_F(GeoCommands, PlaceAnswersByTimeOrPositionAndErrorsSayWhy) {
       {place + "--lat 10", 2, "--lat requires --lon"},
       {place + "--lat 0 --lon 0", 2, "0/0 stands for no position"},
       {place + "--time yesterday", 2, "is not a time"},
+      {place + "--time 2024-02-30T10:00:00", 2, "is not a time between 1970 and 2037"},
+      {place + "--time " + navmisc::FormatA("%sZ", iso.c_str()), 0, "latitude   " + lat},
+      {place + "--time " + navmisc::FormatA("%s+02:00", plusTwo.c_str()), 0, "latitude   " + lat},
+      {place + "--time '" + plusTwo.substr(0, 10) + " " + plusTwo.substr(11) + "+0200'", 0, "latitude   " + lat},
+      {"plot GEOTRIP -o x.png", 2, "the plot is an SVG picture: name it FILE.svg"},
       {"optimize NOPE", 1, "no trip 'NOPE'"},
       {"optimize", 2, "TRIP is required"},
       {"plot GEOTRIP", 2, "--output is required"},
       {"plot GEOTRIP -o /no/such/folder/x.svg", 1, "the folder /no/such/folder does not exist"},
-      {"plot GEOTRIP -o x.svg --size 3", 2, "--size: Value 3 not in range 16 to 100000"},
+      {"plot GEOTRIP -o x.svg --size 30", 2, "--size: Value 30 not in range 200 to 100000"},
       {"optimize --help", 0, "Usage: navmisc optimize [OPTIONS] TRIP"},
       {"place --help", 0, "Usage: navmisc place [OPTIONS] TRIP"},
   };

@@ -5,25 +5,21 @@
 
 #include "navmisc/records/user_profile.h"
 #include "testutil.h"
+#include "tool_test_support.h"
 
 namespace {
 
 using navmisc::testutil::CommandResult;
 using navmisc::testutil::DataRootScope;
-using navmisc::testutil::RunCommand;
+using navmisc::testutil::RunTool;
 using navmisc::testutil::ShellQuote;
 using navmisc::testutil::TempDir;
-
-// `ENV navmisc ARGS`, standard error joined to standard output.
-CommandResult Tool(const std::string& env, const std::string& args) {
-  return RunCommand(env + " " + ShellQuote(NAVMISC_TOOL_PATH) + " " + args + " 2>&1 </dev/null");
-}
 
 bool Shows(const CommandResult& r, const std::string& text) { return r.out.find(text) != std::string::npos; }
 
 TEST(InfoCommands, TimeZoneFollowsTZ) {
   // The zone rules themselves are the library's; here the command must honour TZ and say both.
-  const CommandResult r = Tool("TZ=Asia/Taipei", "timezone");
+  const CommandResult r = RunTool("timezone", "TZ=Asia/Taipei");
   EXPECT_EQ(r.status, 0) << r.out;
   EXPECT_TRUE(Shows(r, "Offset from UTC: 28800 s (+8.00 h)\nDaylight saving: no")) << r.out;
 }
@@ -39,16 +35,26 @@ TEST(InfoCommands, ProfileShowsWhatTheLibraryWrote) {
     sport.SetWeightHeight(6, 1, 2024, 61, 168);
     ASSERT_TRUE(sport.WriteInfo());
   }
-  const CommandResult r = Tool("", "--data-root " + ShellQuote(root.path().ToUtf8()) +
-                                       " profile --app sport --on 05/31/2024");
-  EXPECT_EQ(r.status, 0) << r.out;
-  EXPECT_TRUE(Shows(r, "Zoë (female)")) << r.out;
-  EXPECT_TRUE(Shows(r, "On 05/31/2024:   58.5 kg, 168 cm")) << r.out;
+  const std::string profile = "--data-root " + ShellQuote(root.path().ToUtf8()) + " profile --app sport --on ";
+  // The ISO date and the older month-first form; the answer always in ISO form.
+  for (const char* date : {"2024-05-31", "05/31/2024"}) {
+    const CommandResult r = RunTool(profile + date);
+    EXPECT_EQ(r.status, 0) << r.out;
+    EXPECT_TRUE(Shows(r, "Zoë (female)")) << r.out;
+    EXPECT_TRUE(Shows(r, "On 2024-05-31:   58.5 kg, 168 cm")) << r.out;
+  }
+  // A bad date fails before anything is shown.
+  for (const char* date : {"yesterday", "2024-02-30", "31/05/2024", "2024-5-31"}) {
+    const CommandResult r = RunTool(profile + date);
+    EXPECT_EQ(r.status, 2) << date << "\n" << r.out;
+    EXPECT_TRUE(Shows(r, "is not a date")) << date << "\n" << r.out;
+    EXPECT_FALSE(Shows(r, "File:")) << date << "\n" << r.out;
+  }
 }
 
 TEST(InfoCommands, TemplatesComeFromTheCatalogueBesideTheProgram) {
   // A translated name where the catalogue has one, the default text where it has not.
-  const CommandResult r = Tool("", "templates --language fr");
+  const CommandResult r = RunTool("templates --language fr");
   ASSERT_EQ(r.status, 0) << r.out;
   EXPECT_TRUE(Shows(r, "Journal classique")) << r.out;
   EXPECT_TRUE(Shows(r, "Panorama")) << r.out;

@@ -58,6 +58,8 @@ int main(int argc, char** argv) {
   navmisc::cli::AddPlotCommand(app);
   navmisc::cli::AddPlaceCommand(app);
   navmisc::cli::AddExportCommand(app);
+  navmisc::cli::AddPhotosCommand(app);
+  navmisc::cli::AddGeotagCommand(app);
   navmisc::cli::AddProfileCommand(app);
   navmisc::cli::AddTemplatesCommand(app);
   navmisc::cli::AddTimeZoneCommand(app);

@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <cmath>
 #include <random>
+#include <vector>
 
 #include "navmisc/records/trip.h"
 
@@ -45,15 +46,29 @@ TRACK_ITEM_INFO* NewTrack(BLOG_ITEM_INFO& trip, const wchar_t* name, uint32_t co
   return t;
 }
 
-// Moves along with gentle turns for `seconds`, one point every `interval` seconds.
+// Moves along with gentle turns for `seconds`, one point every `interval` seconds. The places
+// passed go to `route` when it is given.
 void Travel(TRACK_ITEM_INFO& t, Walker& w, int32_t& time, int seconds, int interval, double speed,
-            double& alt, std::mt19937& rng, double noise = 2.0) {
+            double& alt, std::mt19937& rng, double noise = 2.0, std::vector<Walker>* route = nullptr) {
   std::normal_distribution<double> turn(0.0, 4.0);
   std::normal_distribution<double> climb(0.0, 0.3);
   for (int s = 0; s < seconds; s += interval) {
     w.heading += turn(rng);
     w.Step(speed * interval);
     alt += climb(rng);
+    time += interval;
+    t.points.AddTail(Point(time, w, alt, speed, rng, noise));
+    if (route) route->push_back(w);
+  }
+}
+
+// Goes back along `route` to where it began, one point every `interval` seconds, and leaves `w`
+// there.
+void Retrace(TRACK_ITEM_INFO& t, Walker& w, const std::vector<Walker>& route, int32_t& time, int interval,
+             double speed, double alt, std::mt19937& rng, double noise) {
+  for (auto place = route.rbegin(); place != route.rend(); ++place) {
+    w = *place;
+    w.heading += 180;
     time += interval;
     t.points.AddTail(Point(time, w, alt, speed, rng, noise));
   }
@@ -123,14 +138,18 @@ void AddJourney(BLOG_ITEM_INFO& trip, uint32_t seed, int32_t start) {
   double alt = 35;
   int32_t time = start;
   TRACK_ITEM_INFO* out = NewTrack(trip, L"Drive out", 0xFF0000);
-  Travel(*out, w, time, 5400, 5, 25.0, alt, rng, 5.0);
+  std::vector<Walker> road;
+  Travel(*out, w, time, 5400, 5, 25.0, alt, rng, 5.0, &road);
   time += 900;
-  TRACK_ITEM_INFO* walk = NewTrack(trip, L"Old town walk", 0x00FFFF);
-  Travel(*walk, w, time, 3600, 2, 1.4, alt, rng, 3.0);
+  // A stroll out and back to the car.
+  TRACK_ITEM_INFO* walk = NewTrack(trip, L"Old town walk", 0x00A5FF);
+  std::vector<Walker> lanes;
+  Travel(*walk, w, time, 1800, 2, 1.4, alt, rng, 3.0, &lanes);
+  Retrace(*walk, w, lanes, time, 2, 1.4, alt, rng, 3.0);
   time += 1800;
+  // The same road home, ending where the day began.
   TRACK_ITEM_INFO* back = NewTrack(trip, L"Drive back", 0xFF00FF);
-  w.heading += 180;
-  Travel(*back, w, time, 5400, 5, 24.0, alt, rng, 5.0);
+  Retrace(*back, w, road, time, 5, 25.0, alt, rng, 5.0);
 }
 
 void AddStopSpikeGap(BLOG_ITEM_INFO& trip, uint32_t seed, int32_t start) {

@@ -13,7 +13,8 @@ namespace navmisc::synthetic {
 void AddRun(BLOG_ITEM_INFO& trip, uint32_t seed, int32_t start);
 // A day of a tracker: a point a minute, cell-tower fixes and two help points (tracker trips).
 void AddTrackerDay(BLOG_ITEM_INFO& trip, uint32_t seed, int32_t start);
-// A journey of several tracks: a drive, a walk in town, a drive back.
+// A journey of several tracks: a drive, a walk in town and back to the car, the same road home
+// (it ends where it began).
 void AddJourney(BLOG_ITEM_INFO& trip, uint32_t seed, int32_t start);
 // One walk with a long stop, a single wild fix (a spike) and a two-hour gap.
 void AddStopSpikeGap(BLOG_ITEM_INFO& trip, uint32_t seed, int32_t start);

@@ -1,5 +1,7 @@
 #include "navmisc/export/detail/export_common.h"
 
+#include <cstring>
+
 #include "navmisc/platform/datetime.h"
 #include "navmisc/platform/files.h"
 #include "navmisc/platform/textconv.h"
@@ -30,6 +32,16 @@ void DocumentWriter::Remove() {
   if (!file_.IsOpen()) return;
   file_.Close();
   DeleteFileRetry(path_);
+}
+
+int Stopped(DocumentWriter& w, ExportControl& control) {
+  w.Remove();
+  control.error = "stopped";
+  return 0;
+}
+
+long long PointCount(const TRACK_ITEM_INFO& track, bool fromFile) {
+  return fromFile ? TrackPointReader::Count(track) : track.points.GetCount();
 }
 
 std::string Utf8Field(std::wstring_view text, size_t bufferSize) {
@@ -65,6 +77,11 @@ void PutTwo(char* p, int v) {
 }  // namespace
 
 void TimeTextZWriter::Append(std::string& out, int32_t time) {
+  char text[64];
+  out.append(text, static_cast<size_t>(Write(text, time) - text));
+}
+
+char* TimeTextZWriter::Write(char* at, int32_t time) {
   const int64_t day = FloorDiv(time, 86400);
   const int sod = static_cast<int>(time - day * 86400);
   char clock[9];
@@ -75,12 +92,11 @@ void TimeTextZWriter::Append(std::string& out, int32_t time) {
   PutTwo(clock + 6, sod % 60);
   clock[8] = 'Z';
   if (day == day_) {
-    out.append(date_, sizeof date_);
-    out.append(clock, sizeof clock);
-    return;
+    std::memcpy(at, date_, sizeof date_);
+    std::memcpy(at + sizeof date_, clock, sizeof clock);
+    return at + sizeof date_ + sizeof clock;
   }
-  std::string text = StdTimeTextZ(time);
-  out += text;
+  const std::string text = StdTimeTextZ(time).substr(0, 63);
   // Reuse the date part only when the platform text has exactly the expected shape and clock,
   // so that the fast path can never disagree with it.
   if (text.size() == 20 && text[10] == 'T' && text.compare(11, 9, clock, 9) == 0) {
@@ -89,6 +105,7 @@ void TimeTextZWriter::Append(std::string& out, int32_t time) {
   } else {
     day_ = INT64_MIN;
   }
+  return at + text.copy(at, text.size());
 }
 
 }  // namespace navmisc::exportdetail

@@ -8,8 +8,11 @@
 #include <string>
 #include <string_view>
 
+#include "navmisc/export/export_control.h"
 #include "navmisc/platform/cstring.h"
 #include "navmisc/platform/output_file.h"
+#include "navmisc/records/track.h"
+#include "navmisc/records/track_point_reader.h"
 
 namespace navmisc::exportdetail {
 
@@ -17,8 +20,8 @@ namespace navmisc::exportdetail {
 inline constexpr std::string_view kMakerAddress = "https://navmisc.example.org";
 
 // A document on its way to its target. Text is collected in memory and handed to the file in
-// large pieces; write errors after opening are not reported (the exporters' callers learn only
-// whether the target could be opened).
+// large pieces. Write errors do not stop the document (the exporters' results do not depend on
+// them); error() keeps the first for callers that ask.
 class DocumentWriter {
  public:
   DocumentWriter() { text_.reserve(kFlushAt + 64 * 1024); }
@@ -38,6 +41,9 @@ class DocumentWriter {
   void Close();
   // Closes and deletes the file: an export that was stopped leaves no half document behind.
   void Remove();
+  // Why the target could not be opened or a write or the close failed, in the system's words;
+  // empty when nothing failed.
+  const std::string& error() const { return file_.error(); }
 
  private:
   static constexpr size_t kFlushAt = 1 << 20;
@@ -59,6 +65,33 @@ struct Progress {
   }
 };
 
+// Ends an export that the caller stopped: deletes what was written and returns 0.
+int Stopped(DocumentWriter& w, ExportControl& control);
+
+// Calls `visit(const WAYPOINT_ITEM_INFO*)` for every entry of `track`'s point list (nulls
+// included) in stored order or, with `fromFile`, for every point of its point file, read one at a
+// time into one record that the next point overwrites. Stops and returns false when `visit`
+// does.
+template <class Visit>
+bool ForEachPoint(const TRACK_ITEM_INFO& track, bool fromFile, Visit&& visit) {
+  if (!fromFile) {
+    for (const WAYPOINT_ITEM_INFO* p : Items<WAYPOINT_ITEM_INFO>(track.points)) {
+      if (!visit(p)) return false;
+    }
+    return true;
+  }
+  TrackPointReader reader;
+  if (!reader.Open(track)) return true;
+  WAYPOINT_ITEM_INFO p;
+  while (reader.Next(p)) {
+    if (!visit(static_cast<const WAYPOINT_ITEM_INFO*>(&p))) return false;
+  }
+  return true;
+}
+
+// The number of entries ForEachPoint visits.
+long long PointCount(const TRACK_ITEM_INFO& track, bool fromFile);
+
 // The UTF-8 form of `text` as it fits a C buffer of `bufferSize` bytes, terminator included.
 // A longer text is cut after the last whole character that fits (never inside a character);
 // text that is not valid Unicode (a lone surrogate) gives an empty result.
@@ -74,6 +107,8 @@ std::string StdTimeTextZ(int32_t time);
 class TimeTextZWriter {
  public:
   void Append(std::string& out, int32_t time);
+  // The same text written at `at` (room for 64 bytes); returns the end of it.
+  char* Write(char* at, int32_t time);
 
  private:
   int64_t day_ = INT64_MIN;  // the UTC day whose date part is cached, or none
