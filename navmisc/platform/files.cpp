@@ -371,3 +371,11 @@ bool IsPlainPathComponent(const wchar_t* name) {
   // A NUL cannot occur inside the C string itself; the separator is the only danger left.
   return n.find(L'/') == std::wstring_view::npos;
 }
+
+CString AbsolutePath(const wchar_t* path) {
+  const std::string native = navmisc::NativePath(path);
+  if (native.empty() || native[0] == '/') return path;
+  char buf[4096];
+  if (!::getcwd(buf, sizeof buf)) return path;
+  return PathJoin(CString::FromUtf8(buf), path);
+}

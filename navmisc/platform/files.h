@@ -53,6 +53,9 @@ CString PathExtension(const wchar_t* path);  // "a/b/c.txt" -> "txt"; none -> ""
 // A folder or file name taken from a file may be used only when it is one plain path component:
 // not empty, not "." or "..", no "/" and no NUL.
 bool IsPlainPathComponent(const wchar_t* name);
+// `path` made absolute against the current folder (nothing resolved, nothing tested); `path`
+// itself when it is absolute or the current folder is unknown.
+CString AbsolutePath(const wchar_t* path);
 
 namespace navmisc {
 // The narrow (UTF-8) form of a path, for the system calls.

@@ -1,6 +1,7 @@
 // Shared pieces of the navmisc command-line tool.
 #pragma once
 
+#include <chrono>
 #include <functional>
 #include <memory>
 #include <string>
@@ -42,6 +43,25 @@ std::string DataRoot();
 // Finds and reads the trip whose id is `id`, in any application folder of the data root.
 std::unique_ptr<BLOG_ITEM_INFO> OpenTrip(const std::string& id);
 
+// A progress line on stderr: drawn only when stderr is a terminal, and only once the work has
+// taken more than a moment.
+class ProgressBar {
+ public:
+  explicit ProgressBar(std::string label);
+  // `done` of `total` as a bar and a percentage, or with `total` 0 a spinner and the time
+  // taken; `note` follows ("1200 points"). Redrawn at most ten times a second.
+  void Show(long long done, long long total, const std::string& note = "");
+  // Ends the line with "LABEL: RESULT" when anything was drawn.
+  void Finish(const std::string& result);
+
+ private:
+  std::string label_;
+  std::chrono::steady_clock::time_point started_;
+  std::chrono::steady_clock::time_point last_;
+  bool draw_;
+  bool drawn_ = false;
+};
+
 // Runs `work` on a worker thread while a progress bar follows `counter` up to `total` on stderr
 // (only when stderr is a terminal). Ctrl-C clears `keepGoing`, so the work can stop cleanly;
 // returns false when it was interrupted that way.
@@ -67,6 +87,8 @@ void AddTemplatesCommand(CLI::App& app);
 void AddTimeZoneCommand(CLI::App& app);
 // `navmisc channel status`: the data-control channel and its process.
 void AddChannelCommand(CLI::App& app);
+// `navmisc import FILE...`: track files in as trips, through the data-control process.
+void AddImportCommand(CLI::App& app);
 // `navmisc help [COMMAND]`: the program's or a command's help.
 void AddHelpCommand(CLI::App& app);
 

@@ -57,6 +57,7 @@ int main(int argc, char** argv) {
   navmisc::cli::AddTemplatesCommand(app);
   navmisc::cli::AddTimeZoneCommand(app);
   navmisc::cli::AddChannelCommand(app);
+  navmisc::cli::AddImportCommand(app);
   navmisc::cli::AddHelpCommand(app);
 
   try {
