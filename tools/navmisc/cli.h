@@ -5,8 +5,10 @@
 #include <functional>
 #include <memory>
 #include <string>
+#include <vector>
 
 #include "navmisc/platform/cstring.h"
+#include "navmisc/platform/datetime.h"
 #include "navmisc/platform/types.h"
 
 class BLOG_ITEM_INFO;
@@ -89,6 +91,22 @@ void AddTimeZoneCommand(CLI::App& app);
 void AddChannelCommand(CLI::App& app);
 // `navmisc import FILE...`: track files in as trips, through the data-control process.
 void AddImportCommand(CLI::App& app);
+// What `navmisc import` asks of the process for every file.
+struct ImportRequest {
+  GPS_APP_PROG_TYPE app = GPS_APP_TRIP;
+  std::string format;    // empty: recognised
+  std::string name;      // empty: from the file
+  COleDateTime from, to;  // zero: open
+  int32_t timeZone = 0;  // seconds east of UTC of the files' times
+  bool verbose = false;  // print every progress block
+};
+// Imports each file as a trip through the data-control process, started for the time of the
+// call: a line per trip on stdout, a line per failure on stderr, a progress bar meanwhile.
+// Ctrl-C cancels the running import and skips the rest (*cancelled is set). Returns the number
+// of files that failed.
+int ImportFiles(const std::vector<std::string>& files, const ImportRequest& request, bool* cancelled);
+// The demo's import step: exported documents of the demo's trips come back in as trips.
+void DemoImport(const std::string& root);
 // `navmisc help [COMMAND]`: the program's or a command's help.
 void AddHelpCommand(CLI::App& app);
 

@@ -97,6 +97,7 @@ void RunDemo(std::string root) {
   std::printf("  (tracker day: %ld cell fixes, %ld help points)\n", cells, help);
   DemoGeometry();
   DemoExports(root);
+  DemoImport(root);
   std::printf("\nTry: navmisc --data-root %s trips\n", root.c_str());
 }
 
@@ -107,7 +108,8 @@ void AddDemoCommand(CLI::App& app) {
   CLI::App* cmd = AddCommand(app, "demo", "build a sample data root and show what the library does with it",
                              "Builds a sample data root in DIR (a fresh temporary folder without it): the four\n"
                              "user profiles, the suite settings and a tree of synthetic trips, then reads them\n"
-                             "back, lists, optimises, draws and exports them.",
+                             "back, lists, optimises, draws and exports them, and imports two of the exports\n"
+                             "back through the data-control process.",
                              [folder] { RunDemo(*folder); }, false);
   cmd->add_option("DIR", *folder, "the folder to fill (created when missing)");
 }

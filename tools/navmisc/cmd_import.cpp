@@ -119,30 +119,41 @@ std::string Summary(const CDataControlCmdBlkFile& reply, const std::string& key)
 }
 
 void RunImport(const ImportArgs& args) {
-  GPS_APP_PROG_TYPE app;
-  if (args.app == "trip") app = GPS_APP_TRIP;
-  else if (args.app == "sport") app = GPS_APP_SPORT;
-  else if (args.app == "tracker") app = GPS_APP_TRACKER;
+  ImportRequest request;
+  if (args.app == "trip") request.app = GPS_APP_TRIP;
+  else if (args.app == "sport") request.app = GPS_APP_SPORT;
+  else if (args.app == "tracker") request.app = GPS_APP_TRACKER;
   else Usage("--app must be trip, sport or tracker");
   navmisc::import::FileFormat format;
   if (!navmisc::import::ParseFormatName(args.format, format)) Usage("'" + args.format + "' is not a format name");
-  COleDateTime from, to;  // zero: open
-  if (!args.from.empty()) from = CovertTimeTToOleDateTime(ParseTime(args.from));
-  if (!args.to.empty()) to = CovertTimeTToOleDateTime(ParseTime(args.to));
-  const int32_t zone = ParseZone(args.timeZone);
+  request.format = args.format;
+  request.name = args.name;
+  if (!args.from.empty()) request.from = CovertTimeTToOleDateTime(ParseTime(args.from));
+  if (!args.to.empty()) request.to = CovertTimeTToOleDateTime(ParseTime(args.to));
+  request.timeZone = ParseZone(args.timeZone);
+  request.verbose = args.verbose;
+  bool cancelled = false;
+  const int failed = ImportFiles(args.files, request, &cancelled);
+  if (cancelled) Fail("interrupted", 130);
+  if (failed) Fail(std::to_string(failed) + " of " + std::to_string(args.files.size()) + " files not imported");
+}
 
+}  // namespace
+
+int ImportFiles(const std::vector<std::string>& files, const ImportRequest& request, bool* cancelledOut) {
   TerminalDialogView view;
-  ImportWindow window(view, GetUserMapInfo(GPS_APP_TRIP)->localize, args.verbose);
+  ImportWindow window(view, GetUserMapInfo(GPS_APP_TRIP)->localize, request.verbose);
   ChannelSession channel(window);
   InterruptWatch interrupt;
   int failed = 0;
   bool cancelled = false;
-  for (const std::string& file : args.files) {
+  for (const std::string& file : files) {
     if (cancelled) break;
     window.Reset();
     // The process may work in another folder than this program: it gets the full path.
-    DC_FILE_ImportFile(AbsolutePath(CString::FromUtf8(file)), app, CString::FromUtf8(args.format), from, to, zone,
-                       args.name.empty() ? nullptr : CString::FromUtf8(args.name).c_str());
+    DC_FILE_ImportFile(AbsolutePath(CString::FromUtf8(file)), request.app, CString::FromUtf8(request.format),
+                       request.from, request.to, request.timeZone,
+                       request.name.empty() ? nullptr : CString::FromUtf8(request.name).c_str());
     ProgressBar bar("importing " + PathFileName(CString::FromUtf8(file)).ToUtf8());
     bool asked = false, lost = false;
     PumpUntil(
@@ -183,11 +194,9 @@ void RunImport(const ImportArgs& args) {
                 Summary(reply, "markers").c_str(), Summary(reply, "format").c_str());
     std::fflush(stdout);
   }
-  if (cancelled) Fail("interrupted", 130);
-  if (failed) Fail(std::to_string(failed) + " of " + std::to_string(args.files.size()) + " files not imported");
+  if (cancelledOut) *cancelledOut = cancelled;
+  return failed;
 }
-
-}  // namespace
 
 void AddImportCommand(CLI::App& app) {
   auto args = std::make_shared<ImportArgs>();
