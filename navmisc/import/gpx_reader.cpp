@@ -81,7 +81,7 @@ class GpxReader final : public XmlTrackReader {
   Field FieldOf(El el, El parent) const;
   void BeginPoint(El kind, const char** attributes);
   void EndPoint();
-  void Store(Field field, std::string_view text);
+  void StoreField(int field, std::string_view text) override;
   bool OpenPendingTrack();
   void SendDocument();
 
@@ -99,8 +99,6 @@ class GpxReader final : public XmlTrackReader {
   ImportTrack track_;
   std::string doc_name_, doc_desc_;
   bool doc_sent_ = false;
-  Field field_ = Field::kNone;
-  size_t field_depth_ = 0;
 };
 
 Field GpxReader::FieldOf(El el, El parent) const {
@@ -140,7 +138,7 @@ void GpxReader::StartElement(std::string_view name, const char** attributes) {
     }
     return;
   }
-  if (field_ != Field::kNone) return;  // an element inside a text we collect
+  if (Capturing()) return;  // an element inside a text we collect
   switch (el) {
     case El::kTrk:
     case El::kRte:
@@ -172,15 +170,9 @@ void GpxReader::StartElement(std::string_view name, const char** attributes) {
       if (point_kind_ != El::kOther && stack_.size() == point_depth_ + 2)
         extensions_depth_ = stack_.size();
       break;
-    default: {
-      const Field f = FieldOf(el, parent);
-      if (f != Field::kNone) {
-        field_ = f;
-        field_depth_ = stack_.size();
-        Capture();
-      }
+    default:
+      if (const Field f = FieldOf(el, parent); f != Field::kNone) CaptureField(static_cast<int>(f), stack_.size());
       break;
-    }
   }
 }
 
@@ -188,12 +180,7 @@ void GpxReader::EndElement(std::string_view) {
   if (stack_.empty()) return;
   const El el = stack_.back();
   const size_t depth = stack_.size();
-  if (field_ != Field::kNone) {
-    if (depth == field_depth_) {
-      const Field f = field_;
-      field_ = Field::kNone;
-      Store(f, TakeText());
-    }
+  if (EndOfField(depth)) {
     stack_.pop_back();
     return;
   }
@@ -237,9 +224,9 @@ void GpxReader::EndPoint() {
   EmitMarker(marker_);
 }
 
-void GpxReader::Store(Field field, std::string_view text) {
+void GpxReader::StoreField(int field, std::string_view text) {
   double v = 0;
-  switch (field) {
+  switch (static_cast<Field>(field)) {
     case Field::kNone: break;
     case Field::kDocName: doc_name_ = text; break;
     case Field::kDocDesc: doc_desc_ = text; break;

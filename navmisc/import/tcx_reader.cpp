@@ -91,7 +91,7 @@ class TcxReader final : public XmlTrackReader {
     return stack_.size() > fromTop ? stack_[stack_.size() - 1 - fromTop] : El::kOther;
   }
   Field FieldOf(El el) const;
-  void Store(Field field, std::string_view text);
+  void StoreField(int field, std::string_view text) override;
   void EndPoint();
 
   std::vector<El> stack_;
@@ -108,8 +108,6 @@ class TcxReader final : public XmlTrackReader {
   bool track_sent_ = false;
   ImportTrack track_;
   int lap_number_ = 0;  // within the current activity
-  Field field_ = Field::kNone;
-  size_t field_depth_ = 0;
 };
 
 Field TcxReader::FieldOf(El el) const {
@@ -152,7 +150,7 @@ void TcxReader::StartElement(std::string_view name, const char** /*attributes*/)
     }
     return;
   }
-  if (field_ != Field::kNone) return;
+  if (Capturing()) return;
   const El parent = At(1);
   switch (el) {
     case El::kActivity:
@@ -190,27 +188,16 @@ void TcxReader::StartElement(std::string_view name, const char** /*attributes*/)
     case El::kExtensions:
       if (point_depth_ != 0 && stack_.size() == point_depth_ + 1) extensions_depth_ = stack_.size();
       break;
-    default: {
-      const Field f = FieldOf(el);
-      if (f != Field::kNone) {
-        field_ = f;
-        field_depth_ = stack_.size();
-        Capture();
-      }
+    default:
+      if (const Field f = FieldOf(el); f != Field::kNone) CaptureField(static_cast<int>(f), stack_.size());
       break;
-    }
   }
 }
 
 void TcxReader::EndElement(std::string_view) {
   if (stack_.empty()) return;
   const size_t depth = stack_.size();
-  if (field_ != Field::kNone) {
-    if (depth == field_depth_) {
-      const Field f = field_;
-      field_ = Field::kNone;
-      Store(f, TakeText());
-    }
+  if (EndOfField(depth)) {
     stack_.pop_back();
     return;
   }
@@ -246,9 +233,9 @@ void TcxReader::EndPoint() {
   EmitMarker(marker_);
 }
 
-void TcxReader::Store(Field field, std::string_view text) {
+void TcxReader::StoreField(int field, std::string_view text) {
   double v = 0;
-  switch (field) {
+  switch (static_cast<Field>(field)) {
     case Field::kNone: break;
     case Field::kTime: ReadTime(text, "Time", point_.time); break;
     case Field::kLatitude:

@@ -3,34 +3,25 @@
 #include <gtest/gtest.h>
 
 #include <cstdio>
-#include <memory>
 #include <string>
 #include <thread>
 #include <vector>
 
-#include "navmisc/datactrl/block_codec.h"
 #include "navmisc/import/import_errors.h"
-#include "navmisc/datactrl/request_queue.h"
-#include "navmisc/platform/data_root.h"
 #include "navmisc/platform/files.h"
 #include "navmisc/platform/shared_globals.h"
+#include "queues_fixture.h"
 #include "server.h"
 #include "testutil.h"
 
 namespace {
 
-using navmisc::testutil::TempDir;
 using navmisc::testutil::WriteFileBytes;
 
-class FileImport : public ::testing::Test {
+class FileImport : public Queues {
  protected:
   void SetUp() override {
-    ASSERT_TRUE(navmisc::UseDataRoot(root_.path()));
-    requests_ = std::make_unique<CxSysMsgQueue>(navmisc::datactrl::kRequestQueueName, 256,
-                                                navmisc::kSysMsgOpenOrCreate);
-    replies_ = std::make_unique<CxSysMsgQueue>(navmisc::datactrl::kReplyQueueName, 1024,
-                                               navmisc::kSysMsgOpenOrCreate);
-    ASSERT_TRUE(requests_->IsValid() && replies_->IsValid());
+    Queues::SetUp();
     std::string doc = "<gpx><metadata><name>Long walk</name></metadata><trk><trkseg>";
     char point[160];
     for (int i = 0; i < 5000; ++i) {
@@ -40,14 +31,6 @@ class FileImport : public ::testing::Test {
       doc += point;
     }
     WriteFileBytes(file_, doc + "</trkseg></trk></gpx>");
-  }
-  void TearDown() override { navmisc::RemovePerRootObjects(root_.path()); }
-
-  template <class Block>
-  void Request(const Block& block) {
-    CPackageBlk p;
-    navmisc::datactrl::PackBlock(block, p);
-    ASSERT_TRUE(requests_->Send(p.GetPackagePtr(), p.GetPackageSize()));
   }
   CDataControlCmdBlkFile ImportRequest() {
     CDataControlCmdBlkFile b;
@@ -84,9 +67,7 @@ class FileImport : public ::testing::Test {
     return n;
   }
 
-  TempDir root_;
   CString file_ = root_ / L"walk.gpx";
-  std::unique_ptr<CxSysMsgQueue> requests_, replies_;
 };
 
 TEST_F(FileImport, RepliesWithTheTripAfterProgressPerThousandPoints) {

@@ -37,7 +37,17 @@ bool XmlTrackReader::Finish() {
 }
 
 void XmlTrackReader::Text(std::string_view text) {
-  if (capturing_) AppendCapped(text_, text, kMaxText);
+  if (Capturing()) AppendCapped(text_, text, kMaxText);
+}
+
+bool XmlTrackReader::EndOfField(size_t depth) {
+  if (!Capturing()) return false;
+  if (depth == fieldDepth_) {
+    const int field = field_;
+    field_ = kNoField;
+    StoreField(field, text_);
+  }
+  return true;
 }
 
 void XmlTrackReader::StopAt(int32_t code, const std::string& message) {

@@ -20,17 +20,19 @@ class XmlTrackReader : public TrackReader, protected XmlHandler {
   // Called by Finish after a well-formed end, before the status is settled.
   virtual void AtEnd() {}
 
-  // The text of the current element is collected from now until its end (at most kMaxText
-  // bytes; the rest is dropped).
-  void Capture() {
-    capturing_ = true;
+  // The text of the element that starts at `depth` (the element stack's size with it) is
+  // collected for `field`, a number of the reader's own, until that element ends (at most
+  // kMaxText bytes; the rest is dropped). Elements inside it add their text.
+  void CaptureField(int field, size_t depth) {
+    field_ = field;
+    fieldDepth_ = depth;
     text_.clear();
   }
-  // The collected text, capture ended.
-  std::string_view TakeText() {
-    capturing_ = false;
-    return text_;
-  }
+  bool Capturing() const { return field_ != kNoField; }
+  // To be called at the end of every element, at `depth`: false when no field is being
+  // collected. Otherwise true; when the field's element ends here, its text goes to StoreField.
+  bool EndOfField(size_t depth);
+  virtual void StoreField(int field, std::string_view text) = 0;
   void Text(std::string_view text) override;
 
   // Checked readings of the collected text; on failure the document stops with
@@ -56,9 +58,11 @@ class XmlTrackReader : public TrackReader, protected XmlHandler {
   ImportSink& sink_;
 
  private:
+  static constexpr int kNoField = -1;
   XmlStream xml_;
   std::string text_;
-  bool capturing_ = false;
+  int field_ = kNoField;
+  size_t fieldDepth_ = 0;
 };
 
 }  // namespace navmisc::import::detail
