@@ -18,49 +18,15 @@ enum class El : uint8_t {
   kEle, kTime, kSpeed, kCourse, kSym, kExtensions, kHeartRate, kCadence,
 };
 
-El Classify(std::string_view n) {
-  switch (n.size()) {
-    case 2:
-      if (n == "hr") return El::kHeartRate;
-      break;
-    case 3:
-      if (n == "gpx") return El::kGpx;
-      if (n == "trk") return El::kTrk;
-      if (n == "rte") return El::kRte;
-      if (n == "wpt") return El::kWpt;
-      if (n == "ele") return El::kEle;
-      if (n == "sym") return El::kSym;
-      if (n == "cmt") return El::kCmt;
-      if (n == "cad") return El::kCadence;
-      break;
-    case 4:
-      if (n == "name") return El::kName;
-      if (n == "desc") return El::kDesc;
-      if (n == "time") return El::kTime;
-      break;
-    case 5:
-      if (n == "trkpt") return El::kTrkpt;
-      if (n == "rtept") return El::kRtept;
-      if (n == "speed") return El::kSpeed;
-      break;
-    case 6:
-      if (n == "trkseg") return El::kTrkseg;
-      if (n == "course") return El::kCourse;
-      break;
-    case 7:
-      if (n == "cadence") return El::kCadence;
-      break;
-    case 8:
-      if (n == "metadata") return El::kMetadata;
-      break;
-    case 9:
-      if (n == "heartrate") return El::kHeartRate;
-      break;
-    case 10:
-      if (n == "extensions") return El::kExtensions;
-      break;
-  }
-  return El::kOther;
+El Classify(std::string_view name) {
+  static constexpr std::pair<std::string_view, El> kNames[] = {
+      {"trkpt", El::kTrkpt}, {"ele", El::kEle}, {"time", El::kTime}, {"extensions", El::kExtensions},
+      {"hr", El::kHeartRate}, {"cad", El::kCadence}, {"speed", El::kSpeed}, {"course", El::kCourse},
+      {"rtept", El::kRtept}, {"wpt", El::kWpt}, {"name", El::kName}, {"desc", El::kDesc},
+      {"cmt", El::kCmt}, {"sym", El::kSym}, {"trkseg", El::kTrkseg}, {"trk", El::kTrk},
+      {"rte", El::kRte}, {"metadata", El::kMetadata}, {"gpx", El::kGpx},
+      {"heartrate", El::kHeartRate}, {"cadence", El::kCadence}};
+  return detail::ElementOf(name, kNames, El::kOther);
 }
 
 // What the captured text of an element becomes.
@@ -216,12 +182,7 @@ void GpxReader::EndPoint() {
     EmitPoint(point_);
     return;
   }
-  marker_.latitude = point_.latitude;
-  marker_.longitude = point_.longitude;
-  marker_.altitude = point_.altitude;
-  marker_.hasAltitude = point_.hasAltitude;
-  marker_.time = point_.time;
-  EmitMarker(marker_);
+  EmitMarker(marker_, point_);
 }
 
 void GpxReader::StoreField(int field, std::string_view text) {

@@ -19,59 +19,17 @@ enum class El : uint8_t {
   kSpeed, kRunCadence, kName, kNotes, kPointType,
 };
 
-El Classify(std::string_view n) {
-  switch (n.size()) {
-    case 3:
-      if (n == "Lap") return El::kLap;
-      break;
-    case 4:
-      if (n == "Time") return El::kTime;
-      if (n == "Name") return El::kName;
-      break;
-    case 5:
-      if (n == "Track") return El::kTrack;
-      if (n == "Value") return El::kValue;
-      if (n == "Speed") return El::kSpeed;
-      if (n == "Notes") return El::kNotes;
-      break;
-    case 6:
-      if (n == "Course") return El::kCourse;
-      break;
-    case 7:
-      if (n == "Cadence") return El::kCadence;
-      break;
-    case 8:
-      if (n == "Activity") return El::kActivity;
-      if (n == "Position") return El::kPosition;
-      break;
-    case 9:
-      if (n == "PointType") return El::kPointType;
-      break;
-    case 10:
-      if (n == "Trackpoint") return El::kTrackpoint;
-      if (n == "Extensions") return El::kExtensions;
-      if (n == "RunCadence") return El::kRunCadence;
-      break;
-    case 11:
-      if (n == "CoursePoint") return El::kCoursePoint;
-      break;
-    case 12:
-      if (n == "HeartRateBpm") return El::kHeartRateBpm;
-      break;
-    case 14:
-      if (n == "AltitudeMeters") return El::kAltitude;
-      break;
-    case 15:
-      if (n == "LatitudeDegrees") return El::kLatitude;
-      break;
-    case 16:
-      if (n == "LongitudeDegrees") return El::kLongitude;
-      break;
-    case 22:
-      if (n == "TrainingCenterDatabase") return El::kRoot;
-      break;
-  }
-  return El::kOther;
+El Classify(std::string_view name) {
+  static constexpr std::pair<std::string_view, El> kNames[] = {
+      {"Trackpoint", El::kTrackpoint}, {"Time", El::kTime}, {"Position", El::kPosition},
+      {"LatitudeDegrees", El::kLatitude}, {"LongitudeDegrees", El::kLongitude},
+      {"AltitudeMeters", El::kAltitude}, {"HeartRateBpm", El::kHeartRateBpm}, {"Value", El::kValue},
+      {"Cadence", El::kCadence}, {"Extensions", El::kExtensions}, {"Speed", El::kSpeed},
+      {"RunCadence", El::kRunCadence}, {"Track", El::kTrack}, {"Lap", El::kLap},
+      {"Activity", El::kActivity}, {"Course", El::kCourse}, {"CoursePoint", El::kCoursePoint},
+      {"Name", El::kName}, {"Notes", El::kNotes}, {"PointType", El::kPointType},
+      {"TrainingCenterDatabase", El::kRoot}};
+  return detail::ElementOf(name, kNames, El::kOther);
 }
 
 enum class Field : uint8_t {
@@ -225,12 +183,7 @@ void TcxReader::EndPoint() {
     return;
   }
   if (!point_.hasPosition) return;  // a course point names a place
-  marker_.latitude = point_.latitude;
-  marker_.longitude = point_.longitude;
-  marker_.altitude = point_.altitude;
-  marker_.hasAltitude = point_.hasAltitude;
-  marker_.time = point_.time;
-  EmitMarker(marker_);
+  EmitMarker(marker_, point_);
 }
 
 void TcxReader::StoreField(int field, std::string_view text) {

@@ -109,7 +109,12 @@ bool XmlTrackReader::EmitPoint(const ImportPoint& point) {
   return Emit(sink_.Point(point));
 }
 bool XmlTrackReader::EmitEndTrack() { return Emit(sink_.EndTrack()); }
-bool XmlTrackReader::EmitMarker(const ImportMarker& marker) {
+bool XmlTrackReader::EmitMarker(ImportMarker& marker, const ImportPoint& where) {
+  marker.latitude = where.latitude;
+  marker.longitude = where.longitude;
+  marker.altitude = where.altitude;
+  marker.hasAltitude = where.hasAltitude;
+  marker.time = where.time;
   ++counts_.markers;
   return Emit(sink_.Marker(marker));
 }

@@ -3,12 +3,23 @@
 #pragma once
 
 #include <string>
+#include <utility>
 #include <string_view>
 
 #include "navmisc/import/detail/xml_stream.h"
 #include "navmisc/import/track_reader.h"
 
 namespace navmisc::import::detail {
+
+// The element kind of local name `name` in a reader's table (most frequent names first), or
+// `other`.
+template <class E, size_t N>
+E ElementOf(std::string_view name, const std::pair<std::string_view, E> (&table)[N], E other) {
+  for (const auto& [n, e] : table) {
+    if (n == name) return e;
+  }
+  return other;
+}
 
 class XmlTrackReader : public TrackReader, protected XmlHandler {
  public:
@@ -49,7 +60,8 @@ class XmlTrackReader : public TrackReader, protected XmlHandler {
   bool EmitSegment();
   bool EmitPoint(const ImportPoint& point);
   bool EmitEndTrack();
-  bool EmitMarker(const ImportMarker& marker);
+  // The marker with its place and time taken from `where`.
+  bool EmitMarker(ImportMarker& marker, const ImportPoint& where);
   bool EmitDocument(const std::string& name, const std::string& description);
   // Stops the document with `code`; the message gets the line in front.
   void StopAt(int32_t code, const std::string& message);
