@@ -154,6 +154,29 @@ class Unlocker {
   pthread_mutex_t* m_;
 };
 
+// The ring lock, released while bytes are copied: the one sender (holding the write lock)
+// copies into room that no receiver looks at until the tail moves, and the one receiver
+// (holding the read lock) copies out of bytes that no sender touches until the head moves, so
+// both copies run outside the lock and at the same time.
+class RingLock {
+ public:
+  explicit RingLock(MsgRingHeader& r) : r_(r) {}
+  ~RingLock() {
+    if (held_) ::pthread_mutex_unlock(&r_.ringLock);
+  }
+  RingLock(const RingLock&) = delete;
+  RingLock& operator=(const RingLock&) = delete;
+  bool Lock(const Deadline& deadline) { return held_ = navmisc::Lock(r_, r_.ringLock, deadline) == 0; }
+  void Unlock() {
+    ::pthread_mutex_unlock(&r_.ringLock);
+    held_ = false;
+  }
+
+ private:
+  MsgRingHeader& r_;
+  bool held_ = false;
+};
+
 void InitialiseRing(SharedBlockHeader& header) {
   auto& r = reinterpret_cast<MsgRingHeader&>(header);
   pthread_mutexattr_t ma;
@@ -325,8 +348,8 @@ bool CxSysMsgQueue::Send(const void* data, uint32_t size, uint32_t timeoutMs) {
 
   if (Lock(r, r.writeLock, deadline) != 0) return false;
   Unlocker writer(r.writeLock);
-  if (Lock(r, r.ringLock, deadline) != 0) return false;
-  Unlocker locked(r.ringLock);
+  RingLock locked(r);
+  if (!locked.Lock(deadline)) return false;
   const uint32_t seq = r.nextSeq++;
   uint32_t offset = 0;
   do {
@@ -341,10 +364,13 @@ bool CxSysMsgQueue::Send(const void* data, uint32_t size, uint32_t timeoutMs) {
     }
     MsgFrameHeader f{kMsgFrameMark, seq, size, offset, 0, 0};
     f.length = static_cast<uint32_t>(std::min<uint64_t>(want, ring.Free() - kFrameHeaderSize));
+    const uint64_t at = r.tail;
+    locked.Unlock();
     f.crc = f.length == size ? whole.crc : FrameCrc(f, bytes + offset);
-    ring.CopyIn(r.tail, &f, kFrameHeaderSize);
-    ring.CopyIn(r.tail + kFrameHeaderSize, bytes + offset, f.length);
-    r.tail += Align8(kFrameHeaderSize + f.length);
+    ring.CopyIn(at, &f, kFrameHeaderSize);
+    ring.CopyIn(at + kFrameHeaderSize, bytes + offset, f.length);
+    if (!locked.Lock(Deadline(kSysMsgWaitForever))) return false;
+    r.tail = at + Align8(kFrameHeaderSize + f.length);
     offset += f.length;
     Broadcast(r.notEmpty);
   } while (offset < size);
@@ -365,8 +391,8 @@ std::unique_ptr<uint8_t[]> CxSysMsgQueue::Receive(uint32_t timeoutMs, CxSysMsgIn
   const Deadline deadline(timeoutMs);
   if (Lock(r, r.readLock, deadline) != 0) return nullptr;
   Unlocker reader(r.readLock);
-  if (Lock(r, r.ringLock, Deadline(kSysMsgWaitForever)) != 0) return nullptr;
-  Unlocker locked(r.ringLock);
+  RingLock locked(r);
+  if (!locked.Lock(Deadline(kSysMsgWaitForever))) return nullptr;
 
   Assembly message;
   for (;;) {
@@ -388,16 +414,19 @@ std::unique_ptr<uint8_t[]> CxSysMsgQueue::Receive(uint32_t timeoutMs, CxSysMsgIn
       // parts belong to the message being put together, or to one whose receiver died half-way.
       if (f.offset == 0) message.Start(f);
       const bool take = message.Continues(f);
-      if (take) ring.CopyOut(r.head + kFrameHeaderSize, message.bytes.get() + f.offset, f.length);
+      bool intact = true;
+      if (take) {
+        const uint64_t at = r.head;
+        locked.Unlock();
+        ring.CopyOut(at + kFrameHeaderSize, message.bytes.get() + f.offset, f.length);
+        intact = FrameCrc(f, message.bytes.get() + f.offset) == f.crc;
+        if (!locked.Lock(Deadline(kSysMsgWaitForever))) return nullptr;
+      }
       r.head += frameBytes;
       Broadcast(r.notFull);
-      if (!take) {
+      if (!take || !intact) {
         ++r.discarded;
-        continue;
-      }
-      if (FrameCrc(f, message.bytes.get() + f.offset) != f.crc) {
-        ++r.discarded;
-        message.Drop();
+        if (!intact) message.Drop();
         continue;
       }
       message.got += f.length;

@@ -19,6 +19,7 @@
 #include <vector>
 
 #include "navmisc/platform/data_root.h"
+#include "navmisc/platform/detail/crc32c.h"
 #include "navmisc/platform/detail/msg_ring.h"
 #include "testutil.h"
 
@@ -84,6 +85,19 @@ struct ForkedPeer {
     pid = -1;
   }
 };
+
+TEST(Crc32c, StandardCheckValueAndEveryBlockBoundary) {
+  EXPECT_EQ(navmisc::detail::Crc32c("123456789", 9), 0xE3069283u);
+  EXPECT_EQ(navmisc::detail::Crc32cPortable("123456789", 9), 0xE3069283u);
+  const std::string data = Pattern(3 * 8192 * 2 + 3 * 256 * 3 + 13, 5);
+  for (size_t n : {0ul, 1ul, 7ul, 8ul, 767ul, 768ul, 769ul, 24575ul, 24576ul, 24577ul, data.size()}) {
+    EXPECT_EQ(navmisc::detail::Crc32c(data.data(), n), navmisc::detail::Crc32cPortable(data.data(), n)) << n;
+    // Continuing from a previous value is the same as one pass.
+    const uint32_t first = navmisc::detail::Crc32c(data.data(), n / 3);
+    EXPECT_EQ(navmisc::detail::Crc32c(data.data() + n / 3, n - n / 3, first),
+              navmisc::detail::Crc32c(data.data(), n)) << n;
+  }
+}
 
 class MsgQueue : public ::testing::Test {
  protected:

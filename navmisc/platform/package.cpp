@@ -30,7 +30,7 @@ const char* PackageErrorText(PackageError error) {
     case PackageError::kBadMagic: return "not a package of this framing";
     case PackageError::kSizeMismatch: return "body size differs from the bytes that follow";
     case PackageError::kTruncatedEntry: return "an entry runs past the end";
-    case PackageError::kBadName: return "an empty or over-long name";
+    case PackageError::kBadName: return "an empty or over-long name, or one with a zero byte";
     case PackageError::kCountMismatch: return "entry count differs from the entries found";
     case PackageError::kDuplicateName: return "a name occurs twice";
   }
@@ -97,6 +97,7 @@ bool CUnpackageBlk::SetData(const void* data, size_t size) {
     if (nameLen == 0 || nameLen > navmisc::kPackageMaxName) return Refuse(PackageError::kBadName);
     if (size - at - 2 < nameLen + 4u) return Refuse(PackageError::kTruncatedEntry);
     const std::string_view name(reinterpret_cast<const char*>(p + at + 2), nameLen);
+    if (name.find('\0') != std::string_view::npos) return Refuse(PackageError::kBadName);
     const uint32_t valueLen = navmisc::GetU32(p + at + 2 + nameLen);
     const size_t valueAt = at + 6 + nameLen;
     if (size - valueAt < valueLen) return Refuse(PackageError::kTruncatedEntry);

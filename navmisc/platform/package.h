@@ -17,7 +17,7 @@ namespace navmisc {
 // The first four bytes of every package: "NPK" and the framing version.
 inline constexpr uint8_t kPackageMagic[4] = {'N', 'P', 'K', 1};
 inline constexpr size_t kPackageHeaderSize = 12;  // magic, entry count, body size
-// Longest name an entry may have, in bytes.
+// Longest name an entry may have, in bytes. Names never hold a zero byte.
 inline constexpr size_t kPackageMaxName = 255;
 
 // Why a package was refused.
@@ -28,7 +28,7 @@ enum class PackageError {
   kBadMagic,         // not a package, or another framing version
   kSizeMismatch,     // the body size in the header is not what follows it
   kTruncatedEntry,   // an entry's name or value runs past the end
-  kBadName,          // an empty or over-long name
+  kBadName,          // an empty or over-long name, or one with a zero byte
   kCountMismatch,    // the header's entry count differs from the entries found
   kDuplicateName,    // a name occurs twice
 };

@@ -102,6 +102,7 @@ TEST(Package, MalformedPackagesAreRefusedWhole) {
       {"name length past the end", with(12, std::string("\xFF\x00", 2)), PackageError::kTruncatedEntry},
       {"name length over 255", with(12, std::string("\x00\x01", 2)), PackageError::kBadName},
       {"name length 0", with(12, std::string("\x00\x00", 2)), PackageError::kBadName},
+      {"a zero byte in a name", with(15, std::string("\x00", 1)), PackageError::kBadName},
       {"duplicate name", Bytes(dup), PackageError::kDuplicateName},
   };
   for (const Case& c : cases) {
