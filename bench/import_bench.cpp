@@ -24,6 +24,7 @@
 #include <cmath>
 #include <cstdio>
 #include <cstring>
+#include <filesystem>
 #include <ctime>
 #include <fstream>
 #include <map>
@@ -109,11 +110,16 @@ long PeakKiB(pid_t pid) {
   return 0;
 }
 
-// The processes started by `pid` (its threads' children).
+// The processes started by any thread of `pid` (the command thread starts the data-control
+// process).
 std::vector<pid_t> Children(pid_t pid) {
   std::vector<pid_t> out;
-  std::ifstream tasks("/proc/" + std::to_string(pid) + "/task/" + std::to_string(pid) + "/children");
-  for (pid_t c; tasks >> c;) out.push_back(c);
+  const std::string dir = "/proc/" + std::to_string(pid) + "/task";
+  std::error_code ec;  // the process may be gone already
+  for (std::filesystem::directory_iterator it(dir, ec), end; !ec && it != end; it.increment(ec)) {
+    std::ifstream children(it->path() / "children");
+    for (pid_t c; children >> c;) out.push_back(c);
+  }
   return out;
 }
 
