@@ -18,49 +18,15 @@ enum class El : uint8_t {
   kEle, kTime, kSpeed, kCourse, kSym, kExtensions, kHeartRate, kCadence,
 };
 
-El Classify(std::string_view n) {
-  switch (n.size()) {
-    case 2:
-      if (n == "hr") return El::kHeartRate;
-      break;
-    case 3:
-      if (n == "gpx") return El::kGpx;
-      if (n == "trk") return El::kTrk;
-      if (n == "rte") return El::kRte;
-      if (n == "wpt") return El::kWpt;
-      if (n == "ele") return El::kEle;
-      if (n == "sym") return El::kSym;
-      if (n == "cmt") return El::kCmt;
-      if (n == "cad") return El::kCadence;
-      break;
-    case 4:
-      if (n == "name") return El::kName;
-      if (n == "desc") return El::kDesc;
-      if (n == "time") return El::kTime;
-      break;
-    case 5:
-      if (n == "trkpt") return El::kTrkpt;
-      if (n == "rtept") return El::kRtept;
-      if (n == "speed") return El::kSpeed;
-      break;
-    case 6:
-      if (n == "trkseg") return El::kTrkseg;
-      if (n == "course") return El::kCourse;
-      break;
-    case 7:
-      if (n == "cadence") return El::kCadence;
-      break;
-    case 8:
-      if (n == "metadata") return El::kMetadata;
-      break;
-    case 9:
-      if (n == "heartrate") return El::kHeartRate;
-      break;
-    case 10:
-      if (n == "extensions") return El::kExtensions;
-      break;
-  }
-  return El::kOther;
+El Classify(std::string_view name) {
+  static constexpr std::pair<std::string_view, El> kNames[] = {
+      {"trkpt", El::kTrkpt}, {"ele", El::kEle}, {"time", El::kTime}, {"extensions", El::kExtensions},
+      {"hr", El::kHeartRate}, {"cad", El::kCadence}, {"speed", El::kSpeed}, {"course", El::kCourse},
+      {"rtept", El::kRtept}, {"wpt", El::kWpt}, {"name", El::kName}, {"desc", El::kDesc},
+      {"cmt", El::kCmt}, {"sym", El::kSym}, {"trkseg", El::kTrkseg}, {"trk", El::kTrk},
+      {"rte", El::kRte}, {"metadata", El::kMetadata}, {"gpx", El::kGpx},
+      {"heartrate", El::kHeartRate}, {"cadence", El::kCadence}};
+  return detail::ElementOf(name, kNames, El::kOther);
 }
 
 // What the captured text of an element becomes.
@@ -81,7 +47,7 @@ class GpxReader final : public XmlTrackReader {
   Field FieldOf(El el, El parent) const;
   void BeginPoint(El kind, const char** attributes);
   void EndPoint();
-  void Store(Field field, std::string_view text);
+  void StoreField(int field, std::string_view text) override;
   bool OpenPendingTrack();
   void SendDocument();
 
@@ -99,8 +65,6 @@ class GpxReader final : public XmlTrackReader {
   ImportTrack track_;
   std::string doc_name_, doc_desc_;
   bool doc_sent_ = false;
-  Field field_ = Field::kNone;
-  size_t field_depth_ = 0;
 };
 
 Field GpxReader::FieldOf(El el, El parent) const {
@@ -140,7 +104,7 @@ void GpxReader::StartElement(std::string_view name, const char** attributes) {
     }
     return;
   }
-  if (field_ != Field::kNone) return;  // an element inside a text we collect
+  if (Capturing()) return;  // an element inside a text we collect
   switch (el) {
     case El::kTrk:
     case El::kRte:
@@ -172,15 +136,9 @@ void GpxReader::StartElement(std::string_view name, const char** attributes) {
       if (point_kind_ != El::kOther && stack_.size() == point_depth_ + 2)
         extensions_depth_ = stack_.size();
       break;
-    default: {
-      const Field f = FieldOf(el, parent);
-      if (f != Field::kNone) {
-        field_ = f;
-        field_depth_ = stack_.size();
-        Capture();
-      }
+    default:
+      if (const Field f = FieldOf(el, parent); f != Field::kNone) CaptureField(static_cast<int>(f), stack_.size());
       break;
-    }
   }
 }
 
@@ -188,12 +146,7 @@ void GpxReader::EndElement(std::string_view) {
   if (stack_.empty()) return;
   const El el = stack_.back();
   const size_t depth = stack_.size();
-  if (field_ != Field::kNone) {
-    if (depth == field_depth_) {
-      const Field f = field_;
-      field_ = Field::kNone;
-      Store(f, TakeText());
-    }
+  if (EndOfField(depth)) {
     stack_.pop_back();
     return;
   }
@@ -229,17 +182,12 @@ void GpxReader::EndPoint() {
     EmitPoint(point_);
     return;
   }
-  marker_.latitude = point_.latitude;
-  marker_.longitude = point_.longitude;
-  marker_.altitude = point_.altitude;
-  marker_.hasAltitude = point_.hasAltitude;
-  marker_.time = point_.time;
-  EmitMarker(marker_);
+  EmitMarker(marker_, point_);
 }
 
-void GpxReader::Store(Field field, std::string_view text) {
+void GpxReader::StoreField(int field, std::string_view text) {
   double v = 0;
-  switch (field) {
+  switch (static_cast<Field>(field)) {
     case Field::kNone: break;
     case Field::kDocName: doc_name_ = text; break;
     case Field::kDocDesc: doc_desc_ = text; break;

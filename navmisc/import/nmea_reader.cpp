@@ -116,6 +116,8 @@ class NmeaReader final : public TrackReader {
 
  private:
   enum class Outcome { kUsed, kIgnored, kChecksum, kValue, kGarbage };
+  // The line gathered in line_ is complete.
+  void EndLine();
   void Line(std::string_view line);
   Outcome Sentence(std::string_view line);
   Outcome Gga(const std::array<std::string_view, 24>& f, size_t n);
@@ -174,16 +176,7 @@ bool NmeaReader::Feed(const char* data, size_t size) {
     bytes_ += n + (nl ? 1 : 0);
     data = nl ? nl + 1 : end;
     if (!nl) break;
-    ++line_number_;
-    if (overlong_) {
-      ++overlong_lines_;
-      ++counts_.skipped;
-      if (!first_bad_line_) first_bad_line_ = line_number_;
-      overlong_ = false;
-    } else {
-      Line(line_);
-    }
-    line_.clear();
+    EndLine();
     if (stopped_) return Fail(DC_ERR_IMPORT_CANCELLED, "stopped");
     if (failed()) return false;
   }
@@ -192,6 +185,19 @@ bool NmeaReader::Feed(const char* data, size_t size) {
     return false;
   }
   return true;
+}
+
+void NmeaReader::EndLine() {
+  ++line_number_;
+  if (overlong_) {
+    ++overlong_lines_;
+    ++counts_.skipped;
+    if (!first_bad_line_) first_bad_line_ = line_number_;
+    overlong_ = false;
+  } else {
+    Line(line_);
+  }
+  line_.clear();
 }
 
 void NmeaReader::Line(std::string_view line) {
@@ -456,18 +462,7 @@ bool NmeaReader::Deliver(const Fix& fix, int64_t time) {
 
 bool NmeaReader::Finish() {
   if (failed()) return false;
-  if (!line_.empty() || overlong_) {
-    ++line_number_;
-    if (overlong_) {
-      ++overlong_lines_;
-      ++counts_.skipped;
-      if (!first_bad_line_) first_bad_line_ = line_number_;
-      overlong_ = false;
-    } else {
-      Line(line_);
-    }
-    line_.clear();
-  }
+  if (!line_.empty() || overlong_) EndLine();
   Flush();
   fix_ = Fix{};
   if (!undated_.empty()) {

@@ -155,7 +155,7 @@ ReadStatus Convert(InputFile& file, const FileFormat& format, ProgressSink& sink
   for (;;) {
     const ssize_t n = child.ReadOutput(buffer.data(), buffer.size(), kConverterPollMs);
     if (n == ChildProcess::kTimedOut) {
-      if (!sink.GoOn() || !sink.Report()) return {DC_ERR_IMPORT_CANCELLED, "stopped"};
+      if (!sink.GoOn() || !sink.Report()) return {DC_ERR_IMPORT_CANCELLED, ""};
       continue;
     }
     if (n < 0) return {DC_ERR_IMPORT_CONVERTER, "cannot read gpsbabel's output"};
@@ -279,7 +279,10 @@ ReadFileResult ReadTrackFile(const wchar_t* path, ImportSink& sink, const ReadFi
   }
   if (result.status.ok() && result.counts.points == 0 && result.counts.markers == 0)
     result.status = {DC_ERR_IMPORT_NO_POINTS, "the file holds no track point and no waypoint"};
-  if (result.status.ok() && !counted.Report()) result.status = {DC_ERR_IMPORT_CANCELLED, "stopped"};
+  if (result.status.ok() && !counted.Report()) result.status = {DC_ERR_IMPORT_CANCELLED, ""};
+  if (result.status.code == DC_ERR_IMPORT_CANCELLED) {
+    result.status.message = "stopped on request after " + std::to_string(progress.points) + " points";
+  }
   return result;
 }
 

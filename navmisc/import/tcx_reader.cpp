@@ -19,59 +19,17 @@ enum class El : uint8_t {
   kSpeed, kRunCadence, kName, kNotes, kPointType,
 };
 
-El Classify(std::string_view n) {
-  switch (n.size()) {
-    case 3:
-      if (n == "Lap") return El::kLap;
-      break;
-    case 4:
-      if (n == "Time") return El::kTime;
-      if (n == "Name") return El::kName;
-      break;
-    case 5:
-      if (n == "Track") return El::kTrack;
-      if (n == "Value") return El::kValue;
-      if (n == "Speed") return El::kSpeed;
-      if (n == "Notes") return El::kNotes;
-      break;
-    case 6:
-      if (n == "Course") return El::kCourse;
-      break;
-    case 7:
-      if (n == "Cadence") return El::kCadence;
-      break;
-    case 8:
-      if (n == "Activity") return El::kActivity;
-      if (n == "Position") return El::kPosition;
-      break;
-    case 9:
-      if (n == "PointType") return El::kPointType;
-      break;
-    case 10:
-      if (n == "Trackpoint") return El::kTrackpoint;
-      if (n == "Extensions") return El::kExtensions;
-      if (n == "RunCadence") return El::kRunCadence;
-      break;
-    case 11:
-      if (n == "CoursePoint") return El::kCoursePoint;
-      break;
-    case 12:
-      if (n == "HeartRateBpm") return El::kHeartRateBpm;
-      break;
-    case 14:
-      if (n == "AltitudeMeters") return El::kAltitude;
-      break;
-    case 15:
-      if (n == "LatitudeDegrees") return El::kLatitude;
-      break;
-    case 16:
-      if (n == "LongitudeDegrees") return El::kLongitude;
-      break;
-    case 22:
-      if (n == "TrainingCenterDatabase") return El::kRoot;
-      break;
-  }
-  return El::kOther;
+El Classify(std::string_view name) {
+  static constexpr std::pair<std::string_view, El> kNames[] = {
+      {"Trackpoint", El::kTrackpoint}, {"Time", El::kTime}, {"Position", El::kPosition},
+      {"LatitudeDegrees", El::kLatitude}, {"LongitudeDegrees", El::kLongitude},
+      {"AltitudeMeters", El::kAltitude}, {"HeartRateBpm", El::kHeartRateBpm}, {"Value", El::kValue},
+      {"Cadence", El::kCadence}, {"Extensions", El::kExtensions}, {"Speed", El::kSpeed},
+      {"RunCadence", El::kRunCadence}, {"Track", El::kTrack}, {"Lap", El::kLap},
+      {"Activity", El::kActivity}, {"Course", El::kCourse}, {"CoursePoint", El::kCoursePoint},
+      {"Name", El::kName}, {"Notes", El::kNotes}, {"PointType", El::kPointType},
+      {"TrainingCenterDatabase", El::kRoot}};
+  return detail::ElementOf(name, kNames, El::kOther);
 }
 
 enum class Field : uint8_t {
@@ -91,7 +49,7 @@ class TcxReader final : public XmlTrackReader {
     return stack_.size() > fromTop ? stack_[stack_.size() - 1 - fromTop] : El::kOther;
   }
   Field FieldOf(El el) const;
-  void Store(Field field, std::string_view text);
+  void StoreField(int field, std::string_view text) override;
   void EndPoint();
 
   std::vector<El> stack_;
@@ -108,8 +66,6 @@ class TcxReader final : public XmlTrackReader {
   bool track_sent_ = false;
   ImportTrack track_;
   int lap_number_ = 0;  // within the current activity
-  Field field_ = Field::kNone;
-  size_t field_depth_ = 0;
 };
 
 Field TcxReader::FieldOf(El el) const {
@@ -152,7 +108,7 @@ void TcxReader::StartElement(std::string_view name, const char** /*attributes*/)
     }
     return;
   }
-  if (field_ != Field::kNone) return;
+  if (Capturing()) return;
   const El parent = At(1);
   switch (el) {
     case El::kActivity:
@@ -190,27 +146,16 @@ void TcxReader::StartElement(std::string_view name, const char** /*attributes*/)
     case El::kExtensions:
       if (point_depth_ != 0 && stack_.size() == point_depth_ + 1) extensions_depth_ = stack_.size();
       break;
-    default: {
-      const Field f = FieldOf(el);
-      if (f != Field::kNone) {
-        field_ = f;
-        field_depth_ = stack_.size();
-        Capture();
-      }
+    default:
+      if (const Field f = FieldOf(el); f != Field::kNone) CaptureField(static_cast<int>(f), stack_.size());
       break;
-    }
   }
 }
 
 void TcxReader::EndElement(std::string_view) {
   if (stack_.empty()) return;
   const size_t depth = stack_.size();
-  if (field_ != Field::kNone) {
-    if (depth == field_depth_) {
-      const Field f = field_;
-      field_ = Field::kNone;
-      Store(f, TakeText());
-    }
+  if (EndOfField(depth)) {
     stack_.pop_back();
     return;
   }
@@ -238,17 +183,12 @@ void TcxReader::EndPoint() {
     return;
   }
   if (!point_.hasPosition) return;  // a course point names a place
-  marker_.latitude = point_.latitude;
-  marker_.longitude = point_.longitude;
-  marker_.altitude = point_.altitude;
-  marker_.hasAltitude = point_.hasAltitude;
-  marker_.time = point_.time;
-  EmitMarker(marker_);
+  EmitMarker(marker_, point_);
 }
 
-void TcxReader::Store(Field field, std::string_view text) {
+void TcxReader::StoreField(int field, std::string_view text) {
   double v = 0;
-  switch (field) {
+  switch (static_cast<Field>(field)) {
     case Field::kNone: break;
     case Field::kTime: ReadTime(text, "Time", point_.time); break;
     case Field::kLatitude:

@@ -39,7 +39,11 @@ InputFile::OpenResult InputFile::Open(const wchar_t* path) {
     return OpenResult::kFailed;
   }
   if (!S_ISREG(st.st_mode)) {
-    error_ = S_ISDIR(st.st_mode) ? "Is a directory" : "Not a regular file";
+    error_ = S_ISDIR(st.st_mode)    ? "Is a directory"
+             : S_ISFIFO(st.st_mode) ? "Is a FIFO"
+             : S_ISSOCK(st.st_mode) ? "Is a socket"
+             : S_ISCHR(st.st_mode) || S_ISBLK(st.st_mode) ? "Is a device"
+                                    : "Not a regular file";
     ::close(fd);
     return OpenResult::kNotRegular;
   }

@@ -10,6 +10,7 @@
 #include "navmisc/import/import_errors.h"
 #include "navmisc/import/trip_import.h"
 #include "navmisc/platform/shared_globals.h"
+#include "navmisc/records/user_profile.h"
 #include "progress.h"
 
 namespace gpsdc {
@@ -56,6 +57,8 @@ int32_t Import(CDataControlCmdBlkFile& block, RequestContext& ctx) {
     return DC_ERR_IMPORT_FORMAT;
   }
 
+  // A new trip takes its page template from its application's profile: read it as it is now.
+  if (USER_MAP_INFO* profile = GetUserMapInfo(options.appType)) profile->ReadInfo();
   TripImporter importer(options);
   ProgressReporter progress(ctx.replies, DC_SOURCE_DEVICE, std::chrono::milliseconds(0));
   ReadProgress last;

@@ -233,38 +233,6 @@ void CheckOutputFolder(const std::string& path) {
   if (IsDirectory(target)) Fail(path + " is a folder");
 }
 
-ProgressDisplay::ProgressDisplay(std::string label)
-    : label_(std::move(label)),
-      draw_(StderrIsTerminal()),
-      started_(std::chrono::steady_clock::now()),
-      last_(started_ - std::chrono::seconds(1)) {}
-
-void ProgressDisplay::Update(long done, long total) {
-  // A bar when the work counts its items, a spinner with the elapsed time otherwise; either only
-  // once the work has taken more than a moment.
-  const auto now = std::chrono::steady_clock::now();
-  if (!draw_ || now - started_ < std::chrono::milliseconds(300) || now - last_ < std::chrono::milliseconds(100))
-    return;
-  last_ = now;
-  drawn_ = true;
-  if (total > 0) {
-    const double frac = std::min(1.0, static_cast<double>(done) / static_cast<double>(total));
-    const int width = 30;
-    const int filled = static_cast<int>(frac * width);
-    std::fprintf(stderr, "\r%s [%s%s] %3d%%", label_.c_str(), std::string(filled, '#').c_str(),
-                 std::string(width - filled, '.').c_str(), static_cast<int>(frac * 100));
-  } else {
-    const double secs = std::chrono::duration<double>(now - started_).count();
-    std::fprintf(stderr, "\r%s %c %.1fs", label_.c_str(), "|/-\\"[static_cast<int>(secs * 10) % 4], secs);
-  }
-  std::fflush(stderr);
-}
-
-void ProgressDisplay::Finish(bool stopped) {
-  if (drawn_) std::fprintf(stderr, "\r%s: %s\033[K\n", label_.c_str(), stopped ? "stopped" : "done");
-  drawn_ = false;
-}
-
 bool RunWithProgress(const std::string& label, int total, int& counter, bool& keepGoing,
                      const std::function<void()>& work) {
   InterruptWatch watch;
@@ -277,9 +245,8 @@ bool RunWithProgress(const std::string& label, int total, int& counter, bool& ke
     done = true;
     finished.notify_one();
   });
-  ProgressDisplay display(label);
+  ProgressBar bar(label);
   bool interrupted = false;
-  auto last = std::chrono::steady_clock::now() - std::chrono::seconds(1);
   for (;;) {
     {
       // The end of the work wakes the wait at once; Ctrl-C and the bar are looked at in between.
@@ -290,10 +257,10 @@ bool RunWithProgress(const std::string& label, int total, int& counter, bool& ke
       interrupted = true;
       keepGoing = false;  // the work looks at the flag between items and stops there
     }
-    display.Update(counter, total);
+    bar.Show(counter, total);
   }
   worker.join();
-  display.Finish(interrupted);
+  bar.Finish(interrupted ? "stopped" : "done");
   return !interrupted;
 }
 

@@ -9,6 +9,7 @@
 #include <vector>
 
 #include "navmisc/platform/cstring.h"
+#include "navmisc/platform/datetime.h"
 #include "navmisc/platform/types.h"
 
 class BLOG_ITEM_INFO;
@@ -58,21 +59,23 @@ std::unique_ptr<BLOG_ITEM_INFO> OpenTrip(const std::string& name);
 // The track of `trip` that `name` names, the same way (its id, the start of one id, one name).
 TRACK_ITEM_INFO& FindTrack(BLOG_ITEM_INFO& trip, const std::string& name);
 
-// A progress bar on stderr (only when stderr is a terminal, and only once the work has taken
-// more than a moment): a bar while the total is known, a spinner with the time otherwise.
-class ProgressDisplay {
+// A progress line on stderr: drawn only when stderr is a terminal, and only once the work has
+// taken more than a moment.
+class ProgressBar {
  public:
-  explicit ProgressDisplay(std::string label);
-  void Update(long done, long total);
-  // Ends the bar's line with "done" or "stopped".
-  void Finish(bool stopped);
+  explicit ProgressBar(std::string label);
+  // `done` of `total` as a bar and a percentage, or with `total` 0 a spinner and the time
+  // taken; `note` follows ("1200 points"). Redrawn at most ten times a second.
+  void Show(long long done, long long total, const std::string& note = "");
+  // Ends the line with "LABEL: RESULT" when anything was drawn.
+  void Finish(const std::string& result);
 
  private:
   std::string label_;
-  bool draw_;
-  bool drawn_ = false;
   std::chrono::steady_clock::time_point started_;
   std::chrono::steady_clock::time_point last_;
+  bool draw_;
+  bool drawn_ = false;
 };
 
 // Runs `work` on a worker thread while a progress bar follows `counter` up to `total` on stderr
@@ -119,6 +122,24 @@ void AddWhereCommand(CLI::App& app);
 // `navmisc photos add|list` and `navmisc geotag` (cmd_photos.cpp).
 void AddPhotosCommand(CLI::App& app);
 void AddGeotagCommand(CLI::App& app);
+// `navmisc import FILE...`: track files in as trips, through the data-control process.
+void AddImportCommand(CLI::App& app);
+// What `navmisc import` asks of the process for every file.
+struct ImportRequest {
+  GPS_APP_PROG_TYPE app = GPS_APP_TRIP;
+  std::string format;    // empty: recognised
+  std::string name;      // empty: from the file
+  COleDateTime from, to;  // zero: open
+  int32_t timeZone = 0;  // seconds east of UTC of the files' times
+  bool verbose = false;  // print every progress block
+};
+// Imports each file as a trip through the data-control process, started for the time of the
+// call: a line per trip on stdout, a line per failure on stderr, a progress bar meanwhile.
+// Ctrl-C cancels the running import and skips the rest (*cancelled is set). Returns the number
+// of files that failed.
+int ImportFiles(const std::vector<std::string>& files, const ImportRequest& request, bool* cancelled);
+// The demo's import step: the exports of trip `tripId` come back in as trips.
+void DemoImport(const std::string& root, const std::string& tripId);
 // `navmisc help [COMMAND]`: the program's or a command's help.
 void AddHelpCommand(CLI::App& app);
 

@@ -1,21 +1,18 @@
 // `navmisc channel status`: the data-control channel as an application runs it. Starts the
 // command thread (which starts GpsDataControl.exe), asks for the logger's and the web service's
 // connection state, prints the replies and ends the channel.
-#include <atomic>
 #include <chrono>
 #include <cstdio>
 #include <map>
-#include <thread>
 
 #include <CLI/CLI.hpp>
 
+#include "channel_session.h"
 #include "cli.h"
 #include "navmisc/datactrl/device_commands.h"
 #include "navmisc/datactrl/net_commands.h"
 #include "navmisc/datactrl/reply_dialog.h"
 #include "navmisc/datactrl/request_queue.h"
-#include "navmisc/platform/files.h"
-#include "navmisc/platform/shared_globals.h"
 #include "navmisc/records/user_profile.h"
 #include "terminal_view.h"
 
@@ -23,10 +20,8 @@ namespace navmisc::cli {
 namespace {
 
 using namespace navmisc::datactrl;
-using Clock = std::chrono::steady_clock;
 
-// How long the command waits for the process to start and for its replies.
-constexpr auto kStartWait = std::chrono::seconds(10);
+// How long the command waits for the process's replies.
 constexpr auto kReplyWait = std::chrono::seconds(10);
 
 const char* SourceName(int32_t source) {
@@ -103,47 +98,10 @@ class StatusWindow : public CDataCtrlReplyDlg {
   std::map<int32_t, CDataControlConnectionStatus> last_;
 };
 
-// Handles the window's messages until `done` holds or `wait` has passed.
-template <class F>
-bool PumpUntil(F done, Clock::duration wait) {
-  const auto end = Clock::now() + wait;
-  while (!done()) {
-    if (Clock::now() >= end) return false;
-    PumpMessagesUntil(done, 20);
-  }
-  return true;
-}
-
 void ChannelStatus(bool verbose) {
   TerminalDialogView view;
   StatusWindow window(view, GetUserMapInfo(GPS_APP_TRIP)->localize, verbose);
-  const HWND hwnd = window.GetSafeHwnd();
-  g_bExit = false;
-  std::atomic<bool> finished{false};
-  std::thread commandThread([&] {
-    ProcessCommand(&window);
-    finished = true;
-    PostMessageW(hwnd, WM_NULL, 0, 0);
-  });
-  // The channel is stopped however this ends, and the command thread joined.
-  struct Stopper {
-    std::atomic<bool>& finished;
-    std::thread& thread;
-    ~Stopper() {
-      g_bExit = true;
-      PumpUntil([&] { return finished.load(); }, std::chrono::seconds(30));
-      thread.join();
-      if (DataControlProcessId() != 0) {
-        std::fprintf(stderr, "navmisc channel: the data-control process did not end in time; stopped it\n");
-        EndKeptDataControlProcess();
-      }
-    }
-  } stopper{finished, commandThread};
-
-  const auto program = DataControlArguments(DataControlCommandLine(g_szExecProgPath, g_nProductId));
-  PumpUntil([&] { return GetChannelState() == ChannelState::kRunning || finished; }, kStartWait);
-  if (GetChannelState() != ChannelState::kRunning)
-    Fail("cannot start the data-control process " + program[0]);
+  ChannelSession channel(window);
   // The process announces both states when it starts; the replies to these questions follow.
   DC_KVDEVICE_QueryDeviceStatus();
   DC_NET_QueryNetStatus();

@@ -114,7 +114,7 @@ void ReadLog(const std::string& logger, const std::string& appName, bool clear) 
   RequireLogger(channel);
   const std::vector<CString> before = TripFolders(app);
   channel.Request(DC_DEVICE_READ_LOG, [] { DC_KVDEVICE_ReadLogData(); });
-  ProgressDisplay bar("Reading the logger");
+  ProgressBar bar("Reading the logger");
   bool cancelled = false;
   for (;;) {
     bool interrupted = false;
@@ -124,9 +124,9 @@ void ReadLog(const std::string& logger, const std::string& appName, bool clear) 
       cancelled = true;
       DC_KVDEVICE_CancelRead();
     }
-    bar.Update(channel.progressDone(), channel.progressTotal());
+    bar.Show(channel.progressDone(), channel.progressTotal());
   }
-  bar.Finish(cancelled);
+  bar.Finish(cancelled ? "stopped" : "done");
   if (!channel.replied()) Fail("the data-control process ended");
   FailOnError(channel.lastError(), cancelled ? "read stopped" : "cannot read the log");
   const CDataControlCmdBlkKVDevice& reply = channel.deviceReply();

@@ -66,6 +66,7 @@ int main(int argc, char** argv) {
   navmisc::cli::AddChannelCommand(app);
   navmisc::cli::AddDeviceCommand(app);
   navmisc::cli::AddWhereCommand(app);
+  navmisc::cli::AddImportCommand(app);
   navmisc::cli::AddHelpCommand(app);
 
   try {

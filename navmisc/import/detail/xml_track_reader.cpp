@@ -37,7 +37,17 @@ bool XmlTrackReader::Finish() {
 }
 
 void XmlTrackReader::Text(std::string_view text) {
-  if (capturing_) AppendCapped(text_, text, kMaxText);
+  if (Capturing()) AppendCapped(text_, text, kMaxText);
+}
+
+bool XmlTrackReader::EndOfField(size_t depth) {
+  if (!Capturing()) return false;
+  if (depth == fieldDepth_) {
+    const int field = field_;
+    field_ = kNoField;
+    StoreField(field, text_);
+  }
+  return true;
 }
 
 void XmlTrackReader::StopAt(int32_t code, const std::string& message) {
@@ -99,7 +109,12 @@ bool XmlTrackReader::EmitPoint(const ImportPoint& point) {
   return Emit(sink_.Point(point));
 }
 bool XmlTrackReader::EmitEndTrack() { return Emit(sink_.EndTrack()); }
-bool XmlTrackReader::EmitMarker(const ImportMarker& marker) {
+bool XmlTrackReader::EmitMarker(ImportMarker& marker, const ImportPoint& where) {
+  marker.latitude = where.latitude;
+  marker.longitude = where.longitude;
+  marker.altitude = where.altitude;
+  marker.hasAltitude = where.hasAltitude;
+  marker.time = where.time;
   ++counts_.markers;
   return Emit(sink_.Marker(marker));
 }

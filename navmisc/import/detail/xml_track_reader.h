@@ -3,12 +3,23 @@
 #pragma once
 
 #include <string>
+#include <utility>
 #include <string_view>
 
 #include "navmisc/import/detail/xml_stream.h"
 #include "navmisc/import/track_reader.h"
 
 namespace navmisc::import::detail {
+
+// The element kind of local name `name` in a reader's table (most frequent names first), or
+// `other`.
+template <class E, size_t N>
+E ElementOf(std::string_view name, const std::pair<std::string_view, E> (&table)[N], E other) {
+  for (const auto& [n, e] : table) {
+    if (n == name) return e;
+  }
+  return other;
+}
 
 class XmlTrackReader : public TrackReader, protected XmlHandler {
  public:
@@ -20,17 +31,19 @@ class XmlTrackReader : public TrackReader, protected XmlHandler {
   // Called by Finish after a well-formed end, before the status is settled.
   virtual void AtEnd() {}
 
-  // The text of the current element is collected from now until its end (at most kMaxText
-  // bytes; the rest is dropped).
-  void Capture() {
-    capturing_ = true;
+  // The text of the element that starts at `depth` (the element stack's size with it) is
+  // collected for `field`, a number of the reader's own, until that element ends (at most
+  // kMaxText bytes; the rest is dropped). Elements inside it add their text.
+  void CaptureField(int field, size_t depth) {
+    field_ = field;
+    fieldDepth_ = depth;
     text_.clear();
   }
-  // The collected text, capture ended.
-  std::string_view TakeText() {
-    capturing_ = false;
-    return text_;
-  }
+  bool Capturing() const { return field_ != kNoField; }
+  // To be called at the end of every element, at `depth`: false when no field is being
+  // collected. Otherwise true; when the field's element ends here, its text goes to StoreField.
+  bool EndOfField(size_t depth);
+  virtual void StoreField(int field, std::string_view text) = 0;
   void Text(std::string_view text) override;
 
   // Checked readings of the collected text; on failure the document stops with
@@ -47,7 +60,8 @@ class XmlTrackReader : public TrackReader, protected XmlHandler {
   bool EmitSegment();
   bool EmitPoint(const ImportPoint& point);
   bool EmitEndTrack();
-  bool EmitMarker(const ImportMarker& marker);
+  // The marker with its place and time taken from `where`.
+  bool EmitMarker(ImportMarker& marker, const ImportPoint& where);
   bool EmitDocument(const std::string& name, const std::string& description);
   // Stops the document with `code`; the message gets the line in front.
   void StopAt(int32_t code, const std::string& message);
@@ -56,9 +70,11 @@ class XmlTrackReader : public TrackReader, protected XmlHandler {
   ImportSink& sink_;
 
  private:
+  static constexpr int kNoField = -1;
   XmlStream xml_;
   std::string text_;
-  bool capturing_ = false;
+  int field_ = kNoField;
+  size_t fieldDepth_ = 0;
 };
 
 }  // namespace navmisc::import::detail
