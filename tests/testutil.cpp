@@ -1,7 +1,9 @@
 #include "testutil.h"
 
+#include <signal.h>
 #include <stdlib.h>
 #include <sys/wait.h>
+#include <unistd.h>
 #include <time.h>
 
 #include <clocale>
@@ -91,6 +93,23 @@ std::string ShellQuote(const std::string& s) {
     else q += c;
   }
   return q + "'";
+}
+
+bool FinishesWithin(int seconds, const std::function<void()>& work) {
+  const pid_t child = ::fork();
+  if (child < 0) return false;
+  if (child == 0) {
+    work();
+    ::_exit(0);
+  }
+  int status = 0;
+  for (int waited_ms = 0; waited_ms < seconds * 1000; waited_ms += 10) {
+    if (::waitpid(child, &status, WNOHANG) == child) return WIFEXITED(status) && WEXITSTATUS(status) == 0;
+    ::usleep(10 * 1000);
+  }
+  ::kill(child, SIGKILL);
+  ::waitpid(child, &status, 0);
+  return false;
 }
 
 }  // namespace navmisc::testutil

@@ -3,6 +3,7 @@
 
 #include <gtest/gtest.h>
 
+#include <functional>
 #include <optional>
 #include <ostream>
 #include <string>
@@ -90,5 +91,11 @@ CommandResult RunCommand(const std::string& command);
 bool HaveProgram(const char* name);
 // `s` as one single-quoted shell word.
 std::string ShellQuote(const std::string& s);
+
+// Runs `work` in a forked child and waits up to `seconds` for it. True when it ended normally
+// in time; a child still running then is killed. For work that may hang on a broken build (a
+// read that blocks or loops); the child's results do not come back, so check them afterwards
+// in the test's own process.
+bool FinishesWithin(int seconds, const std::function<void()>& work);
 
 }  // namespace navmisc::testutil

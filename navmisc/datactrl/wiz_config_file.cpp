@@ -28,7 +28,11 @@ void ReadIfPresent(unsigned long ini, const wchar_t* section, const wchar_t* key
 
 CString CWizConfigSheet::GetSettingFilePath() {
   CString folder = g_szSoftwareCompanyname;
-  if (folder.IsEmpty() || folder.GetAt(0) != L'/') folder = PathJoin(UserConfigFolder(), folder);
+  if (folder.IsEmpty() || folder.GetAt(0) != L'/') {
+    const CString config = UserConfigFolder();
+    if (config.IsEmpty()) return {};  // no home folder: no settings file rather than one in the current folder
+    folder = PathJoin(config, folder);
+  }
   const CString name =
       FormatString(L"device_%d_%d.ini", static_cast<int>(g_wDeviceModelID), g_wDeviceSerialID);
   return PathJoin(PathJoin(folder, L"vorla"), name);

@@ -77,6 +77,7 @@ constexpr size_t kPathBuffer = 2048;
 struct PackEntry {
   CString path;
   const PHOTO_ITEM_INFO* photo = nullptr;
+  std::string refused;  // why the photo was not copied for packing (a link out of the data root)
 };
 
 // Writes one document; lives for one export call.
@@ -228,8 +229,9 @@ class KmlWriter {
                                : FormatString(L"%d.%s", photoNumber_, extension.c_str());
       const CString copy = PathJoin(scratch_, name);
       // A copy that fails is still listed: packing it then fails and names the photo.
-      CopyFile(photoPath, copy, false);
-      pack_.push_back({copy, &item});
+      navmisc::ClearFileRefusal();
+      const bool copied = CopyFile(photoPath, copy, false);
+      pack_.push_back({copy, &item, copied ? std::string() : navmisc::LastFileRefusal()});
       return Utf8Field(name.view(), kPathBuffer);
     }
     CString source;
@@ -285,7 +287,7 @@ int PackKmz(const CString& path, CPtrList& tracks, CPtrList& items, KmzExportFai
   const std::string documentError = control.error;
 
   // The document travels last, named after the target.
-  PackEntry document{PathJoin(scratch.path(), PathFileTitle(path) + L".kml"), nullptr};
+  PackEntry document{PathJoin(scratch.path(), PathFileTitle(path) + L".kml"), nullptr, {}};
   const bool copied = CopyFile(path, document.path, false);
   ClearTargetFile(path);
   if (!copied) {
@@ -298,7 +300,7 @@ int PackKmz(const CString& path, CPtrList& tracks, CPtrList& items, KmzExportFai
   if (!archive.Create(path)) return Fail(failure, KmzExportFailure::kArchive, nullptr, archive.error());
   for (const PackEntry& entry : pack) {
     if (!archive.AddFile(entry.path, PathFileName(entry.path))) {
-      const std::string why = archive.error();
+      const std::string why = entry.refused.empty() ? archive.error() : entry.refused;
       // The archive keeps what was added before the failure.
       archive.Close();
       return Fail(failure, KmzExportFailure::kAddFile, &entry, why);

@@ -3,6 +3,7 @@
 #include <cstdlib>
 
 #include <gtest/gtest.h>
+#include <unistd.h>
 
 #include "navmisc/export/detail/test_support.h"
 #include "navmisc/platform/datetime.h"
@@ -180,6 +181,25 @@ TEST(ExportKmz, PhotoThatCannotBeAddedIsNamed) {
   EXPECT_EQ(PathFileName(failure.file), L"2.png");
   EXPECT_EQ(failure.message, L"No such file or directory");
   EXPECT_EQ(RunCommand("unzip -Z1 " + ShellQuote((f.root / L"trip.kmz").ToUtf8())).out, "1.jpg\n");
+}
+
+TEST(ExportKmz, PhotoLinkedOutsideTheDataRootIsNotPacked) {
+  if (!HaveProgram("unzip")) GTEST_SKIP() << "unzip is not installed (scripts/setup.sh installs it)";
+  Fixture f;
+  TempDir outside;
+  WriteFileBytes(outside / L"secret", "not for the archive");
+  const PHOTO_ITEM_INFO* linked = f.owned[2].get();  // p2.png
+  const std::string photo = navmisc::NativePath(linked->GetFilePathName());
+  ASSERT_EQ(unlink(photo.c_str()), 0);
+  ASSERT_EQ(symlink(navmisc::NativePath(outside / L"secret").c_str(), photo.c_str()), 0);
+  KmzExportFailure failure;
+  ExportControl control;
+  EXPECT_EQ(ExportKmz(f.root / L"trip.kmz", f.tracks, f.items, &failure, control), 0);
+  EXPECT_EQ(failure.stage, KmzExportFailure::kAddFile);
+  EXPECT_EQ(failure.photo, linked);
+  EXPECT_NE(failure.message.Find(L"leads outside the data root"), -1) << failure.message.ToUtf8();
+  const std::string kmz = ShellQuote((f.root / L"trip.kmz").ToUtf8());
+  EXPECT_EQ(RunCommand("unzip -p " + kmz).out.find("not for the archive"), std::string::npos);
 }
 
 }  // namespace

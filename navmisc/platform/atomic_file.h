@@ -1,7 +1,10 @@
 // Writing a file so that readers see either the old content or the whole new one: the bytes go
 // to a temporary file in the same folder, which is flushed and renamed over the target on
 // Commit. Destroying an uncommitted AtomicFile removes the temporary file and leaves the target
-// as it was.
+// as it was. Inside a FileTransaction, Commit only stages the complete file and the transaction
+// puts it into place with the others. A target under the data root that a symbolic link leads out of it is refused.
+// Temporary files that a killed save of the same target left behind are removed on Open (see
+// docs/data-root-safety.md).
 #pragma once
 
 #include <sys/types.h>
@@ -46,9 +49,15 @@ class AtomicFile {
   const std::string& TempPath() const;
   // Removes the temporary file; the target stays as it was.
   void Abandon();
+  // Why the last Open, Write or Commit failed, in words ("cannot write /d/x.BIN: No space left
+  // on device"); empty when none did.
+  const std::string& error() const { return error_; }
 
  private:
   bool Flush();
+  bool Failed(const std::string& what, int err);  // records the first failure; false
+  bool Report(const std::string& why);            // the same with the words given
+  void WriteFailed();
   void StartWriteback();
   int fd_ = -1;
   off_t written_ = 0;      // bytes in the temporary file
@@ -59,6 +68,7 @@ class AtomicFile {
   std::string target_;
   std::string temp_;
   std::string buffer_;
+  std::string error_;
 };
 
 // Makes the entries of a folder durable (fsync of the folder), after files were renamed into it.
@@ -69,6 +79,8 @@ namespace testing {
 // OutputFile in this process, every further write fails as a full disk would. A negative value
 // switches the fault off.
 void FailAtomicWritesAfter(long long bytes);
+// After `renames` more renames into place, every further one fails (EIO). Negative: off.
+void FailAtomicRenamesAfter(int renames);
 }  // namespace testing
 
 }  // namespace navmisc

@@ -4,6 +4,7 @@
 #include <errno.h>
 #include <fcntl.h>
 #include <limits.h>
+#include <pwd.h>
 #include <sys/stat.h>
 #include <sys/types.h>
 #include <time.h>
@@ -17,6 +18,7 @@
 #include <string_view>
 #include <vector>
 
+#include "navmisc/platform/root_confinement.h"
 #include "navmisc/platform/detail/unique_fd.h"
 
 namespace {
@@ -149,13 +151,66 @@ std::string NativePath(const wchar_t* path) {
   return CString(path).ToUtf8();
 }
 
+namespace {
+thread_local std::string t_refusal;
+
+const char* KindOf(mode_t mode) {
+  if (S_ISFIFO(mode)) return "a named pipe";
+  if (S_ISCHR(mode)) return "a character device";
+  if (S_ISBLK(mode)) return "a block device";
+  if (S_ISSOCK(mode)) return "a socket";
+  if (S_ISDIR(mode)) return "a folder";
+  return "not a plain file";
+}
+
+bool RefuseUnlessRegular(const std::string& path, const struct stat& st) {
+  if (S_ISREG(st.st_mode)) return false;
+  NoteFileRefusal(path + " is " + KindOf(st.st_mode) + ", not a regular file");
+  return true;
+}
+}  // namespace
+
+std::string LastFileRefusal() { return t_refusal; }
+void ClearFileRefusal() { t_refusal.clear(); }
+void NoteFileRefusal(std::string why) { t_refusal = std::move(why); }
+
+int OpenRegularFile(const std::string& path, bool followLink) {
+  if (path.empty()) {
+    errno = ENOENT;
+    return -1;
+  }
+  // Opening a device can itself have effects, so its kind is looked at first; the check on the
+  // open descriptor then covers a swap in between, and O_NONBLOCK keeps that open of a pipe
+  // from waiting for a writer.
+  struct stat st;
+  const int looked = followLink ? ::stat(path.c_str(), &st) : ::lstat(path.c_str(), &st);
+  if (looked == 0 && !S_ISLNK(st.st_mode) && RefuseUnlessRegular(path, st)) {
+    errno = EINVAL;
+    return -1;
+  }
+  if (!StaysInDataRoot(path, followLink)) {
+    errno = EACCES;
+    return -1;
+  }
+  Fd fd(::open(path.c_str(), O_RDONLY | O_NONBLOCK | O_NOCTTY | O_CLOEXEC | (followLink ? 0 : O_NOFOLLOW)));
+  if (!fd.ok()) return -1;
+  if (::fstat(fd.get(), &st) != 0) return -1;
+  if (RefuseUnlessRegular(path, st)) {
+    errno = EINVAL;
+    return -1;
+  }
+  const int flags = ::fcntl(fd.get(), F_GETFL);
+  if (flags >= 0) ::fcntl(fd.get(), F_SETFL, flags & ~O_NONBLOCK);
+  return fd.release();
+}
+
 }  // namespace navmisc
 
 using navmisc::NativePath;
 
-bool MakeDir(const wchar_t* path) {
+bool MakeDir(const wchar_t* path, unsigned mode) {
   std::string p = StripTrailingSeparators(NativePath(path));
-  if (p.empty()) return false;
+  if (p.empty() || !navmisc::StaysInDataRoot(p, true)) return false;
   struct stat st;
   if (::stat(p.c_str(), &st) == 0) return S_ISDIR(st.st_mode);
   // Create each level in turn. Failures are not decisive on their own: a level may exist
@@ -163,7 +218,7 @@ bool MakeDir(const wchar_t* path) {
   // at the end says whether the whole path is there.
   for (size_t pos = p.find('/', 1);; pos = p.find('/', pos + 1)) {
     std::string part = p.substr(0, pos);
-    if (!part.empty() && part.back() != '/') ::mkdir(part.c_str(), 0777);
+    if (!part.empty() && part.back() != '/') ::mkdir(part.c_str(), static_cast<mode_t>(mode));
     if (pos == std::string::npos) break;
   }
   return ::stat(p.c_str(), &st) == 0 && S_ISDIR(st.st_mode);
@@ -171,7 +226,7 @@ bool MakeDir(const wchar_t* path) {
 
 bool RemoveDir(const wchar_t* path, const wchar_t* pattern) {
   std::string p = StripTrailingSeparators(NativePath(path));
-  if (p.empty() || p == "/") return false;
+  if (p.empty() || p == "/" || !navmisc::StaysInDataRoot(p, false)) return false;
   {
     Fd dir(::open(p.c_str(), O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC));
     if (!dir.ok()) {
@@ -207,11 +262,11 @@ int GetContent(const wchar_t* folder, const wchar_t* pattern, CStringList& names
 bool CopyFile(const wchar_t* from, const wchar_t* to, bool failIfExists) {
   std::string src = NativePath(from);
   std::string dst = NativePath(to);
-  if (src.empty() || dst.empty()) return false;
-  Fd in(::open(src.c_str(), O_RDONLY | O_CLOEXEC));
+  if (src.empty() || dst.empty() || !navmisc::StaysInDataRoot(dst, true)) return false;
+  Fd in(navmisc::OpenRegularFile(src));
   if (!in.ok()) return false;
   struct stat sst;
-  if (::fstat(in.get(), &sst) != 0 || !S_ISREG(sst.st_mode)) return false;
+  if (::fstat(in.get(), &sst) != 0) return false;
   struct stat dst_st;
   if (::stat(dst.c_str(), &dst_st) == 0) {
     if (failIfExists) return false;
@@ -251,7 +306,7 @@ bool CopyFile(const wchar_t* from, const wchar_t* to, bool failIfExists) {
 
 bool DeleteFile(const wchar_t* path) {
   std::string p = NativePath(path);
-  return !p.empty() && ::unlink(p.c_str()) == 0;
+  return !p.empty() && navmisc::StaysInDataRoot(p, false) && ::unlink(p.c_str()) == 0;
 }
 
 int PathStatus(const wchar_t* path) {
@@ -315,8 +370,10 @@ bool SetFileMode(const wchar_t* path, int mode) {
 bool SetFileNormal(const wchar_t* path) {
   std::string p = NativePath(path);
   struct stat st;
-  if (p.empty() || ::stat(p.c_str(), &st) != 0) return false;
-  if (st.st_mode & S_IWUSR) return true;
+  if (p.empty() || ::lstat(p.c_str(), &st) != 0) return false;
+  // A link has no mode of its own, and the file it names is not the caller's to change.
+  if (S_ISLNK(st.st_mode) || (st.st_mode & S_IWUSR)) return true;
+  if (!navmisc::StaysInDataRoot(p, false)) return false;
   return ::chmod(p.c_str(), (st.st_mode & 07777) | S_IWUSR) == 0;
 }
 
@@ -360,10 +417,25 @@ CString GetCurrentExecPath() {
   return PathFolder(CString::FromUtf8(buf));
 }
 
+namespace {
+// The home folder of the user's account, for a process started without HOME.
+std::string AccountHome() {
+  std::string buf(16384, '\0');
+  passwd entry;
+  passwd* found = nullptr;
+  if (::getpwuid_r(::geteuid(), &entry, buf.data(), buf.size(), &found) != 0 || !found || !found->pw_dir) return {};
+  return found->pw_dir;
+}
+}  // namespace
+
 CString UserConfigFolder() {
   if (const char* x = std::getenv("XDG_CONFIG_HOME"); x && *x == '/') return CString::FromUtf8(x);
+  // Without HOME the account's home folder, never a shared folder such as /tmp, where another
+  // user could prepare the path first.
   const char* home = std::getenv("HOME");
-  return CString::FromUtf8(std::string(home && *home ? home : "/tmp") + "/.config");
+  const std::string folder = home && *home ? std::string(home) : AccountHome();
+  if (folder.empty() || folder[0] != '/') return {};
+  return CString::FromUtf8(folder + "/.config");
 }
 
 CString AbsolutePath(const wchar_t* path) {

@@ -4,8 +4,9 @@
 #include "navmisc/platform/cstring.h"
 #include "navmisc/platform/lists.h"
 
-// Creates the folder and every missing parent. True when the folder exists afterwards.
-bool MakeDir(const wchar_t* path);
+// Creates the folder and every missing parent, those it creates with `mode` (narrowed by the
+// umask); folders that exist keep theirs. True when the folder exists afterwards.
+bool MakeDir(const wchar_t* path, unsigned mode = 0777);
 // Removes the entries of `path` that match `pattern` ("*.*" or "*" = all) with everything in
 // them, then the folder itself when it is empty. Symbolic links are removed as links, never
 // followed; nothing outside `path` is touched. When `path` itself is a symbolic link nothing is
@@ -53,7 +54,7 @@ void SleepMs(unsigned ms);
 // The folder of the running executable, without a trailing separator.
 CString GetCurrentExecPath();
 // The user's folder for settings: $XDG_CONFIG_HOME when it is an absolute path, else
-// $HOME/.config (/tmp/.config without a home).
+// $HOME/.config (the account's home folder without HOME); empty when there is no home folder.
 CString UserConfigFolder();
 
 // `path` made absolute against the current folder, with "." and ".." steps removed (links are
@@ -75,4 +76,19 @@ bool IsPlainPathComponent(const wchar_t* name);
 namespace navmisc {
 // The narrow (UTF-8) form of a path, for the system calls.
 std::string NativePath(const wchar_t* path);
+
+// Opens a file for reading only when it is a regular file: a named pipe or a device in its
+// place is refused without blocking (a pipe could wait forever for a writer, /dev/zero never
+// ends). -1 when the file cannot be opened (errno tells why) or is refused (recorded for
+// LastFileRefusal). The descriptor is blocking and close-on-exec. Without `followLink`, a
+// symbolic link as the last component fails (ELOOP).
+int OpenRegularFile(const std::string& nativePath, bool followLink = true);
+
+// Why the last file step of this thread was refused for safety, in words for the user:
+// "/data/Resource/T1/TK_1.BIN is a named pipe, not a regular file". Empty when none was since
+// ClearFileRefusal. Callers that get only 0 or false from a read use it to say why.
+std::string LastFileRefusal();
+void ClearFileRefusal();
+// Records a refusal (the platform layer's own steps call it).
+void NoteFileRefusal(std::string why);
 }  // namespace navmisc

@@ -18,17 +18,30 @@ LineReader::~LineReader() { Close(); }
 
 bool LineReader::Open(const wchar_t* path) {
   Close();
-  fd_ = ::open(NativePath(path).c_str(), O_RDONLY | O_CLOEXEC);
+  // Only a regular file: a pipe would block, a device such as /dev/zero would never end.
+  fd_ = OpenRegularFile(NativePath(path));
   if (fd_ < 0) return false;
   buf_.resize(kBufferSize);
+  data_ = buf_.data();
   begin_ = end_ = 0;
   eof_ = false;
+  open_ = true;
   return true;
+}
+
+void LineReader::OpenMemory(std::string_view bytes) {
+  Close();
+  data_ = bytes.data();
+  begin_ = 0;
+  end_ = bytes.size();
+  eof_ = true;
+  open_ = true;
 }
 
 void LineReader::Close() {
   if (fd_ >= 0) ::close(fd_);
   fd_ = -1;
+  open_ = false;
 }
 
 bool LineReader::Fill() {
@@ -51,10 +64,10 @@ bool LineReader::Fill() {
 }
 
 bool LineReader::Next(std::string_view& line) {
-  if (fd_ < 0) return false;
+  if (!open_) return false;
   long_.clear();
   for (;;) {
-    const char* start = buf_.data() + begin_;
+    const char* start = data_ + begin_;
     const size_t avail = end_ - begin_;
     const char* nl = static_cast<const char*>(std::memchr(start, '\n', avail));
     const size_t take = nl ? static_cast<size_t>(nl - start) : avail;

@@ -1,5 +1,5 @@
 // Reads a text file line by line through a fixed buffer, so that memory stays constant however
-// long the file is.
+// long the file is. Only regular files are read (see OpenRegularFile).
 #pragma once
 
 #include <string>
@@ -19,7 +19,10 @@ class LineReader {
   LineReader& operator=(const LineReader&) = delete;
 
   bool Open(const wchar_t* path);
-  bool IsOpen() const { return fd_ >= 0; }
+  // Reads lines from `bytes` instead of a file, exactly as from a file holding them. The bytes
+  // are not copied: they must stay in place while lines are read.
+  void OpenMemory(std::string_view bytes);
+  bool IsOpen() const { return open_; }
   // The next line without its line end ("\n" or "\r\n"); false at the end of the file or on a
   // read error. The view stays valid until the next call.
   bool Next(std::string_view& line);
@@ -28,8 +31,10 @@ class LineReader {
  private:
   bool Fill();
   int fd_ = -1;
+  bool open_ = false;
   size_t maxLine_;
   std::string buf_;
+  const char* data_ = nullptr;  // buf_, or the bytes given to OpenMemory
   size_t begin_ = 0;
   size_t end_ = 0;
   bool eof_ = false;

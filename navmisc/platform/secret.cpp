@@ -45,21 +45,47 @@ bool WriteAll(int fd, const unsigned char* p, size_t n) {
   return true;
 }
 
+// A key folder must belong to the user and let nobody else write to it: another user who can
+// write there could plant a key of their own (and read what is sealed with it) or take ours away.
+// False (with the reason noted) when it does not hold; also false, silently, when it is missing.
+bool SafeKeyFolder(const std::string& folder) {
+  struct stat st;
+  if (::stat(folder.c_str(), &st) != 0) return false;
+  const char* problem = nullptr;
+  if (!S_ISDIR(st.st_mode)) problem = "is not a folder";
+  else if (st.st_uid != ::geteuid()) problem = "belongs to another user";
+  else if (st.st_mode & (S_IWGRP | S_IWOTH)) problem = "is writable by other users";
+  if (!problem) return true;
+  NoteFileRefusal("the password key folder " + folder + " " + problem + "; no key is kept there");
+  return false;
+}
+
 // Reads the key, creating it on first use. The key file is made with O_EXCL so that two
 // processes racing to create it end up with the same key.
 std::optional<Key> LoadKey(bool create) {
-  const std::string path = NativePath(SecretKeyPath());
+  const CString keyPath = SecretKeyPath();
+  if (keyPath.IsEmpty()) {
+    NoteFileRefusal("no place for the password key: set HOME, XDG_CONFIG_HOME or NAVMISC_KEY_FILE");
+    return std::nullopt;
+  }
+  const std::string path = NativePath(keyPath);
+  const CString folder = PathFolder(keyPath);
+  // Only the folders made here get the private mode; one that was there is the user's own.
+  if (create) MakeDir(folder, 0700);
+  if (!SafeKeyFolder(NativePath(folder))) return std::nullopt;
   Key key;
   for (int attempt = 0; attempt < 2; ++attempt) {
-    Fd in(::open(path.c_str(), O_RDONLY | O_NOFOLLOW | O_CLOEXEC));
+    Fd in(OpenRegularFile(path, /*followLink=*/false));
     if (in.get() >= 0) {
+      struct stat st;
+      if (::fstat(in.get(), &st) != 0 || st.st_uid != ::geteuid()) {
+        NoteFileRefusal("the password key " + path + " belongs to another user");
+        return std::nullopt;
+      }
       if (ReadAll(in.get(), key.data(), key.size())) return key;
       return std::nullopt;  // a damaged key file is never replaced: that would lose the secret
     }
     if (!create || errno != ENOENT) return std::nullopt;
-    const CString folder = PathFolder(SecretKeyPath());
-    MakeDir(folder);
-    ::chmod(NativePath(folder).c_str(), 0700);
     const std::string tmp = path + ".new";
     Fd out(::open(tmp.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_NOFOLLOW | O_CLOEXEC, 0600));
     if (out.get() < 0) continue;
@@ -81,7 +107,8 @@ bool SodiumReady() {
 
 CString SecretKeyPath() {
   if (const char* p = std::getenv("NAVMISC_KEY_FILE"); p && *p) return CString::FromUtf8(p);
-  return PathJoin(UserConfigFolder(), L"navmisc/secret.key");
+  const CString folder = UserConfigFolder();
+  return folder.IsEmpty() ? CString() : PathJoin(folder, L"navmisc/secret.key");
 }
 
 CString ProtectSecret(const CString& clear) {

@@ -3,12 +3,12 @@
 
 #include "navmisc/platform/settings.h"
 
-#include <fcntl.h>
-#include <sys/stat.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <cerrno>
 #include <charconv>
+#include <climits>
 #include <cstdint>
 #include <memory>
 #include <mutex>
@@ -64,7 +64,11 @@ bool HasControl(std::string_view s) {
 // never occur inside a multi-byte sequence. Other letters match only as written, so that the
 // result never depends on the process locale.
 void FoldInto(std::string& out, std::string_view s) {
-  for (char c : s) out.push_back((c >= 'A' && c <= 'Z') ? static_cast<char>(c - 'A' + 'a') : c);
+  const size_t start = out.size();
+  out.append(s);
+  for (size_t i = start; i < out.size(); ++i) {
+    if (out[i] >= 'A' && out[i] <= 'Z') out[i] = static_cast<char>(out[i] - 'A' + 'a');
+  }
 }
 
 // Index key of one entry. Names never hold control characters, so NUL cannot be part of
@@ -98,10 +102,11 @@ bool NameToUtf8(const wchar_t* name, std::string& out) {
 
 // ---- reading ---------------------------------------------------------------------------------
 
-// The parsed file: values (UTF-8, escapes undone) by EntryKey.
+// The parsed file: values (UTF-8, escapes undone) by EntryKey, and the folded names of every
+// section that has a header (also sections without keys).
 using Index = std::unordered_map<std::string, std::string>;
-
-// The section names of a file in the order they first appear, each once.
+// The section names of a file in the order they first appear, each once, and their folded
+// forms for lookups.
 struct SectionList {
   std::vector<std::string> names;
   std::unordered_set<std::string> folded;
@@ -111,6 +116,11 @@ struct SectionList {
     FoldInto(key, name);
     if (folded.insert(std::move(key)).second) names.push_back(name);
   }
+};
+
+struct Document {
+  Index index;
+  SectionList sections;
 };
 
 // Undoes the quoting of a value that starts with '"'. False when the closing quote is missing.
@@ -175,7 +185,7 @@ std::string CleanName(std::string_view s) {
 // has to be in memory and an absurdly long line costs time in proportion to its length only.
 class Parser {
  public:
-  Parser(Index& index, SectionList& sections) : index_(index), sections_(sections) {}
+  explicit Parser(Document& doc) : doc_(doc) {}
 
   void Feed(std::string_view bytes) {
     while (!bytes.empty()) {
@@ -226,7 +236,7 @@ class Parser {
       if (!IsValidSectionName(name)) return;
       section_ = CleanName(name);
       section_ok_ = true;
-      sections_.Add(section_);
+      doc_.sections.Add(section_);
       return;
     }
     const size_t eq = line.find('=');
@@ -241,11 +251,10 @@ class Parser {
     if (const size_t nul = value.find('\0'); nul != std::string::npos) value.resize(nul);
     if (value.size() > kMaxValueBytes) return;
     // The first occurrence of a key wins; later ones are ignored.
-    index_.try_emplace(EntryKey(section_, CleanName(key)), std::move(value));
+    doc_.index.try_emplace(EntryKey(section_, CleanName(key)), std::move(value));
   }
 
-  Index& index_;
-  SectionList& sections_;
+  Document& doc_;
   std::string pending_;
   bool overlong_ = false;
   std::string section_;  // keys above the first header belong to the section ""
@@ -318,68 +327,166 @@ ssize_t ReadFull(int fd, char* buf, size_t size) {
   return static_cast<ssize_t>(done);
 }
 
+// Turns the bytes of a settings document, in any of its encodings, into entries. Fed in pieces;
+// the encoding is recognised from the start of the first piece.
+class Loader {
+ public:
+  explicit Loader(Document& doc) : parser_(doc) {}
+
+  void Feed(std::string_view bytes) {
+    if (first_) {
+      first_ = false;
+      if (bytes.starts_with("\xEF\xBB\xBF")) {
+        bytes.remove_prefix(3);
+      } else if (bytes.starts_with("\xFF\xFE")) {
+        encoding_ = Encoding::kUtf16Le;
+        bytes.remove_prefix(2);
+      } else if (bytes.starts_with("\xFE\xFF")) {
+        encoding_ = Encoding::kUtf16Be;
+        bytes.remove_prefix(2);
+      } else if (bytes.size() >= 2 && (bytes[0] == '\0') != (bytes[1] == '\0')) {
+        // Text never holds NUL, so one in the first two bytes can only be half of a UTF-16 code
+        // unit: a file saved as UTF-16 without a byte-order mark.
+        encoding_ = bytes[0] == '\0' ? Encoding::kUtf16Be : Encoding::kUtf16Le;
+      }
+      utf16_ = Utf16Decoder(encoding_ == Encoding::kUtf16Be);
+    }
+    if (encoding_ == Encoding::kUtf8) {
+      parser_.Feed(bytes);
+    } else {
+      decoded_.clear();
+      utf16_.Feed(bytes, decoded_);
+      parser_.Feed(decoded_);
+    }
+  }
+
+  void Finish() {
+    if (encoding_ != Encoding::kUtf8) {
+      decoded_.clear();
+      utf16_.Finish(decoded_);
+      parser_.Feed(decoded_);
+    }
+    parser_.Finish();
+  }
+
+ private:
+  enum class Encoding { kUtf8, kUtf16Le, kUtf16Be };
+  Parser parser_;
+  bool first_ = true;
+  Encoding encoding_ = Encoding::kUtf8;
+  Utf16Decoder utf16_{false};
+  std::string decoded_;
+};
+
 // Reads and indexes the file. False when it cannot be opened or read, or is not a regular file
 // (a pipe or a device could block or never end).
-bool LoadFile(const std::string& path, Index& index, SectionList& sections) {
-  Fd fd(::open(path.c_str(), O_RDONLY | O_CLOEXEC));
+bool LoadFile(const std::string& path, Document& doc) {
+  Fd fd(navmisc::OpenRegularFile(path));
   if (fd.get() < 0) return false;
-  struct stat st;
-  if (::fstat(fd.get(), &st) != 0 || !S_ISREG(st.st_mode)) return false;
 
+  Loader loader(doc);
   std::string chunk(kReadChunk, '\0');
-  ssize_t n = ReadFull(fd.get(), chunk.data(), chunk.size());
-  if (n < 0) return false;
-  std::string_view first(chunk.data(), static_cast<size_t>(n));
-
-  Parser parser(index, sections);
-  enum class Encoding { kUtf8, kUtf16Le, kUtf16Be } encoding = Encoding::kUtf8;
-  if (first.starts_with("\xEF\xBB\xBF")) {
-    first.remove_prefix(3);
-  } else if (first.starts_with("\xFF\xFE")) {
-    encoding = Encoding::kUtf16Le;
-    first.remove_prefix(2);
-  } else if (first.starts_with("\xFE\xFF")) {
-    encoding = Encoding::kUtf16Be;
-    first.remove_prefix(2);
-  }
-  Utf16Decoder utf16(encoding == Encoding::kUtf16Be);
-  std::string decoded;
-  auto feed = [&](std::string_view bytes) {
-    if (encoding == Encoding::kUtf8) {
-      parser.Feed(bytes);
-    } else {
-      decoded.clear();
-      utf16.Feed(bytes, decoded);
-      parser.Feed(decoded);
-    }
-  };
-
-  feed(first);
-  while (static_cast<size_t>(n) == chunk.size()) {
-    n = ReadFull(fd.get(), chunk.data(), chunk.size());
+  for (;;) {
+    const ssize_t n = ReadFull(fd.get(), chunk.data(), chunk.size());
     if (n < 0) return false;
-    feed(std::string_view(chunk.data(), static_cast<size_t>(n)));
+    loader.Feed(std::string_view(chunk.data(), static_cast<size_t>(n)));
+    if (static_cast<size_t>(n) < chunk.size()) break;
   }
-  if (encoding != Encoding::kUtf8) {
-    decoded.clear();
-    utf16.Finish(decoded);
-    parser.Feed(decoded);
-  }
-  parser.Finish();
+  loader.Finish();
+  return true;
+}
+
+// Splits a folded name at its last run of digits: "section_tk(12)" into "section_tk(", 12 and
+// ")". False when there is none, or the digits are not an int in plain decimal (no leading
+// zero), the form a list's writer gives them.
+bool SplitAtLastNumber(std::string_view name, std::string_view& before, int& number, std::string_view& after) {
+  auto digit = [](char c) { return c >= '0' && c <= '9'; };
+  size_t end = name.size();
+  while (end > 0 && !digit(name[end - 1])) --end;
+  if (end == 0) return false;
+  size_t begin = end;
+  while (begin > 0 && digit(name[begin - 1])) --begin;
+  const std::string_view digits = name.substr(begin, end - begin);
+  if (digits.size() > 10 || (digits.size() > 1 && digits[0] == '0')) return false;
+  long long value = 0;
+  for (char c : digits) value = value * 10 + (c - '0');
+  if (value > INT_MAX) return false;
+  before = name.substr(0, begin);
+  number = static_cast<int>(value);
+  after = name.substr(end);
   return true;
 }
 
 struct Reader {
-  Index index;
-  SectionList sections;
+  Document doc;
 
-  // The stored value of section/key, or null.
+  // The stored value of section/key, or null. Lookups are the hot path of reading a trip, so
+  // the key is built in buffers that the thread keeps.
   const std::string* Find(const wchar_t* section, const wchar_t* key) const {
-    std::string s, k;
-    if (!NameToUtf8(section, s) || !NameToUtf8(key, k)) return nullptr;
-    const auto it = index.find(EntryKey(s, k));
-    return it == index.end() ? nullptr : &it->second;
+    thread_local std::string name, entry;
+    entry.clear();
+    if (!NameToUtf8(section, name)) return nullptr;
+    FoldInto(entry, name);
+    entry.push_back('\0');
+    if (!NameToUtf8(key, name)) return nullptr;
+    FoldInto(entry, name);
+    const auto it = doc.index.find(entry);
+    return it == doc.index.end() ? nullptr : &it->second;
   }
+
+  // The numbers n < count, ascending, for which a section (when `section` is null) or a key of
+  // `section` is named `pattern` with n in place of its "%d".
+  std::vector<int> Indices(const wchar_t* section, const wchar_t* pattern, int count) const {
+    const std::wstring_view p = pattern ? std::wstring_view(pattern) : std::wstring_view();
+    const size_t at = p.find(L"%d");
+    std::string before, after, s;
+    if (count <= 0 || at == std::wstring_view::npos ||
+        !navmisc::WideToUtf8(p.substr(0, at), before) || !navmisc::WideToUtf8(p.substr(at + 2), after) ||
+        (section && !NameToUtf8(section, s))) {
+      return {};
+    }
+    std::string id = section ? "k" : "s";
+    if (section) {
+      id.push_back('\0');
+      FoldInto(id, s);
+    }
+    id.push_back('\0');
+    FoldInto(id, before);
+    id.push_back('\0');
+    FoldInto(id, after);
+    std::call_once(lists_built_, [this] { BuildLists(); });
+    const auto it = lists_.find(id);
+    if (it == lists_.end()) return {};
+    const std::vector<int>& all = it->second;
+    return std::vector<int>(all.begin(), std::lower_bound(all.begin(), all.end(), count));
+  }
+
+ private:
+  // Groups every section name, and every key name per section, that ends in a number by what
+  // stands around that number, so that a list of any count is found in one lookup.
+  void BuildLists() const {
+    auto add = [this](std::string id, std::string_view name) {
+      std::string_view before, after;
+      int n;
+      if (!SplitAtLastNumber(name, before, n, after)) return;
+      id.append(before);
+      id.push_back('\0');
+      id.append(after);
+      lists_[id].push_back(n);
+    };
+    for (const std::string& section : doc.sections.folded) add(std::string("s", 2), section);
+    for (const auto& [entry, value] : doc.index) {
+      const size_t nul = entry.find('\0');
+      add("k" + std::string(1, '\0') + entry.substr(0, nul + 1), std::string_view(entry).substr(nul + 1));
+    }
+    for (auto& [id, numbers] : lists_) {
+      std::sort(numbers.begin(), numbers.end());
+      numbers.erase(std::unique(numbers.begin(), numbers.end()), numbers.end());
+    }
+  }
+
+  mutable std::once_flag lists_built_;
+  mutable std::unordered_map<std::string, std::vector<int>> lists_;
 };
 
 // ---- writing ---------------------------------------------------------------------------------
@@ -532,7 +639,7 @@ void WriteText(unsigned long handle, const wchar_t* section, const wchar_t* key,
 unsigned long RD_BEGIN(const wchar_t* path) {
   if (!path || !*path) return 0;
   auto reader = std::make_shared<Reader>();
-  if (!LoadFile(navmisc::NativePath(path), reader->index, reader->sections)) return 0;
+  if (!LoadFile(navmisc::NativePath(path), reader->doc)) return 0;
   return Readers().Add(std::move(reader));
 }
 
@@ -577,11 +684,59 @@ bool RD_EXISTS(unsigned long handle, const wchar_t* section, const wchar_t* key)
 int RD_SECTIONS(unsigned long handle, CStringList& names) {
   const auto reader = Readers().Get(handle);
   if (!reader) return 0;
-  for (const std::string& name : reader->sections.names) names.AddTail(CString::FromUtf8(name));
-  return static_cast<int>(reader->sections.names.size());
+  for (const std::string& name : reader->doc.sections.names) names.AddTail(CString::FromUtf8(name));
+  return static_cast<int>(reader->doc.sections.names.size());
 }
 
 void RD_END(unsigned long handle) { Readers().Take(handle); }
+
+std::vector<int> navmisc::SectionIndices(unsigned long handle, const wchar_t* pattern, int count) {
+  const auto reader = Readers().Get(handle);
+  return reader ? reader->Indices(nullptr, pattern, count) : std::vector<int>();
+}
+
+std::vector<int> navmisc::SectionIndices(unsigned long handle, const wchar_t* pattern, const wchar_t* parent,
+                                         int count) {
+  std::wstring own = pattern ? pattern : L"";
+  if (const size_t at = own.find(L"%s"); at != std::wstring::npos) own.replace(at, 2, parent ? parent : L"");
+  return SectionIndices(handle, own.c_str(), count);
+}
+
+std::vector<int> navmisc::KeyIndices(unsigned long handle, const wchar_t* section, const wchar_t* pattern,
+                                     int count) {
+  const auto reader = Readers().Get(handle);
+  return reader && section ? reader->Indices(section, pattern, count) : std::vector<int>();
+}
+
+unsigned long navmisc::ReadSettingsFromMemory(std::string_view bytes) {
+  auto reader = std::make_shared<Reader>();
+  Loader loader(reader->doc);
+  loader.Feed(bytes);
+  loader.Finish();
+  return Readers().Add(std::move(reader));
+}
+
+std::vector<navmisc::SettingsEntry> navmisc::SettingsEntries(unsigned long handle) {
+  std::vector<SettingsEntry> out;
+  const auto reader = Readers().Get(handle);
+  if (!reader) return out;
+  out.reserve(reader->doc.index.size());
+  for (const auto& [entry, value] : reader->doc.index) {
+    const std::string_view name = entry;
+    const size_t nul = name.find('\0');
+    out.push_back({CString(FromUtf8Lossy(name.substr(0, nul))), CString(FromUtf8Lossy(name.substr(nul + 1))),
+                   CString(FromUtf8Lossy(value))});
+  }
+  return out;
+}
+
+bool navmisc::EndSettingsToMemory(unsigned long handle, std::string& document) {
+  const auto writer = Writers().Take(handle);
+  if (!writer) return false;
+  std::lock_guard lock(writer->mu);
+  document = writer->Serialize();
+  return true;
+}
 
 unsigned long WR_BEGIN(const wchar_t* path) {
   if (!path || !*path) return 0;

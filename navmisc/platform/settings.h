@@ -8,6 +8,10 @@
 // The format is described in docs/settings-format.md.
 #pragma once
 
+#include <string>
+#include <string_view>
+#include <vector>
+
 #include "navmisc/platform/cstring.h"
 #include "navmisc/platform/lists.h"
 
@@ -36,3 +40,33 @@ void WR_STRING(unsigned long handle, const wchar_t* section, const wchar_t* key,
 int WR_END(unsigned long handle);
 // Drops an unfinished document and releases the handle; the file stays as it was.
 void WR_ABANDON(unsigned long handle);
+
+namespace navmisc {
+
+// Lists are stored as a count key plus one section (or key) per entry. These give the entry
+// numbers n, ascending and below `count`, for which the section named by `pattern` with n in
+// place of its one "%d" exists (a section with a header counts even without keys), or the key
+// of `section` named so. n is matched in plain decimal as the writer puts it; the text after
+// "%d" must not hold a digit. Reading a list through them costs time in proportion to the file,
+// however large the count it states.
+std::vector<int> SectionIndices(unsigned long handle, const wchar_t* pattern, int count);
+// The same for sections named after a parent section, as the files name their lists:
+// `pattern` "%s_RN(%d)" with `parent` "SECTION" looks for SECTION_RN(0), SECTION_RN(1), ...
+std::vector<int> SectionIndices(unsigned long handle, const wchar_t* pattern, const wchar_t* parent, int count);
+std::vector<int> KeyIndices(unsigned long handle, const wchar_t* section, const wchar_t* pattern, int count);
+
+
+// Settings documents in memory, read and written exactly as files are (for tests and fuzzing):
+// a reader over `bytes` as RD_BEGIN over a file holding them (release it with RD_END), and the
+// end of a writer that hands over the document WR_END would write. False for an unknown handle.
+unsigned long ReadSettingsFromMemory(std::string_view bytes);
+bool EndSettingsToMemory(unsigned long handle, std::string& document);
+// Every entry a reader holds, its section and key with ASCII letters in lower case and its
+// value as RD_STRING gives it, in no particular order.
+struct SettingsEntry {
+  CString section, key, value;
+  friend bool operator==(const SettingsEntry&, const SettingsEntry&) = default;
+};
+std::vector<SettingsEntry> SettingsEntries(unsigned long handle);
+
+}  // namespace navmisc

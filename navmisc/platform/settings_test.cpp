@@ -2,16 +2,19 @@
 
 #include <sys/stat.h>
 
+#include <algorithm>
 #include <cfloat>
 #include <climits>
 #include <cmath>
 #include <filesystem>
 #include <string>
+#include <tuple>
 #include <vector>
 
 #include <gtest/gtest.h>
 
 #include "navmisc/platform/atomic_file.h"
+#include "navmisc/platform/file_transaction.h"
 #include "navmisc/platform/files.h"
 #include "testutil.h"
 
@@ -241,14 +244,14 @@ TEST(SettingsTest, DamagedFilesReadWhatTheyCan) {
     EXPECT_EQ(RD_INT(r, L"S", L"\xFFFD\xFFFD", 0), 2);
     RD_END(r);
   }
-  {  // UTF-16 with a byte-order mark, both byte orders, a pair beyond the BMP included
+  {  // UTF-16 with or without a byte-order mark, both byte orders, a pair beyond the BMP included
     const std::u16string text = u"[S]\r\nk=Grüße \U0001F6B4\r\n";
-    std::string le = "\xFF\xFE", be = "\xFE\xFF";
+    std::string le, be;
     for (char16_t u : text) {
       le += {static_cast<char>(u & 0xFF), static_cast<char>(u >> 8)};
       be += {static_cast<char>(u >> 8), static_cast<char>(u & 0xFF)};
     }
-    for (const std::string& bytes : {le, be}) {
+    for (const std::string& bytes : {"\xFF\xFE" + le, "\xFE\xFF" + be, le, be}) {
       const unsigned long r = ReadBytes(dir, bytes);
       EXPECT_EQ(RD_STRING(r, L"s", L"K"), L"Grüße \U0001F6B4");
       RD_END(r);
@@ -266,6 +269,61 @@ TEST(SettingsTest, DamagedFilesReadWhatTheyCan) {
     RD_END(r);
   }
   EXPECT_EQ(RD_BEGIN(dir.path()), 0u) << "a folder is not a settings file";
+}
+
+// Lists are found by the sections and keys present, never by walking a count.
+TEST(SettingsTest, ListIndicesAreTheEntriesPresentBelowTheCount) {
+  TempDir dir;
+  const unsigned long r = ReadBytes(dir,
+                                    "[SECTION_RN(0)]\n[section_rn(2)]\nk=1\n[SECTION_RN(02)]\n"
+                                    "[SECTION_RN(10)]\n[SECTION_RN(2147483648)]\n[SECTION_RN(-1)]\n"
+                                    "[SECTION_RN(3)x]\n[SECTION_0]\n[SECTION_0_4]\n[SECTION_1]\n"
+                                    "[SECTION_0_4_7]\n[S]\nitem_(5)_id=a\nITEM_(1)_ID=b\nitem_(1)=c\n");
+  using navmisc::KeyIndices;
+  using navmisc::SectionIndices;
+  EXPECT_EQ(SectionIndices(r, L"SECTION_RN(%d)", 2147483647), (std::vector<int>{0, 2, 10}));
+  EXPECT_EQ(SectionIndices(r, L"%s_RN(%d)", L"SECTION", 10), (std::vector<int>{0, 2}));
+  EXPECT_EQ(SectionIndices(r, L"%s_%d", L"SECTION", 5), (std::vector<int>{0, 1}));
+  EXPECT_EQ(SectionIndices(r, L"%s_%d", L"SECTION_0", 5), (std::vector<int>{4}));
+  EXPECT_EQ(SectionIndices(r, L"%s_%d", L"section_0_4", 8), (std::vector<int>{7}));
+  EXPECT_EQ(KeyIndices(r, L"s", L"item_(%d)_id", 100), (std::vector<int>{1, 5}));
+  EXPECT_EQ(KeyIndices(r, L"S", L"item_(%d)", 100), (std::vector<int>{1}));
+  for (int count : {0, -5}) EXPECT_TRUE(SectionIndices(r, L"SECTION_RN(%d)", count).empty());
+  EXPECT_TRUE(SectionIndices(r, L"SECTION_RN", 100).empty()) << "no number in the pattern";
+  RD_END(r);
+  EXPECT_TRUE(SectionIndices(r, L"SECTION_RN(%d)", 100).empty()) << "an ended handle";
+}
+
+// Documents in memory (what the fuzz targets use) read and write exactly as files do.
+TEST(SettingsTest, MemoryDocumentsMatchFiles) {
+  TempDir dir;
+  for (const std::string& bytes : {std::string("[S]\nk=1\nK=2\n[t]\nv=\" x\"\n"), std::string("\xEF\xBB\xBF[S]\r\nk=\xC3(\r\n"),
+                                  std::string("[\0S\0]\0\n\0k\0=\0\xE9\0", 14), std::string()}) {
+    const unsigned long file = ReadBytes(dir, bytes), memory = navmisc::ReadSettingsFromMemory(bytes);
+    auto sorted = [](std::vector<navmisc::SettingsEntry> v) {
+      std::sort(v.begin(), v.end(), [](const auto& a, const auto& b) {
+        return std::tie(a.section, a.key) < std::tie(b.section, b.key);
+      });
+      return v;
+    };
+    const auto entries = sorted(navmisc::SettingsEntries(file));
+    EXPECT_EQ(entries, sorted(navmisc::SettingsEntries(memory)));
+    EXPECT_EQ(entries.empty(), bytes.empty());
+    for (const auto& e : entries) EXPECT_EQ(RD_STRING(memory, e.section, e.key), e.value);
+    RD_END(file);
+    RD_END(memory);
+  }
+  const CString path = dir / L"out.ini";
+  const unsigned long toFile = WR_BEGIN(path), toMemory = WR_BEGIN(L"unused");
+  for (unsigned long w : {toFile, toMemory}) {
+    WR_STRING(w, L"S", L"text", L" padded ");
+    WR_FLOAT(w, L"S", L"x", 0.1);
+  }
+  std::string document;
+  ASSERT_EQ(WR_END(toFile), 1);
+  ASSERT_TRUE(navmisc::EndSettingsToMemory(toMemory, document));
+  EXPECT_EQ(ReadFileBytes(path), document);
+  EXPECT_FALSE(navmisc::EndSettingsToMemory(toMemory, document)) << "the handle is gone";
 }
 
 TEST(SettingsTest, FailedOrUnfinishedWritesLeaveTheOldFile) {
@@ -377,6 +435,45 @@ TEST(AtomicFileTest, FailuresAndAbandonLeaveTargetAndNoTemporaryFile) {
   navmisc::AtomicFile f;
   EXPECT_FALSE(f.Open(dir / L"missing/t.txt"));
   EXPECT_FALSE(f.Open(L""));
+}
+
+TEST(AtomicFileTest, TransactionsPutFilesInPlaceTogetherOnCommit) {
+  TempDir dir;
+  auto write = [&](const wchar_t* name, const std::string& text) {
+    navmisc::AtomicFile f;
+    return f.Open(dir / name) && f.Write(text) && f.Commit();
+  };
+  {
+    navmisc::FileTransaction outer;
+    ASSERT_TRUE(write(L"a", "first"));
+    {
+      navmisc::FileTransaction inner;  // joins the outer one
+      ASSERT_TRUE(write(L"b", "b"));
+      ASSERT_TRUE(write(L"a", "second"));  // the same target again: the later text wins
+      EXPECT_TRUE(inner.Commit());
+    }
+    EXPECT_FALSE(FileExists(dir / L"a")) << "nothing is in place before the outer Commit";
+    ASSERT_TRUE(outer.Commit());
+  }
+  EXPECT_EQ(ReadFileBytes(dir / L"a"), "second");
+  EXPECT_EQ(ReadFileBytes(dir / L"b"), "b");
+  EXPECT_EQ(FolderEntries(dir.path()).size(), 2u) << "no temporary file is left";
+
+  {  // a file given up half-way fails the whole transaction
+    navmisc::FileTransaction tx;
+    ASSERT_TRUE(write(L"a", "third"));
+    navmisc::AtomicFile unfinished;
+    ASSERT_TRUE(unfinished.Open(dir / L"b"));
+    unfinished.Abandon();
+    EXPECT_FALSE(tx.Commit());
+    EXPECT_NE(tx.error().find("gave up writing"), std::string::npos) << tx.error();
+  }
+  {  // without Commit nothing happens
+    navmisc::FileTransaction tx;
+    ASSERT_TRUE(write(L"a", "fourth"));
+  }
+  EXPECT_EQ(ReadFileBytes(dir / L"a"), "second");
+  EXPECT_EQ(FolderEntries(dir.path()).size(), 2u);
 }
 
 }  // namespace

@@ -46,6 +46,10 @@ bool WideToUtf8(std::wstring_view in, std::string& out) {
   out.reserve(in.size());
   for (wchar_t w : in) {
     const char32_t c = static_cast<char32_t>(w);
+    if (c < 0x80) {  // most text is ASCII
+      out.push_back(static_cast<char>(c));
+      continue;
+    }
     if (!ValidScalar(c)) {
       out.clear();
       return false;

@@ -9,6 +9,7 @@
 #include <cstring>
 
 #include "navmisc/platform/detail/error_text.h"
+#include "navmisc/platform/detail/temp_files.h"
 #include "navmisc/platform/files.h"
 #include "navmisc/platform/textconv.h"
 
@@ -18,16 +19,14 @@ namespace {
 // libzip reads added files only when the archive is written. Opening the file now turns a
 // missing or unreadable file into an error of its own addition rather than of the close.
 bool CheckReadable(const std::string& native, std::string& error) {
-  const int fd = ::open(native.c_str(), O_RDONLY | O_CLOEXEC);
+  ClearFileRefusal();
+  const int fd = OpenRegularFile(native);
   if (fd < 0) {
-    error = detail::ErrorText(errno);
+    error = LastFileRefusal().empty() ? detail::ErrorText(errno) : "not a regular file";
     return false;
   }
-  struct stat st;
-  const bool regular = ::fstat(fd, &st) == 0 && S_ISREG(st.st_mode);
   ::close(fd);
-  if (!regular) error = "not a regular file";
-  return regular;
+  return true;
 }
 
 }  // namespace

@@ -3,6 +3,7 @@
 #include "navmisc/platform/zip_archive.h"
 
 #include <gtest/gtest.h>
+#include <sys/stat.h>
 
 #include "navmisc/platform/files.h"
 #include "testutil.h"
@@ -17,11 +18,13 @@ TEST(ZipArchiveWriter, RefusedAdditionsAndUnfinishedArchivesLeaveNothing) {
   TempDir dir;
   WriteFileBytes(dir / L"a.txt", "a");
   ASSERT_TRUE(MakeDir(dir / L"folder"));
+  ASSERT_EQ(mkfifo(navmisc::NativePath(dir / L"pipe").c_str(), 0600), 0);  // must not block
   {
     ZipArchiveWriter zip;
     ASSERT_TRUE(zip.Create(dir / L"dropped.zip"));
     ASSERT_TRUE(zip.AddFile(dir / L"a.txt", L"a.txt"));
-    for (const auto& [file, name] : {std::pair{dir / L"folder", L"f"}, {dir / L"a.txt", L"a.txt"},
+    for (const auto& [file, name] : {std::pair{dir / L"folder", L"f"}, {dir / L"pipe", L"p"},
+                                     {dir / L"a.txt", L"a.txt"},
                                      {dir / L"a.txt", L""}, {dir / L"a.txt", L"bad\xD800"}}) {
       EXPECT_FALSE(zip.AddFile(file, name)) << file.ToUtf8();
       EXPECT_FALSE(zip.error().empty());

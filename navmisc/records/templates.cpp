@@ -31,7 +31,7 @@ int ReadTemplateInfo(CString language) {
       return text;
     };
     const int count = RD_INT(h, L"templates", L"temp_count", 0);
-    for (int i = 0; i < count; ++i) {
+    for (int i : navmisc::SectionIndices(h, L"temp.%d", count)) {
       const CString s = FormatString(L"temp.%-d", i);
       auto* t = new TEMPLATE_ITEM_INFO;
       t->name = localise(RD_STRING(h, s, L"name", L""));

@@ -7,10 +7,10 @@
 #include "navmisc/platform/line_reader.h"
 #include "navmisc/platform/settings.h"
 #include "navmisc/records/photo.h"
-#include "navmisc/records/point_codec.h"
 #include "navmisc/records/point_file_format.h"
-#include "navmisc/records/track_point_reader.h"
+#include "navmisc/records/point_lists.h"
 #include "navmisc/records/trip.h"
+#include "navmisc/records/user_profile.h"
 
 namespace pf = navmisc::point_file;
 using navmisc::DeleteAll;
@@ -18,42 +18,34 @@ using navmisc::Items;
 
 namespace {
 
-constexpr size_t kFlushAt = 1 << 16;
+using pf::Kind;
 
-// Writes the records of one list to a point file, one line each, through an atomic replace.
-// A cleared *keepGoing stops before the next line; the lines written so far still replace the
-// old file. A file that cannot be written is skipped without a report, leaving the old one.
-template <class T, class Encode>
-void WriteListFile(const CString& path, CPtrList& list, int* counter, bool* keepGoing, Encode encode) {
+// Writes the list of one kind to its point file through an atomic replace. A cleared *keepGoing
+// stops before the next line; the lines written so far still replace the old file. A file that
+// cannot be written is skipped (inside a FileTransaction it fails the save).
+void WriteListFile(const CString& path, Kind kind, const TRACK_ITEM_INFO& track, int* counter, bool* keepGoing) {
   navmisc::AtomicFile file;
   if (!file.Open(path)) return;
-  std::string buf;
-  buf.reserve(kFlushAt + 512);
-  for (T* rec : Items<T>(list)) {
-    if (keepGoing && !*keepGoing) break;
-    if (rec) encode(buf, *rec);
-    if (buf.size() >= kFlushAt) {
-      file.Write(buf);
-      buf.clear();
-    }
-    if (counter) ++*counter;
-  }
-  file.Write(buf);
+  pf::EncodeList(kind, track, [&](std::string_view text) { file.Write(text); }, counter, keepGoing);
   file.Commit();
 }
 
-// Reads a side file into `list` when the file opens (emptying the list first).
-template <class T, class Parse>
-void ReadListFile(const CString& path, CPtrList& list, Parse parse) {
-  navmisc::LineReader reader(pf::kMaxLine);
-  if (!reader.Open(path)) return;
-  DeleteAll<T>(list);
-  std::string_view line;
-  while (reader.Next(line)) {
-    auto* rec = new T(static_cast<const T*>(nullptr));
-    parse(line, *rec);
-    list.AddTail(rec);
+CString PathOf(const TRACK_ITEM_INFO& track, Kind kind) {
+  switch (kind) {
+    case Kind::kPoints: return track.GetFilePathName();
+    case Kind::kCellFixes: return track.GetCellIDFilePathName();
+    case Kind::kHelpPoints: return track.GetSOSPointFilePathName();
+    case Kind::kHeartRate: return track.GetHeartRateFilePathName();
+    case Kind::kCadence: return track.GetCyclingCadenceFilePathName();
+    case Kind::kWheelSpeed: return track.GetWheelSpeedFilePathName();
   }
+  return {};
+}
+
+// Reads a point file into its list when the file opens (emptying the list first).
+void ReadListFile(const CString& path, Kind kind, TRACK_ITEM_INFO& track, long shift) {
+  navmisc::LineReader reader(pf::kMaxLine);
+  if (reader.Open(path)) pf::ReadList(kind, reader, track, shift);
 }
 
 }  // namespace
@@ -73,16 +65,9 @@ TRACK_ITEM_INFO::TRACK_ITEM_INFO(BLOG_ITEM_INFO* owner, TRACK_ITEM_INFO* from)
   transparency = from->transparency;
   hasGpsData = from->hasGpsData;
   // The points travel as files; the new track reads them on demand.
-  const CString pairs[][2] = {
-      {from->GetFilePathName(), GetFilePathName()},
-      {from->GetCellIDFilePathName(), GetCellIDFilePathName()},
-      {from->GetSOSPointFilePathName(), GetSOSPointFilePathName()},
-      {from->GetHeartRateFilePathName(), GetHeartRateFilePathName()},
-      {from->GetCyclingCadenceFilePathName(), GetCyclingCadenceFilePathName()},
-      {from->GetWheelSpeedFilePathName(), GetWheelSpeedFilePathName()},
-  };
-  for (const auto& p : pairs) {
-    if (!p[0].IsEmpty() && !p[1].IsEmpty() && FileExists(p[0])) CopyFile(p[0], p[1], false);
+  for (Kind kind : pf::kAllKinds) {
+    const CString src = PathOf(*from, kind), dst = PathOf(*this, kind);
+    if (!src.IsEmpty() && !dst.IsEmpty() && FileExists(src)) CopyFile(src, dst, false);
   }
   // The runner's frame images live in the trip's folder unless they come from the network.
   if (!from->trip || !trip) return;
@@ -153,57 +138,30 @@ void TRACK_ITEM_INFO::WriteAllWaypoint(int write, int* counter, bool* keepGoing)
   }
   // A thinned copy holds only part of the points: writing it would lose the rest.
   if (!ownsPoints_) return;
-  WriteListFile<WAYPOINT_ITEM_INFO>(GetFilePathName(), points, counter, keepGoing, pf::AppendPointLine);
-  if (tracker) {
-    if (!cellFixes.IsEmpty())
-      WriteListFile<BASE_ITEM_INFO>(GetCellIDFilePathName(), cellFixes, counter, keepGoing, pf::AppendCellFixLine);
-    if (!helpPoints.IsEmpty())
-      WriteListFile<WAYPOINT_ITEM_INFO>(GetSOSPointFilePathName(), helpPoints, counter, keepGoing, pf::AppendHelpPointLine);
+  // The points file is rewritten even when empty; a side file only when its list holds records,
+  // and the cell and help files only for the tracker application.
+  WriteListFile(GetFilePathName(), Kind::kPoints, *this, counter, keepGoing);
+  for (Kind kind : {Kind::kCellFixes, Kind::kHelpPoints, Kind::kHeartRate, Kind::kCadence, Kind::kWheelSpeed}) {
+    const bool trackerOnly = kind == Kind::kCellFixes || kind == Kind::kHelpPoints;
+    if ((tracker || !trackerOnly) && !pf::ListIsEmpty(kind, *this))
+      WriteListFile(PathOf(*this, kind), kind, *this, counter, keepGoing);
   }
-  if (!heartRates.IsEmpty()) {
-    WriteListFile<HEARTRATE_ITEM_INFO>(GetHeartRateFilePathName(), heartRates, counter, keepGoing,
-        [](std::string& out, const HEARTRATE_ITEM_INFO& r) {
-          pf::AppendHeartRateLine(out, r.time, r.values, HEARTRATE_ITEM_INFO::kValues);
-        });
-  }
-  if (!cadences.IsEmpty()) {
-    WriteListFile<CYCLING_CADENCE_RPM_ITEM_INFO>(GetCyclingCadenceFilePathName(), cadences, counter, keepGoing,
-        [](std::string& out, const CYCLING_CADENCE_RPM_ITEM_INFO& r) {
-          pf::AppendHeartRateLine(out, r.time, r.values, CYCLING_CADENCE_RPM_ITEM_INFO::kValues);
-        });
-  }
-  if (!wheelSpeeds.IsEmpty())
-    WriteListFile<WHEEL_SPEED_ITEM_INFO>(GetWheelSpeedFilePathName(), wheelSpeeds, counter, keepGoing, pf::AppendWheelSpeedLine);
 }
 
 void TRACK_ITEM_INFO::ReadAllWaypoint(int force) {
   // A thinned copy shares its points with the real track: reloading would free them under it.
   if (!ownsPoints_) return;
   if (!force && !points.IsEmpty()) return;
-  navmisc::TrackPointReader reader;
-  if (reader.Open(*this)) {
-    DeleteAll<WAYPOINT_ITEM_INFO>(points);
-    WAYPOINT_ITEM_INFO p;
-    while (reader.Next(p)) points.AddTail(new WAYPOINT_ITEM_INFO(p));
-  }
-  // Every loaded track has at least two points (the reader sees to that for what it reads; a
-  // list kept because its file is missing gets the same).
+  ReadListFile(GetFilePathName(), Kind::kPoints, *this, trip ? GetProfileTimeShift(trip->appType) : 0);
+  // Every loaded track has at least two points.
   if (points.GetCount() == 1) {
     auto* second = new WAYPOINT_ITEM_INFO(static_cast<WAYPOINT_ITEM_INFO*>(points.GetHead()));
     second->time = static_cast<int32_t>(static_cast<uint32_t>(second->time) + 1u);  // wraps, never overflows
     points.AddTail(second);
   }
-  if (trip && trip->appType == GPS_APP_TRACKER) {
-    ReadListFile<BASE_ITEM_INFO>(GetCellIDFilePathName(), cellFixes, pf::ParseCellFixLine);
-    ReadListFile<WAYPOINT_ITEM_INFO>(GetSOSPointFilePathName(), helpPoints, pf::ParseHelpPointLine);
+  const bool tracker = trip && trip->appType == GPS_APP_TRACKER;
+  for (Kind kind : {Kind::kCellFixes, Kind::kHelpPoints, Kind::kHeartRate, Kind::kCadence, Kind::kWheelSpeed}) {
+    const bool trackerOnly = kind == Kind::kCellFixes || kind == Kind::kHelpPoints;
+    if (tracker || !trackerOnly) ReadListFile(PathOf(*this, kind), kind, *this, 0);
   }
-  ReadListFile<HEARTRATE_ITEM_INFO>(GetHeartRateFilePathName(), heartRates,
-      [](std::string_view line, HEARTRATE_ITEM_INFO& r) {
-        pf::ParseByteSampleLine(line, r.time, r.values, HEARTRATE_ITEM_INFO::kValues);
-      });
-  ReadListFile<CYCLING_CADENCE_RPM_ITEM_INFO>(GetCyclingCadenceFilePathName(), cadences,
-      [](std::string_view line, CYCLING_CADENCE_RPM_ITEM_INFO& r) {
-        pf::ParseByteSampleLine(line, r.time, r.values, CYCLING_CADENCE_RPM_ITEM_INFO::kValues);
-      });
-  ReadListFile<WHEEL_SPEED_ITEM_INFO>(GetWheelSpeedFilePathName(), wheelSpeeds, pf::ParseWheelSpeedLine);
 }

@@ -4,6 +4,7 @@
 #include <map>
 
 #include "navmisc/platform/datetime.h"
+#include "navmisc/platform/file_transaction.h"
 #include "navmisc/platform/files.h"
 #include "navmisc/platform/resources.h"
 #include "navmisc/platform/settings.h"
@@ -258,8 +259,9 @@ int BLOG_ITEM_INFO::ReadInfo() {
   netUrl = RD_STRING(h, s, L"net_url", L"");
   tags = RD_STRING(h, s, L"tags", L"");
 
+  // Only the sections present are visited: the count alone could ask for billions.
   const int runnerCount = RD_INT(h, s, L"runner_item_info_count", 0);
-  for (int n = 0; n < runnerCount; ++n) {
+  for (int n : navmisc::SectionIndices(h, L"%s_RN(%d)", kSection, runnerCount)) {
     const CString rs = ListSection(L"%s_RN(%d)", n);
     auto* r = new RUNNER_ITEM_INFO;
     r->userDefined = RD_INT(h, rs, L"userdef", 0) != 0;
@@ -273,7 +275,7 @@ int BLOG_ITEM_INFO::ReadInfo() {
     runners.AddTail(r);
   }
   const int trackCount = RD_INT(h, s, L"track_item_info_count", 0);
-  for (int n = 0; n < trackCount; ++n) {
+  for (int n : navmisc::SectionIndices(h, L"%s_TK(%d)", kSection, trackCount)) {
     auto* t = new TRACK_ITEM_INFO(this);
     t->ReadInfo(h, ListSection(L"%s_TK(%d)", n));
     // A track id names files in this folder; one that could point elsewhere is dropped.
@@ -281,7 +283,7 @@ int BLOG_ITEM_INFO::ReadInfo() {
     else delete t;
   }
   const int photoCount = RD_INT(h, s, L"photo_item_info_count", 0);
-  for (int n = 0; n < photoCount; ++n) {
+  for (int n : navmisc::SectionIndices(h, L"%s_PH(%d)", kSection, photoCount)) {
     auto* p = new PHOTO_ITEM_INFO;
     p->trip = this;
     p->ReadInfo(h, ListSection(L"%s_PH(%d)", n));
@@ -293,6 +295,22 @@ int BLOG_ITEM_INFO::ReadInfo() {
 
 void BLOG_ITEM_INFO::WriteAllWaypoint(int write, int* counter, bool* keepGoing) {
   for (auto* t : Items<TRACK_ITEM_INFO>(tracks)) t->WriteAllWaypoint(write, counter, keepGoing);
+}
+
+bool BLOG_ITEM_INFO::SaveAll(int* counter, bool* keepGoing, CString* why) {
+  navmisc::FileTransaction save;
+  auto stopped = [&] {
+    if (keepGoing && !*keepGoing) save.Fail("stopped before the trip was saved");
+    return keepGoing && !*keepGoing;
+  };
+  // The settings file comes last, so that even the order of the renames never shows settings
+  // that name tracks whose files are not in place yet.
+  if (!stopped()) WriteAllWaypoint(1, counter, keepGoing);
+  if (!stopped()) WriteInfo(1, counter, keepGoing);
+  stopped();
+  const bool saved = save.Commit();
+  if (!saved && why) *why = CString::FromUtf8(save.error());
+  return saved;
 }
 
 void BLOG_ITEM_INFO::ReadAllWaypoint(int force) {

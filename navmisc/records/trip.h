@@ -30,6 +30,11 @@ class BLOG_ITEM_INFO {
   int ReadInfo();
 
   void WriteAllWaypoint(int write, int* counter, bool* keepGoing);
+  // Saves the trip as one unit: every point file and the settings file are written, and only
+  // when all of them succeeded do they replace the old ones, together. False, with every file
+  // of the trip as it was, when any write failed or *keepGoing turned false; `why` (may be
+  // null) then says what failed.
+  bool SaveAll(int* counter, bool* keepGoing, CString* why);
   // Loads every track's points; tracks left without points drop out of the trip.
   void ReadAllWaypoint(int force);
 

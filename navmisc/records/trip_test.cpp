@@ -2,6 +2,8 @@
 
 #include <gtest/gtest.h>
 
+#include <filesystem>
+#include <map>
 #include <memory>
 #include <regex>
 #include <string>
@@ -11,6 +13,7 @@
 #include "navmisc/platform/resources.h"
 #include "record_fixture.h"
 
+using navmisc::Items;
 using navmisc::testutil::NewPoint;
 using navmisc::testutil::ReadFileBytes;
 using navmisc::testutil::WriteFileBytes;
@@ -240,6 +243,68 @@ TEST_F(TripRecord, ReadAllWaypointDropsTracksWithoutPoints) {
   trip->tracks.AddTail(emptyFile);
   trip->ReadAllWaypoint(1);
   EXPECT_EQ(trip->tracks.GetCount(), 2);
+}
+
+// Every file of a folder (hidden ones too) with its bytes.
+std::map<std::string, std::string> FolderFiles(const CString& folder) {
+  std::map<std::string, std::string> out;
+  for (const auto& e : std::filesystem::directory_iterator(navmisc::NativePath(folder))) {
+    if (e.is_regular_file()) out[e.path().filename()] = ReadFileBytes(CString::FromUtf8(e.path().string()));
+  }
+  return out;
+}
+
+// A save that fails anywhere (a full disk while any of the files is written, a rename that
+// fails after others went through) leaves the trip's files exactly as they were and says so.
+TEST_F(TripRecord, SaveReplacesAllFilesOrNone) {
+  auto trip = SavedTrip();
+  const std::map<std::string, std::string> before = FolderFiles(trip->GetResourcePath());
+  trip->name = L"Renamed";
+  auto* first = static_cast<TRACK_ITEM_INFO*>(trip->tracks.GetHead());
+  for (auto* track : Items<TRACK_ITEM_INFO>(trip->tracks)) {
+    for (int i = 0; i < 40; ++i) track->points.AddTail(NewPoint(5000 + i, 26, 122));
+  }
+  auto* hr = new HEARTRATE_ITEM_INFO(nullptr);
+  hr->time = 5000;
+  first->heartRates.AddTail(hr);  // a file that did not exist before
+
+  // Budgets from nothing to just short of the whole save, so that every file fails in turn.
+  long long budget = 0;
+  for (;; budget += 97) {
+    navmisc::testing::FailAtomicWritesAfter(budget);
+    CString why;
+    const bool saved = trip->SaveAll(nullptr, nullptr, &why);
+    navmisc::testing::FailAtomicWritesAfter(-1);
+    if (saved) break;
+    ASSERT_EQ(FolderFiles(trip->GetResourcePath()), before) << budget;
+    EXPECT_NE(why.Find(L"No space left on device"), -1) << why.ToUtf8();
+  }
+  EXPECT_GT(budget, 4000) << "the settings file failed too, as the last one written";
+
+  WriteFileBytes(trip->GetBlogItemProfilePathName(), before.at("BLOG_ITEM_INFO.INI"));
+  for (auto* track : Items<TRACK_ITEM_INFO>(trip->tracks)) {
+    const CString bin = track->GetFilePathName();
+    WriteFileBytes(bin, before.at(PathFileName(bin).ToUtf8()));
+  }
+  DeleteFile(first->GetHeartRateFilePathName());
+  for (int renames : {0, 1, 3}) {
+    navmisc::testing::FailAtomicRenamesAfter(renames);
+    EXPECT_FALSE(trip->SaveAll(nullptr, nullptr, nullptr)) << renames;
+    navmisc::testing::FailAtomicRenamesAfter(-1);
+    EXPECT_EQ(FolderFiles(trip->GetResourcePath()), before) << renames;
+  }
+
+  bool keepGoing = false;  // stopped before it began: nothing changes
+  EXPECT_FALSE(trip->SaveAll(nullptr, &keepGoing, nullptr));
+  EXPECT_EQ(FolderFiles(trip->GetResourcePath()), before);
+
+  ASSERT_TRUE(trip->SaveAll(nullptr, nullptr, nullptr));
+  BLOG_ITEM_INFO back(GPS_APP_TRIP, trip->tripId, 0);
+  ASSERT_EQ(back.ReadInfo(), 1);
+  back.ReadAllWaypoint(0);
+  EXPECT_EQ(back.name, L"Renamed");
+  EXPECT_EQ(static_cast<TRACK_ITEM_INFO*>(back.tracks.GetHead())->points.GetCount(), 43);
+  EXPECT_EQ(static_cast<TRACK_ITEM_INFO*>(back.tracks.GetHead())->heartRates.GetCount(), 1);
 }
 
 }  // namespace

@@ -1,5 +1,7 @@
 #include "navmisc/records/trip_tree.h"
 
+#include <vector>
+
 #include "navmisc/platform/files.h"
 #include "navmisc/platform/settings.h"
 #include "navmisc/platform/shared_globals.h"
@@ -10,6 +12,9 @@ using navmisc::Items;
 namespace {
 
 constexpr const wchar_t* kRootSection = L"SECTION";
+// Nodes deeper than this are not read (the read is then incomplete): far beyond any folder tree
+// a person builds, and it keeps a hostile file from exhausting the stack.
+constexpr int kMaxDepth = 256;
 
 CString ResourceFolder() { return GetAppDataFolder(GPS_APP_TRIP); }
 CString TreeFile() { return PathJoin(ResourceFolder(), L"RESOURCE_INFO.INI"); }
@@ -52,12 +57,13 @@ void BLOG_TREE_NODE::WriteInfo(bool writeTrips, unsigned long handle, const wcha
     section = kRootSection;
   }
   WR_STRING(handle, section, L"tree_node_name", name);
-  WR_INT(handle, section, L"trip_item_info_count", trips.GetCount());
+  WR_INT(handle, section, L"trip_item_info_count", trips.GetCount() + unreadTrips.GetCount());
   int n = 0;
   for (auto* t : Items<BLOG_ITEM_INFO>(trips)) {
     WR_STRING(handle, section, FormatString(L"trip_item_info_(%d)_resource", n++), t->tripId);
     if (writeTrips) t->WriteInfo(1, nullptr, nullptr);
   }
+  for (const CString& id : unreadTrips) WR_STRING(handle, section, FormatString(L"trip_item_info_(%d)_resource", n++), id);
   WR_INT(handle, section, L"trip_tree_node_count", children.GetCount());
   n = 0;
   for (auto* c : Items<BLOG_TREE_NODE>(children)) {
@@ -67,38 +73,78 @@ void BLOG_TREE_NODE::WriteInfo(bool writeTrips, unsigned long handle, const wcha
 }
 
 int BLOG_TREE_NODE::ReadInfo(unsigned long handle, const wchar_t* section) {
-  const bool root = handle == 0;
-  if (root) {
-    readComplete = false;
-    MigrateOldTreeFile();
-    handle = RD_BEGIN(TreeFile());
-    if (!handle) return 0;
-    section = kRootSection;
-  }
-  name = RD_STRING(handle, section, L"tree_node_name", L"");
-  if (name.IsEmpty()) {
-    if (root) RD_END(handle);
+  if (handle != 0) return ReadNode(handle, section, completeRead, 0);
+  completeRead.Begin();
+  MigrateOldTreeFile();
+  handle = RD_BEGIN(TreeFile());
+  if (!handle) {
+    completeRead.Missed(L"the tree file " + TreeFile() + L" cannot be read");
     return 0;
   }
+  const int read = ReadNode(handle, kRootSection, completeRead, 0);
+  RD_END(handle);
+  if (!read) {
+    completeRead.Missed(L"the tree file " + TreeFile() + L" has no tree_node_name");
+    return 0;
+  }
+  completeRead.Finish();
+  return 1;
+}
+
+int BLOG_TREE_NODE::ReadNode(unsigned long handle, const wchar_t* section,
+                             navmisc::CompleteReadGuard& guard, int depth) {
+  name = RD_STRING(handle, section, L"tree_node_name", L"");
+  if (name.IsEmpty()) return 0;
+  // Only the entries present are visited, and a count that promises more leaves the read
+  // incomplete.
   const int tripCount = RD_INT(handle, section, L"trip_item_info_count", 0);
-  for (int n = 0; n < tripCount; ++n) {
+  const std::vector<int> tripNumbers = navmisc::KeyIndices(handle, section, L"trip_item_info_(%d)_resource", tripCount);
+  if (static_cast<int>(tripNumbers.size()) < tripCount) {
+    guard.Missed(FormatString(L"the node \"%s\" counts %d trips but names %d", name.c_str(), tripCount,
+                              static_cast<int>(tripNumbers.size())));
+  }
+  for (int n : tripNumbers) {
     const CString id = RD_STRING(handle, section, FormatString(L"trip_item_info_(%d)_resource", n), L"");
     // Only a plain folder name may come from the file; anything else drops out like a trip
     // whose folder is gone.
-    if (!IsPlainPathComponent(id)) continue;
+    if (!IsPlainPathComponent(id)) {
+      guard.Missed(FormatString(L"trip %d of the node \"%s\" has no valid id", n, name.c_str()));
+      continue;
+    }
     auto* trip = new BLOG_ITEM_INFO(GPS_APP_TRIP, id, 0);
-    if (trip->ReadInfo() == 1) trips.AddTail(trip);
+    const bool read = trip->ReadInfo() == 1;
+    // The folder is the trip's real name; a settings file that names another trip was damaged or
+    // copied in from elsewhere.
+    const CString problem = !read ? CString(L"its settings file cannot be read or names no trip id")
+                                  : trip->tripId != id ? L"its settings file names the trip " + trip->tripId
+                                                       : CString();
+    if (read) trips.AddTail(trip);
     else delete trip;
+    // A folder that is gone holds nothing a clean-up could delete. One that is there but did not
+    // read stays named in the tree file, so that no later clean-up takes it for unused.
+    if (problem.IsEmpty() || !IsDirectory(PathJoin(ResourceFolder(), id))) continue;
+    unreadTrips.AddTail(id);
+    guard.Missed(L"trip " + id + L": " + problem);
   }
   const int childCount = RD_INT(handle, section, L"trip_tree_node_count", 0);
-  for (int n = 0; n < childCount; ++n) {
-    auto* child = new BLOG_TREE_NODE(nullptr);
-    if (child->ReadInfo(handle, FormatString(L"%s_%d", section, n)) == 1) children.AddTail(child);
-    else delete child;
+  const std::vector<int> childNumbers = navmisc::SectionIndices(handle, L"%s_%d", section, childCount);
+  if (static_cast<int>(childNumbers.size()) < childCount) {
+    guard.Missed(FormatString(L"the node \"%s\" counts %d child nodes but holds %d", name.c_str(), childCount,
+                              static_cast<int>(childNumbers.size())));
   }
-  if (root) {
-    RD_END(handle);
-    readComplete = true;
+  for (int n : childNumbers) {
+    const CString childSection = FormatString(L"%s_%d", section, n);
+    if (depth >= kMaxDepth) {
+      guard.Missed(L"the tree node " + childSection + L" lies too deep");
+      continue;
+    }
+    auto* child = new BLOG_TREE_NODE(nullptr);
+    if (child->ReadNode(handle, childSection, guard, depth + 1) == 1) {
+      children.AddTail(child);
+    } else {
+      guard.Missed(L"the tree node " + childSection + L" has no name");
+      delete child;
+    }
   }
   return 1;
 }
@@ -131,25 +177,13 @@ bool BLOG_TREE_NODE::ReplaceBlogItem(BLOG_ITEM_INFO* old, BLOG_ITEM_INFO* replac
 
 void BLOG_TREE_NODE::_FindAllUsedResource(CStringList& ids) {
   for (auto* t : Items<BLOG_ITEM_INFO>(trips)) ids.AddTail(t->tripId);
+  ids.AddTail(&unreadTrips);
   for (auto* c : Items<BLOG_TREE_NODE>(children)) c->_FindAllUsedResource(ids);
 }
 
 void BLOG_TREE_NODE::RemoveAllUnusedResource() {
-  // Deleting folders on the word of a tree that was not read whole would delete live trips.
-  if (!readComplete) return;
   CStringList used;
   _FindAllUsedResource(used);
-  const CString folder = PathFolder(PathJoin(ResourceFolder(), L"dumy.file"));
-  CStringList entries;
-  if (GetContent(folder, L"*.*", entries) < 0) return;
-  for (const CString& entry : entries) {
-    if (used.Find(entry)) continue;
-    const CString path = PathJoin(folder, entry);
-    // Only folders are trip resources; the tree file and other files stay, and a symbolic link
-    // is never followed into somewhere else.
-    if (!IsDirectory(path)) continue;
-    RemoveDir(path, L"*.*");
-    SleepMs(100);
-    RemoveDir(path, L"*.*");
-  }
+  navmisc::RemoveUnusedResourceFolders(PathFolder(PathJoin(ResourceFolder(), L"dumy.file")), used,
+                                       completeRead);
 }

@@ -3,6 +3,7 @@
 #include <gtest/gtest.h>
 #include <unistd.h>
 
+#include <string>
 #include <utility>
 
 #include "navmisc/platform/files.h"
@@ -140,6 +141,88 @@ TEST_F(TripTree, CleanUpRemovesOnlyUnnamedFoldersOfACompleteTree) {
   EXPECT_TRUE(IsDirectory(PathJoin(Resource(), deepId)));
   EXPECT_TRUE(FileExists(Resource() + L"/RESOURCE_INFO.INI"));
   EXPECT_EQ(ReadFileBytes(outside / L"precious"), "keep");
+}
+
+// A tree from which a trip or a node dropped out while it was read is not complete: the clean-up
+// must leave every folder alone, the dropped trip's above all.
+TEST_F(TripTree, CleanUpRemovesNothingAfterATripOrNodeDroppedOut) {
+  struct Case {
+    const char* what;
+    // The settings file of the second trip, given its id; null keeps the saved one.
+    std::string (*settings)(const std::string& id);
+    // Lines added to the root section of the tree file.
+    const char* treeExtra;
+    // The damage is one the reader copes with: the tree is complete after all.
+    bool readable = false;
+  };
+  const Case cases[] = {
+      {"empty settings file", [](const std::string&) { return std::string(); }, ""},
+      {"no trip id", [](const std::string&) { return std::string("[SECTION]\nname=x\n"); }, ""},
+      {"another trip's id",
+       [](const std::string&) { return std::string("[SECTION]\ntrip_item_id=990101000000_001\n"); }, ""},
+      {"UTF-16 without byte-order mark",
+       [](const std::string& id) {
+         std::string out;
+         for (char c : "[SECTION]\r\nname=x\r\ntrip_item_id=" + id + "\r\n") out += {c, '\0'};
+         return out;
+       },
+       "", true},
+      {"more trips counted than named", nullptr, "trip_item_info_count=3\n"},
+      {"a node without a name", nullptr, "trip_tree_node_count=2\n"},
+  };
+  for (const Case& c : cases) {
+    SCOPED_TRACE(c.what);
+    TempDir root;
+    navmisc::testutil::DataRootScope scope(root.path());
+    BLOG_TREE_NODE saved(nullptr);
+    saved.name = L"All";
+    saved.trips.AddTail(NewTrip(L"kept"));
+    BLOG_ITEM_INFO* victim = NewTrip(L"victim");
+    saved.trips.AddTail(victim);
+    AddNode(saved, L"child");
+    saved.WriteInfo(false, 0, nullptr);
+    const CString folder = victim->GetResourcePath();
+    const CString tree = root / L"Resource/RESOURCE_INFO.INI";
+    if (c.settings) WriteFileBytes(victim->GetBlogItemProfilePathName(), c.settings(victim->tripId.ToUtf8()));
+    // A later key of the same name would be ignored, so the extra lines go first.
+    std::string text = ReadFileBytes(tree);
+    text.insert(text.find('\n') + 1, c.treeExtra);
+    WriteFileBytes(tree, text);
+    MakeDir(root / L"Resource/orphan");
+
+    BLOG_TREE_NODE read(nullptr);
+    ASSERT_EQ(read.ReadInfo(0, nullptr), 1);
+    read.RemoveAllUnusedResource();
+    EXPECT_TRUE(IsDirectory(folder));
+    EXPECT_EQ(IsDirectory(root / L"Resource/orphan"), !c.readable);
+    EXPECT_EQ(read.completeRead.IsComplete(), c.readable);
+    // The caller can tell the user what kept the clean-up back.
+    EXPECT_EQ(read.completeRead.Why().IsEmpty(), c.readable) << read.completeRead.Why().ToUtf8();
+
+    // Written again and read back, the tree still names the trip that did not read, so a later
+    // clean-up does not take its folder for unused either.
+    read.WriteInfo(false, 0, nullptr);
+    BLOG_TREE_NODE again(nullptr);
+    ASSERT_EQ(again.ReadInfo(0, nullptr), 1);
+    again.RemoveAllUnusedResource();
+    EXPECT_TRUE(IsDirectory(folder));
+  }
+
+  // A trip whose folder is gone has nothing a clean-up could delete: it drops out, and the read
+  // is still complete.
+  {
+    TempDir root;
+    navmisc::testutil::DataRootScope scope(root.path());
+    BLOG_TREE_NODE saved(nullptr);
+    saved.name = L"All";
+    saved.trips.AddTail(NewTrip(L"gone"));
+    saved.WriteInfo(false, 0, nullptr);
+    ASSERT_TRUE(RemoveDir(static_cast<BLOG_ITEM_INFO*>(saved.trips.GetHead())->GetResourcePath()));
+    BLOG_TREE_NODE read(nullptr);
+    ASSERT_EQ(read.ReadInfo(0, nullptr), 1);
+    EXPECT_TRUE(read.trips.IsEmpty());
+    EXPECT_TRUE(read.completeRead.IsComplete()) << read.completeRead.Why().ToUtf8();
+  }
 }
 
 }  // namespace

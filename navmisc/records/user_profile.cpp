@@ -188,14 +188,14 @@ void USER_MAP_INFO::ReadInfo() {
     const int markerCount = RD_INT(h, kSection, L"marker_item_info_count", 0);
     const int runnerCount = RD_INT(h, kSection, L"runner_item_info_count", 0);
     const int whCount = RD_INT(h, kSection, L"weightheight_count", 0);
-    for (int n = 0; n < markerCount; ++n) {
+    for (int n : navmisc::SectionIndices(h, L"%s_MKR(%d)", kSection, markerCount)) {
       const CString s = SectionOf(L"%s_MKR(%d)", n);
       auto* m = new MARKER_ITEM_INFO;
       m->id = RD_STRING(h, s, L"id", L"");
       m->url = RD_STRING(h, s, L"url", L"");
       markers.AddTail(m);
     }
-    for (int n = 0; n < runnerCount; ++n) {
+    for (int n : navmisc::SectionIndices(h, L"%s_RUN(%d)", kSection, runnerCount)) {
       const CString s = SectionOf(L"%s_RUN(%d)", n);
       auto* r = new RUNNER_ITEM_INFO;
       r->userDefined = RD_INT(h, s, L"userdef", 0) != 0;
@@ -208,7 +208,7 @@ void USER_MAP_INFO::ReadInfo() {
       for (int f = 0; f < r->frameCount; ++f) r->frameUrl[f] = RD_STRING(h, s, FormatString(L"url_%d", f), L"");
       runners.AddTail(r);
     }
-    for (int n = 0; n < whCount; ++n) {
+    for (int n : navmisc::SectionIndices(h, L"%s_WH(%d)", kSection, whCount)) {
       const CString s = SectionOf(L"%s_WH(%d)", n);
       auto* w = new WEIGHT_HEIGHT_INFO;
       int32_t date[3] = {0, 0, 0};

@@ -209,7 +209,11 @@ std::unique_ptr<BLOG_ITEM_INFO> OpenTrip(const std::string& name) {
   }
   const size_t i = PickOne(all, name, "trip", "under " + DataRoot());
   auto trip = std::make_unique<BLOG_ITEM_INFO>(types[i], CString::FromUtf8(all[i].id), 0);
-  if (trip->ReadInfo() != 1) Fail("cannot read trip " + all[i].id);
+  ClearFileRefusal();
+  if (trip->ReadInfo() != 1) {
+    const std::string refused = LastFileRefusal();
+    Fail("cannot read trip " + all[i].id + (refused.empty() ? "" : ": " + refused));
+  }
   return trip;
 }
 
@@ -231,6 +235,38 @@ void CheckOutputFolder(const std::string& path) {
     Fail(FileExists(folder) ? folder.ToUtf8() + " is not a folder" : "the folder " + folder.ToUtf8() + " does not exist");
   }
   if (IsDirectory(target)) Fail(path + " is a folder");
+}
+
+ProgressBar::ProgressBar(std::string label)
+    : label_(std::move(label)),
+      started_(std::chrono::steady_clock::now()),
+      last_(started_ - std::chrono::seconds(1)),
+      draw_(StderrIsTerminal()) {}
+
+void ProgressBar::Show(long long done, long long total, const std::string& note) {
+  const auto now = std::chrono::steady_clock::now();
+  if (!draw_ || now - started_ < std::chrono::milliseconds(300) || now - last_ < std::chrono::milliseconds(100))
+    return;
+  last_ = now;
+  drawn_ = true;
+  const std::string tail = note.empty() ? "" : "  " + note;
+  if (total > 0) {
+    const double frac = std::min(1.0, static_cast<double>(done) / static_cast<double>(total));
+    const int width = 30;
+    const int filled = static_cast<int>(frac * width);
+    std::fprintf(stderr, "\r%s [%s%s] %3d%%%s\033[K", label_.c_str(), std::string(filled, '#').c_str(),
+                 std::string(width - filled, '.').c_str(), static_cast<int>(frac * 100), tail.c_str());
+  } else {
+    const double secs = std::chrono::duration<double>(now - started_).count();
+    std::fprintf(stderr, "\r%s %c %.1fs%s\033[K", label_.c_str(), "|/-\\"[static_cast<int>(secs * 10) % 4], secs,
+                 tail.c_str());
+  }
+  std::fflush(stderr);
+}
+
+void ProgressBar::Finish(const std::string& result) {
+  if (drawn_) std::fprintf(stderr, "\r%s: %s\033[K\n", label_.c_str(), result.c_str());
+  drawn_ = false;
 }
 
 bool RunWithProgress(const std::string& label, int total, int& counter, bool& keepGoing,

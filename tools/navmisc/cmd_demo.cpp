@@ -120,7 +120,7 @@ void RunDemo(std::string root, bool force) {
   const CString resources = GetAppDataFolder(GPS_APP_TRIP);
   const bool hadTree = FileExists(PathJoin(resources, L"RESOURCE_INFO.INI")) ||
                        FileExists(PathJoin(resources, L"AMBRO_V20.INI"));  // the earlier tree file
-  if (hadTree && (tree.ReadInfo(0, nullptr) != 1 || !tree.readComplete)) {
+  if (hadTree && (tree.ReadInfo(0, nullptr) != 1 || !tree.completeRead.IsComplete())) {
     Fail("the trip tree under " + root + " cannot be read whole; the demo leaves this data root alone");
   }
   if (!hadTree) tree.name = L"My trips";

@@ -65,7 +65,8 @@ LevelCounts CountLevels(TRACK_ITEM_INFO& track) {
 std::unique_ptr<BLOG_ITEM_INFO> OpenTripWithPoints(const std::string& id) {
   auto trip = OpenTrip(id);
   trip->ReadAllWaypoint(0);
-  if (trip->tracks.IsEmpty()) Fail("trip '" + id + "' has no track points");
+  const std::string refused = LastFileRefusal();
+  if (trip->tracks.IsEmpty()) Fail("trip '" + id + "' has no track points" + (refused.empty() ? "" : ": " + refused));
   return trip;
 }
 
@@ -77,16 +78,14 @@ bool OptimizeTrip(BLOG_ITEM_INFO& trip, bool optimise) {
   bool keepGoing = true;
   // The save runs under the same Ctrl-C watch, so that a late Ctrl-C cannot end the process
   // half-way through the files; it is saved whole either way; the flag only stops the levelling.
+  bool saved = false;
+  CString why;
   RunWithProgress("Optimising", total, counter, keepGoing, [&] {
     trip.OptimizeWaypoint(trip.appType, optimise ? 1 : 0, &counter, &keepGoing);
     if (optimise) trip.optOptimize = true;
-    trip.WriteAllWaypoint(1, nullptr, nullptr);
-    trip.WriteInfo(1, nullptr, nullptr);
+    saved = trip.SaveAll(nullptr, nullptr, &why);
   });
-  BLOG_ITEM_INFO check(trip.appType, trip.tripId, 0);
-  if (check.ReadInfo() != 1 || check.optLevel != trip.optLevel) {
-    Fail("cannot save the trip under " + trip.GetResourcePath().ToUtf8() + " (is it writable?)");
-  }
+  if (!saved) Fail("cannot save the trip under " + trip.GetResourcePath().ToUtf8() + ": " + why.ToUtf8());
   return counter == total;  // a stop leaves steps uncounted
 }
 

@@ -37,14 +37,15 @@ TEST(DemoCommand, ShowsPhotosAndMarkersAndItsExamplesWork) {
   const std::string paris = Find(r.out, "My trips +([0-9A-F_]+) +Day out in Paris");
   ASSERT_FALSE(paris.empty()) << r.out;
   const std::string gpx = ReadFileBytes(CString::FromUtf8(root + "/exports/" + paris + ".gpx"));
-  // Photos and markers as waypoints, the marker's title escaped.
+  // Photos (two drawn by the demo, three tagged camera photos) and markers as waypoints, the
+  // marker's title escaped.
   size_t waypoints = 0;
   for (size_t at = 0; (at = gpx.find("<wpt ", at)) != std::string::npos; ++at) ++waypoints;
-  EXPECT_EQ(waypoints, 4u);
+  EXPECT_EQ(waypoints, 7u);
   EXPECT_NE(gpx.find("<name>Lunch at &quot;Le &lt;Petit&gt; Caf\xC3\xA9&quot;</name>"), std::string::npos);
   if (navmisc::testutil::HaveProgram("unzip")) {
     const CommandResult kmz = RunCommand("unzip -Z1 " + ShellQuote(root + "/exports/" + paris + ".kmz"));
-    EXPECT_EQ(kmz.out, "1.png\n2.png\n" + paris + ".kml\n");
+    EXPECT_EQ(kmz.out, "1.JPG\n2.png\n3.JPG\n4.png\n5.JPG\n" + paris + ".kml\n");
   }
   // The drive back ends where the drive out began.
   std::smatch first, last;

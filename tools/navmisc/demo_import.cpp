@@ -4,6 +4,7 @@
 
 #include "cli.h"
 #include "navmisc/platform/files.h"
+#include "navmisc/records/trip.h"
 
 namespace navmisc::cli {
 

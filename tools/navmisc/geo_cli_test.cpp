@@ -1,5 +1,7 @@
 // navmisc optimize, plot and place, run as a user runs them.
 #include <gtest/gtest.h>
+#include <sys/stat.h>
+#include <unistd.h>
 
 #include <algorithm>
 #include <cstdlib>
@@ -146,6 +148,35 @@ TEST_F(GeoCommands, PlaceAnswersByTimeOrPositionAndErrorsSayWhy) {
     EXPECT_EQ(r.status, c.status) << c.args << "\n" << r.out;
     EXPECT_NE(r.out.find(c.shows), std::string::npos) << c.args << "\n" << r.out;
   }
+}
+
+TEST_F(GeoCommands, OptimizeSaysWhichFileItCannotRead) {
+  auto trip = Load();
+  for (auto* track : navmisc::Items<TRACK_ITEM_INFO>(trip->tracks)) {
+    const std::string bin = navmisc::NativePath(track->GetFilePathName());
+    ASSERT_EQ(unlink(bin.c_str()), 0);
+    ASSERT_EQ(mkfifo(bin.c_str(), 0600), 0);
+  }
+  const CommandResult r = RunTool("optimize GEOTRIP");
+  EXPECT_EQ(r.status, 1) << r.out;
+  EXPECT_NE(r.out.find(".BIN is a named pipe, not a regular file"), std::string::npos) << r.out;
+}
+
+// The point files no longer fit (a file-size limit stands in for a full disk): optimize fails,
+// says why, and the trip reads back wholly as before, settings and points alike.
+TEST_F(GeoCommands, OptimizeThatCannotSaveFailsAndKeepsTheTrip) {
+  auto before = Load();
+  const std::string settings = navmisc::testutil::ReadFileBytes(before->GetBlogItemProfilePathName());
+  // 16 KiB: room for the settings file, not for a point file of 1500 points. A process over the
+  // limit gets SIGXFSZ, ignored here so that the write fails with EFBIG instead.
+  const CommandResult r = navmisc::testutil::RunCommand(
+      "trap '' XFSZ; ulimit -f 32; " + std::string(NAVMISC_TOOL_PATH) + " --data-root " +
+      root.path().ToUtf8() + " optimize GEOTRIP 2>&1");
+  EXPECT_EQ(r.status, 1) << r.out;
+  EXPECT_NE(r.out.find("File too large"), std::string::npos) << r.out;
+  auto after = Load();
+  EXPECT_EQ(navmisc::testutil::ReadFileBytes(after->GetBlogItemProfilePathName()), settings);
+  EXPECT_EQ(Levels(*after), Levels(*before));
 }
 
 }  // namespace

@@ -38,12 +38,12 @@ CString FreeName(const CString& folder, const CString& original) {
 }
 
 // The offset that puts the photo named in "PHOTO=TIME" at TIME.
-long OffsetFrom(const std::string& spec, const std::vector<AddedPhoto>& added,
+long OffsetFrom(const std::string& photoAtTime, const std::vector<AddedPhoto>& added,
                 const std::vector<std::unique_ptr<_ExifImageInfo>>& read, long shift) {
-  const size_t eq = spec.rfind('=');
+  const size_t eq = photoAtTime.rfind('=');
   if (eq == std::string::npos || eq == 0) Usage("--offset-from takes PHOTO=TIME");
-  const std::string name = spec.substr(0, eq);
-  const long when = ParseTime(spec.substr(eq + 1));
+  const std::string name = photoAtTime.substr(0, eq);
+  const long when = ParseTime(photoAtTime.substr(eq + 1));
   const CString wanted = AbsolutePath(CString::FromUtf8(name));
   for (size_t i = 0; i < added.size(); ++i) {
     if (!read[i]) continue;
