@@ -105,30 +105,33 @@ void GpxReader::StartElement(std::string_view name, const char** attributes) {
     return;
   }
   if (Capturing()) return;  // an element inside a text we collect
+  // Tracks, routes and waypoints count only in their place under the root: the same names deeper
+  // down (a stray <gpx> inside a point, say) are unknown content, never a second open track.
+  const size_t depth = stack_.size();
   switch (el) {
     case El::kTrk:
     case El::kRte:
-      if (parent != El::kGpx) break;
+      if (parent != El::kGpx || depth != 2) break;
       SendDocument();
       track_open_ = track_pending_ = true;
       segment_open_ = false;
       track_ = ImportTrack{el == El::kTrk ? TrackKind::kTrack : TrackKind::kRoute, {}, {}};
       break;
     case El::kTrkseg:
-      if (parent != El::kTrk || !OpenPendingTrack()) break;
+      if (parent != El::kTrk || depth != 3 || !OpenPendingTrack()) break;
       segment_open_ = EmitSegment();
       break;
     case El::kTrkpt:
     case El::kRtept:
-      if (!(el == El::kTrkpt && (parent == El::kTrkseg || parent == El::kTrk)) &&
-          !(el == El::kRtept && parent == El::kRte))
+      if (!(el == El::kTrkpt && stack_[1] == El::kTrk && ((parent == El::kTrkseg && depth == 4) || depth == 3)) &&
+          !(el == El::kRtept && parent == El::kRte && depth == 3))
         break;
       if (!OpenPendingTrack()) break;
       if (!segment_open_ && !(segment_open_ = EmitSegment())) break;
       BeginPoint(el, attributes);
       break;
     case El::kWpt:
-      if (parent != El::kGpx) break;
+      if (parent != El::kGpx || depth != 2) break;
       SendDocument();
       BeginPoint(el, attributes);
       break;

@@ -132,6 +132,36 @@ TEST(GpxReader, LegacyEncodingsOfWindowsProgramsAreRead) {
   EXPECT_EQ(Joined(Read(Kind::kGpx, doc).lines), "marker Caf\xC3\xA9 \xE2\x82\xAC|| -1 1.000000,2.000000 ele=-\n");
 }
 
+// Names of the structure met out of their place (a stray root inside a point, a <Track> deeper
+// than its lap) are unknown content: they neither open a second track nor hand over a point
+// outside a segment.
+TEST(Readers, StructureOutOfPlaceOpensNothing) {
+  const struct {
+    Kind kind;
+    std::string doc;
+    const char* expected;
+  } cases[] = {
+      {Kind::kGpx,
+       "<gpx><trk><trkseg><trkpt lat=\"1\" lon=\"2\"><fix>3<gpx><trk><trkseg><trkpt lat=\"5\" lon=\"6\"/>"
+       "</trkseg></trk><wpt lat=\"7\" lon=\"8\"/></gpx></fix></trkpt></trkseg></trk></gpx>",
+       "track track |\nsegment\npt -1 1.000000,2.000000 ele=- spd=-1 crs=-1 hr=-1 cad=-1\nend\n"},
+      {Kind::kGpx, "<gpx><extensions><trk><trkseg><trkpt lat=\"1\" lon=\"2\"/></trkseg></trk></extensions></gpx>", ""},
+      {Kind::kGpx, "<gpx><rte><trkseg><rtept lat=\"1\" lon=\"2\"/><trkpt lat=\"3\" lon=\"4\"/></trkseg></rte></gpx>",
+       "track route |\nend\n"},
+      {Kind::kTcx,
+       "<TrainingCenterDatabase><Activities><Activity><Lap><Cadence>8<Track><Trackpoint><Time>"
+       "2024-05-01T06:00:00Z</Time></Trackpoint></Track></Cadence><Track><Trackpoint><Time>"
+       "2024-05-01T06:00:01Z</Time></Trackpoint><x><Trackpoint/></x></Track></Lap></Activity>"
+       "</Activities></TrainingCenterDatabase>",
+       "track lap Lap 1|\nsegment\npt 1714543201 - ele=- spd=-1 crs=-1 hr=-1 cad=-1\nend\n"},
+  };
+  for (const auto& c : cases) {
+    const Outcome o = Read(c.kind, c.doc);
+    EXPECT_TRUE(o.status.ok()) << c.doc << ": " << o.status.message;
+    EXPECT_EQ(Joined(o.lines), c.expected) << c.doc;
+  }
+}
+
 TEST(TcxReader, LapsTracksSamplesAndCourses) {
   const std::string doc =
       "<?xml version=\"1.0\"?>\n"

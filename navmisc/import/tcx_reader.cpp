@@ -64,6 +64,8 @@ class TcxReader final : public XmlTrackReader {
   // The open lap or course (a track of the sink) and its place in the stack (0 = none).
   size_t track_depth_ = 0;
   bool track_sent_ = false;
+  // The <Track> whose segment the sink has open, and its place in the stack (0 = none).
+  size_t segment_depth_ = 0;
   ImportTrack track_;
   int lap_number_ = 0;  // within the current activity
 };
@@ -130,12 +132,14 @@ void TcxReader::StartElement(std::string_view name, const char** /*attributes*/)
     case El::kTrack:
       if (track_depth_ == 0 || stack_.size() != track_depth_ + 1) break;
       if (!track_sent_ && !(track_sent_ = EmitTrack(track_))) break;
-      EmitSegment();
+      if (EmitSegment()) segment_depth_ = stack_.size();
       break;
     case El::kTrackpoint:
     case El::kCoursePoint:
       if (point_depth_ != 0) break;
-      if (el == El::kTrackpoint && (parent != El::kTrack || !track_sent_)) break;
+      // A trackpoint belongs to the segment of the <Track> just above it; a <Track> anywhere
+      // else opened none.
+      if (el == El::kTrackpoint && (segment_depth_ == 0 || stack_.size() != segment_depth_ + 1)) break;
       if (el == El::kCoursePoint && parent != El::kCourse) break;
       point_depth_ = stack_.size();
       point_is_marker_ = el == El::kCoursePoint;
@@ -162,6 +166,8 @@ void TcxReader::EndElement(std::string_view) {
   if (depth == extensions_depth_) extensions_depth_ = 0;
   if (depth == point_depth_) {
     EndPoint();
+  } else if (depth == segment_depth_) {
+    segment_depth_ = 0;
   } else if (depth == track_depth_) {
     if (track_sent_) EmitEndTrack();
     track_depth_ = 0;
