@@ -174,8 +174,10 @@ TEST_F(MsgQueue, PeerKilledHoldingTheRingLockBlocksNobody) {
   ASSERT_TRUE(Put(q, "before"));
   ForkedPeer peer;
   ASSERT_TRUE(peer.Start([&](int ready) {
-    CxSysMsgQueue mine(L"Data_Control_Recv", 0, navmisc::kSysMsgOpenExisting);
-    if (!mine.IsValid() || ::pthread_mutex_lock(&mine.ring()->ringLock) != 0) ::_exit(1);
+    // Kept mapped until the kill, as in a process that dies inside the lock: the kernel can
+    // mark a dead owner only in a lock it can still reach.
+    auto* mine = new CxSysMsgQueue(L"Data_Control_Recv", 0, navmisc::kSysMsgOpenExisting);
+    if (!mine->IsValid() || ::pthread_mutex_lock(&mine->ring()->ringLock) != 0) ::_exit(1);
     (void)!::write(ready, "x", 1);
   }));
   EXPECT_EQ(navmisc::detail::RobustMutexOwner(q.ring()->ringLock), peer.pid);
