@@ -30,6 +30,8 @@ class ChannelSession {
   // new process when this one dies, so a different DataControlProcessId() means the process
   // was lost (with whatever it was working on).
   int processId() const { return pid_; }
+  // Whether the command thread has ended (the process is gone for good).
+  bool ended() const { return finished_; }
 
  private:
   void Stop();

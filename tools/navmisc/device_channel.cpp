@@ -17,7 +17,6 @@ namespace navmisc::cli {
 namespace {
 
 constexpr unsigned kStartMs = 15000;
-constexpr unsigned kStopMs = 15000;
 
 }  // namespace
 
@@ -65,20 +64,14 @@ DeviceChannel::DeviceChannel(GPS_APP_PROG_TYPE product, const std::string& logge
     : previousProduct_(g_nProductId), kv11_(std::make_unique<CDataControlCmdBlkKVDevice11>()) {
   if (!logger.empty()) ::setenv("NAVMISC_LOGGER", logger.c_str(), 1);
   g_nProductId = product;
-  g_bExit = false;
-  thread_ = std::thread([this] {
-    ProcessCommand(&window_);
-    finished_ = true;
-  });
+  session_.emplace(window_);
   // The process announces the device's state as soon as it serves.
-  if (!WaitFor([this] { return statuses_ > 0 || finished_; }, kStartMs) || finished_)
+  if (!WaitFor([this] { return statuses_ > 0 || ended(); }, kStartMs) || ended())
     Fail("the data-control process did not start (is GpsDataControl.exe beside navmisc?)");
 }
 
 DeviceChannel::~DeviceChannel() {
-  g_bExit = true;
-  WaitFor([this] { return finished_.load(); }, kStopMs);
-  if (thread_.joinable()) thread_.join();
+  session_.reset();
   g_nProductId = previousProduct_;
 }
 
@@ -113,7 +106,7 @@ void DeviceChannel::Request(int32_t deviceCmd, const std::function<void()>& send
 }
 
 bool DeviceChannel::WaitDeviceReply(unsigned ms, bool* interrupted) {
-  if (!WaitFor([&] { return replied_ || finished_; }, ms, interrupted)) {
+  if (!WaitFor([&] { return replied_ || ended(); }, ms, interrupted)) {
     if (interrupted && *interrupted) return false;
     Fail("the data-control process did not answer in time");
   }

@@ -9,7 +9,8 @@
 #include <memory>
 #include <optional>
 #include <string>
-#include <thread>
+
+#include "channel_session.h"
 
 #include "navmisc/datactrl/cmd_blocks.h"
 #include "navmisc/platform/types.h"
@@ -48,7 +49,7 @@ class DeviceChannel {
   int32_t lastError() const { return lastError_; }
   // Whether the awaited reply has come; whether the command thread has ended.
   bool replied() const { return replied_; }
-  bool ended() const { return finished_; }
+  bool ended() const { return session_ && session_->ended(); }
 
   // Progress of the running device operation (source 1), from its progress blocks.
   int32_t progressTotal() const { return total_; }
@@ -70,8 +71,7 @@ class DeviceChannel {
 
   GPS_APP_PROG_TYPE previousProduct_;
   Window window_{*this};
-  std::thread thread_;
-  std::atomic<bool> finished_{false};
+  std::optional<ChannelSession> session_;
   CWnd* listener_ = nullptr;
   bool connected_ = false;
   int statuses_ = 0;
