@@ -21,6 +21,7 @@
 #include "navmisc/datactrl/dc_errors.h"
 #include "navmisc/datactrl/device_commands.h"
 #include "navmisc/datactrl/device_state.h"
+#include "navmisc/import/import_errors.h"
 #include "navmisc/datactrl/net_commands.h"
 #include "navmisc/datactrl/reply_dialog.h"
 #include "navmisc/datactrl/request_queue.h"
@@ -32,6 +33,7 @@
 #include "navmisc/platform/resources.h"
 #include "navmisc/platform/shared_globals.h"
 #include "navmisc/platform/textconv.h"
+#include "channel_harness.h"
 #include "sample_blocks.h"
 #include "testutil.h"
 
@@ -185,7 +187,8 @@ class Channel : public ::testing::Test {
 };
 
 TEST_F(Channel, EveryBlockRoundTripsThroughTheProcess) {
-  ASSERT_TRUE(MakeDir(root_ / L"logger"));
+  // A logger of the KV-11 family (model 8), so that its settings travel in that family's block.
+  navmisc::testutil::MakeLogger(root_ / L"logger", 8, 31);
   Configure(root_ / L"logger", L"http://127.0.0.1:9/");
   Start();
 
@@ -195,9 +198,9 @@ TEST_F(Channel, EveryBlockRoundTripsThroughTheProcess) {
   InsertRequestMessage(StatusQuery(DC_SOURCE_NET, L"ask-2"));
   InsertRequestMessage(StatusQuery(7, L"ask-7"));
   InsertRequestMessage(CDataControlCmdBlk{DC_CMD_CONNECTION_STATUS, L"header", 0});
-  // Device, KV-11 and file blocks come back as they went, with the error code of a command this
-  // version does not carry out, a web-service block with that of a command that needs a login;
-  // progress with the code of a block sent the wrong way.
+  // Device and KV-11 blocks come back as they went, with their outcome; a web-service block
+  // with the error code of a command that needs a login, a file block with the import's
+  // outcome; progress with the code of a block sent the wrong way.
   const CDataControlCmdBlkKVDevice device = SampleDevice();
   InsertRequestMessage(device);
   CDataControlCmdBlkKVDevice unknown = WithId(SampleDevice(), L"unknown");
@@ -218,8 +221,7 @@ TEST_F(Channel, EveryBlockRoundTripsThroughTheProcess) {
   InsertRequestMessage(progress);
   ASSERT_TRUE(Until([&] { return window_.HasId(L"progress"); }));
 
-  // The KV-11 family's settings, once the connected logger is one of them.
-  g_wDeviceModelID = 8;
+  // The KV-11 family's settings.
   const CDataControlCmdBlkKVDevice11 kv11 = SampleKV11();
   InsertRequestMessage(kv11);
   CDataControlCmdBlkKVDevice read = WithId(SampleDevice(), L"read-log");
@@ -250,18 +252,26 @@ TEST_F(Channel, EveryBlockRoundTripsThroughTheProcess) {
     block.nLastError = error;
     return block;
   };
-  ASSERT_EQ(window_.devices.size(), 3u);
-  EXPECT_TRUE(window_.devices[0] == failed(device, DC_ERR_NOT_AVAILABLE));
-  EXPECT_TRUE(window_.devices[1] == failed(unknown, DC_ERR_UNKNOWN_COMMAND));
-  EXPECT_TRUE(window_.devices[2] == failed(read, DC_ERR_NOT_AVAILABLE));
-  ASSERT_EQ(window_.kv11.size(), 1u);
-  EXPECT_TRUE(window_.kv11[0] == failed(kv11, DC_ERR_NOT_AVAILABLE));
+  // The plain settings written to the KV-11 logger come back in that family's block, as the
+  // command thread unpacks every settings reply of the family.
+  ASSERT_EQ(window_.kv11.size(), 2u);
+  EXPECT_EQ(std::tuple(std::wstring(window_.kv11[0].szDeviceId), window_.kv11[0].nDeviceCmd,
+                       window_.kv11[0].nLastError),
+            std::tuple(std::wstring(L"dv"), device.nDeviceCmd, 0));
+  EXPECT_TRUE(window_.kv11[1] == failed(kv11, DC_ERR_NONE));
+  // A read of a logger without logs succeeds without a time range.
+  ASSERT_EQ(window_.devices.size(), 2u);
+  EXPECT_TRUE(window_.devices[0] == failed(unknown, DC_ERR_UNKNOWN_COMMAND));
+  EXPECT_TRUE(window_.devices[1] == failed(read, DC_ERR_NONE));
   ASSERT_EQ(window_.nets.size(), 1u);
   CDataControlCmdBlkNet notLoggedOn = failed(net, DC_ERR_NET_NOT_LOGGED_ON);
   notLoggedOn.userInfo.szPassword.Empty();  // a password never comes back
   EXPECT_TRUE(window_.nets[0] == notLoggedOn);
   ASSERT_EQ(window_.files.size(), 1u);
-  EXPECT_TRUE(window_.files[0] == failed(file, DC_ERR_NOT_AVAILABLE));
+  // The import takes the track record's data as the file's format name, which the sample's is not.
+  EXPECT_EQ(std::tuple(std::wstring(window_.files[0].szDeviceId), window_.files[0].nFileCmd,
+                       window_.files[0].nLastError),
+            std::tuple(std::wstring(L"file"), int32_t{DC_FILE_IMPORT}, int32_t{DC_ERR_IMPORT_FORMAT}));
   ASSERT_EQ(window_.progress.size(), 1u);
   EXPECT_TRUE(window_.progress[0] == failed(progress, DC_ERR_NOT_A_REQUEST));
 }
@@ -491,6 +501,9 @@ TEST_F(Channel, WaitDialogClearsTheLogAndShowsTheOutcome) {
   WriteFileBytes(texts / L"texts.ini",
                  "[STRINGS]\n9583=Clearing failed (%d).\n9584=Cleared.\n9588=Clearing...\n");
   navmisc::SetResourceFile(texts / L"texts.ini");
+  navmisc::testutil::MakeLogger(root_ / L"logger", 1, 5);
+  WriteFileBytes(root_ / L"logger/LOG/day.nmea", "$GPRMC\n");
+  Configure(root_ / L"logger", L"");
   RecordingWaitView view;
   CWaitDataCtrlProcDlg dialog(view);
   Start(dialog);
@@ -498,9 +511,10 @@ TEST_F(Channel, WaitDialogClearsTheLogAndShowsTheOutcome) {
   EXPECT_EQ(view.buttons, std::vector<bool>{false});
   ASSERT_EQ(view.texts.size(), 1u);
   EXPECT_EQ(view.texts[0], L"Clearing...");
-  // The first tick sends the clear; this version's process answers that it cannot yet.
+  // The first tick sends the clear.
   ASSERT_TRUE(Until([&] { return dialog.done(); }));
-  EXPECT_EQ(view.texts.back(), FormatString(L"Clearing failed (%d).", DC_ERR_NOT_AVAILABLE));
+  EXPECT_EQ(view.texts.back(), L"Cleared.");
+  EXPECT_FALSE(FileExists(root_ / L"logger/LOG/day.nmea"));
   EXPECT_EQ(view.buttons, (std::vector<bool>{false, true}));
   ASSERT_TRUE(Until([&] { return view.flashes >= 2; }));
   EXPECT_TRUE(view.boxes.empty());

@@ -2,6 +2,9 @@
 
 #include "navmisc/datactrl/detail/device_state_block.h"
 
+#include <atomic>
+#include <cstring>
+
 namespace navmisc::detail {
 
 static_assert(std::is_trivially_copyable_v<DeviceStateBlock>);
@@ -38,3 +41,33 @@ bool& g_bClearLog = DeviceStateData().bClearLog;
 int32_t& g_lTotolMemory = DeviceStateData().lTotolMemory;
 int32_t& g_lUsedMemory = DeviceStateData().lUsedMemory;
 int32_t& g_nScanProgress = DeviceStateData().nScanProgress;
+
+namespace navmisc::datactrl {
+
+void PublishGpsInfo(const s_gps_info& info) {
+  std::atomic_ref<int32_t> time(g_gps_info.tTime);
+  time.store(0, std::memory_order_relaxed);
+  std::atomic_thread_fence(std::memory_order_release);
+  s_gps_info body = info;
+  body.tTime = 0;
+  std::memcpy(static_cast<void*>(&g_gps_info), &body, sizeof body);
+  time.store(info.tTime, std::memory_order_release);
+}
+
+bool ReadGpsInfo(s_gps_info& out) {
+  std::atomic_ref<int32_t> time(g_gps_info.tTime);
+  for (int attempt = 0; attempt < 100; ++attempt) {
+    const int32_t before = time.load(std::memory_order_acquire);
+    if (before == 0) continue;
+    s_gps_info copy;
+    std::memcpy(&copy, static_cast<const void*>(&g_gps_info), sizeof copy);
+    std::atomic_thread_fence(std::memory_order_acquire);
+    if (time.load(std::memory_order_relaxed) != before) continue;
+    copy.tTime = before;
+    out = copy;
+    return true;
+  }
+  return false;
+}
+
+}  // namespace navmisc::datactrl

@@ -41,3 +41,15 @@ extern bool& g_bClearLog;
 extern int32_t& g_lTotolMemory;
 extern int32_t& g_lUsedMemory;
 extern int32_t& g_nScanProgress;
+
+namespace navmisc::datactrl {
+
+// g_gps_info as one value. The writer marks the time 0 while it changes the other fields, so a
+// reader that finds the same non-zero time before and after its copy holds one position whole
+// (readers that look at the fields directly may see a mix of two positions, or time 0 for a
+// moment).
+void PublishGpsInfo(const s_gps_info& info);
+// False when there is no position (time 0) or it kept changing while it was copied.
+bool ReadGpsInfo(s_gps_info& out);
+
+}  // namespace navmisc::datactrl

@@ -4,12 +4,14 @@
 #include <errno.h>
 #include <fcntl.h>
 #include <limits.h>
+#include <pwd.h>
 #include <sys/stat.h>
 #include <sys/types.h>
 #include <time.h>
 #include <unistd.h>
 
 #include <algorithm>
+#include <cstdlib>
 #include <filesystem>
 #include <cwctype>
 #include <string>
@@ -419,6 +421,27 @@ CString GetCurrentExecPath() {
   if (n <= 0 || static_cast<size_t>(n) >= buf.size()) return CString();
   buf.resize(static_cast<size_t>(n));
   return PathFolder(CString::FromUtf8(buf));
+}
+
+namespace {
+// The home folder of the user's account, for a process started without HOME.
+std::string AccountHome() {
+  std::string buf(16384, '\0');
+  passwd entry;
+  passwd* found = nullptr;
+  if (::getpwuid_r(::geteuid(), &entry, buf.data(), buf.size(), &found) != 0 || !found || !found->pw_dir) return {};
+  return found->pw_dir;
+}
+}  // namespace
+
+CString UserConfigFolder() {
+  if (const char* x = std::getenv("XDG_CONFIG_HOME"); x && *x == '/') return CString::FromUtf8(x);
+  // Without HOME the account's home folder, never a shared folder such as /tmp, where another
+  // user could prepare the path first.
+  const char* home = std::getenv("HOME");
+  const std::string folder = home && *home ? std::string(home) : AccountHome();
+  if (folder.empty() || folder[0] != '/') return {};
+  return CString::FromUtf8(folder + "/.config");
 }
 
 CString AbsolutePath(const wchar_t* path) {

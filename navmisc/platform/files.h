@@ -55,6 +55,9 @@ bool DeleteFileRetry(const wchar_t* path);
 void SleepMs(unsigned ms);
 // The folder of the running executable, without a trailing separator.
 CString GetCurrentExecPath();
+// The user's folder for settings: $XDG_CONFIG_HOME when it is an absolute path, else
+// $HOME/.config (the account's home folder without HOME); empty when there is no home folder.
+CString UserConfigFolder();
 
 // `path` made absolute against the current folder, with "." and ".." steps removed (links are
 // not resolved). Empty when the current folder cannot be found.

@@ -6,12 +6,14 @@
 #include <signal.h>
 #include <spawn.h>
 #include <string.h>
+#include <sys/stat.h>
 #include <sys/syscall.h>
 #include <sys/wait.h>
 #include <time.h>
 #include <unistd.h>
 
 #include <algorithm>
+#include <cstdlib>
 #include <utility>
 
 #include "navmisc/platform/detail/unique_fd.h"
@@ -91,19 +93,100 @@ std::vector<std::string> SplitCommandLine(std::string_view line) {
 
 unsigned long GetCurrentThreadId() { return static_cast<unsigned long>(::gettid()); }
 
+namespace {
+bool IsExecutableFile(const std::string& path) {
+  struct stat st;
+  return ::stat(path.c_str(), &st) == 0 && S_ISREG(st.st_mode) && ::access(path.c_str(), X_OK) == 0;
+}
+}  // namespace
+
+std::string FindProgram(const std::string& name) {
+  if (name.empty()) return {};
+  if (name.find('/') != std::string::npos) return IsExecutableFile(name) ? name : std::string();
+  const char* path = std::getenv("PATH");
+  std::string_view rest = path && *path ? path : "/usr/local/bin:/usr/bin:/bin";
+  for (;;) {
+    const size_t colon = rest.find(':');
+    std::string dir(rest.substr(0, colon));
+    if (dir.empty()) dir = ".";
+    std::string candidate = dir + "/" + name;
+    if (IsExecutableFile(candidate)) return candidate;
+    if (colon == std::string_view::npos) return {};
+    rest.remove_prefix(colon + 1);
+  }
+}
+
 ChildProcess::~ChildProcess() { Kill(); }
 
 ChildProcess::ChildProcess(ChildProcess&& other) noexcept
-    : pid_(std::exchange(other.pid_, -1)), status_(other.status_), error_(std::move(other.error_)) {}
+    : pid_(std::exchange(other.pid_, -1)),
+      out_(std::exchange(other.out_, -1)),
+      err_(std::exchange(other.err_, -1)),
+      errors_(std::move(other.errors_)),
+      status_(other.status_),
+      error_(std::move(other.error_)) {}
 
 ChildProcess& ChildProcess::operator=(ChildProcess&& other) noexcept {
   if (this != &other) {
     Kill();
     pid_ = std::exchange(other.pid_, -1);
+    out_ = std::exchange(other.out_, -1);
+    err_ = std::exchange(other.err_, -1);
+    errors_ = std::move(other.errors_);
     status_ = other.status_;
     error_ = std::move(other.error_);
   }
   return *this;
+}
+
+void ChildProcess::CloseOutput() {
+  if (out_ >= 0) ::close(out_);
+  if (err_ >= 0) ::close(err_);
+  out_ = err_ = -1;
+}
+
+bool ChildProcess::DrainErrors() {
+  char buf[4096];
+  const ssize_t n = ::read(err_, buf, sizeof buf);
+  if (n > 0) {
+    const size_t room = kErrorOutputLimit - std::min(kErrorOutputLimit, errors_.size());
+    errors_.append(buf, std::min(room, static_cast<size_t>(n)));
+    return true;
+  }
+  if (n < 0 && (errno == EINTR || errno == EAGAIN)) return true;
+  ::close(err_);
+  err_ = -1;
+  return false;
+}
+
+ssize_t ChildProcess::ReadOutput(char* buffer, size_t capacity, int timeoutMs) {
+  if (out_ < 0) return out_ == -2 ? 0 : -1;
+  const long long deadline = timeoutMs >= 0 ? NowMs() + timeoutMs : 0;
+  for (;;) {
+    struct pollfd fds[2] = {{out_, POLLIN, 0}, {err_, POLLIN, 0}};
+    int wait = -1;
+    if (timeoutMs >= 0) wait = static_cast<int>(std::max<long long>(0, deadline - NowMs()));
+    const int r = ::poll(fds, err_ >= 0 ? 2 : 1, wait);
+    if (r < 0) {
+      if (errno == EINTR) continue;
+      return -1;
+    }
+    if (r == 0) return kTimedOut;
+    if (err_ >= 0 && fds[1].revents) DrainErrors();
+    if (fds[0].revents) {
+      const ssize_t n = ::read(out_, buffer, capacity);
+      if (n > 0) return n;
+      if (n < 0 && (errno == EINTR || errno == EAGAIN)) continue;
+      if (n < 0) return -1;
+      // The end of the output: collect what is left of the error stream, then report the end
+      // from now on.
+      while (err_ >= 0 && DrainErrors()) {
+      }
+      ::close(out_);
+      out_ = -2;
+      return 0;
+    }
+  }
 }
 
 bool ChildProcess::Start(const std::vector<std::string>& argv, const SpawnOptions& options) {
@@ -134,7 +217,24 @@ bool ChildProcess::Start(const std::vector<std::string>& argv, const SpawnOption
                {options.nullStdout, STDOUT_FILENO, O_WRONLY},
                {options.nullStderr, STDERR_FILENO, O_WRONLY}};
   for (const auto& n : nulls) {
-    if (n.wanted) ::posix_spawn_file_actions_addopen(&setup.actions, n.fd, "/dev/null", n.flags, 0);
+    if (n.wanted && !(n.fd == STDIN_FILENO && options.stdinFd >= 0))
+      ::posix_spawn_file_actions_addopen(&setup.actions, n.fd, "/dev/null", n.flags, 0);
+  }
+  if (options.stdinFd >= 0) ::posix_spawn_file_actions_adddup2(&setup.actions, options.stdinFd, STDIN_FILENO);
+  // Pipes for the captured streams; the child's ends are closed here once it has them.
+  int outPipe[2] = {-1, -1}, errPipe[2] = {-1, -1};
+  auto closePipes = [&] {
+    for (int fd : {outPipe[0], outPipe[1], errPipe[0], errPipe[1]})
+      if (fd >= 0) ::close(fd);
+  };
+  if (options.captureOutput) {
+    if (::pipe2(outPipe, O_CLOEXEC) != 0 || ::pipe2(errPipe, O_CLOEXEC) != 0) {
+      error_ = ::strerror(errno);
+      closePipes();
+      return false;
+    }
+    ::posix_spawn_file_actions_adddup2(&setup.actions, outPipe[1], STDOUT_FILENO);
+    ::posix_spawn_file_actions_adddup2(&setup.actions, errPipe[1], STDERR_FILENO);
   }
 
   std::vector<char*> args;
@@ -147,10 +247,18 @@ bool ChildProcess::Start(const std::vector<std::string>& argv, const SpawnOption
                                environ);
   if (rc != 0) {
     error_ = ::strerror(rc);
+    closePipes();
     return false;
   }
   pid_ = pid;
   status_ = -1;
+  errors_.clear();
+  if (options.captureOutput) {
+    ::close(outPipe[1]);
+    ::close(errPipe[1]);
+    out_ = outPipe[0];
+    err_ = errPipe[0];
+  }
   return true;
 }
 
@@ -202,6 +310,7 @@ bool ChildProcess::WaitFor(unsigned ms) {
 }
 
 void ChildProcess::Kill() {
+  CloseOutput();
   if (pid_ <= 0) return;
   if (!Reap(false)) {
     ::kill(pid_, SIGKILL);

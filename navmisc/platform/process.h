@@ -5,6 +5,7 @@
 
 #include <sys/types.h>
 
+#include <cstddef>
 #include <string>
 #include <string_view>
 #include <vector>
@@ -20,12 +21,23 @@ std::vector<std::string> SplitCommandLine(std::string_view line);
 // The kernel's identifier of the calling thread (unique among the live threads of the system).
 unsigned long GetCurrentThreadId();
 
+// The full path of the program `name` found on PATH (an executable regular file), empty when
+// there is none. A name with a "/" is taken as a path and returned when it is executable.
+std::string FindProgram(const std::string& name);
+
 struct SpawnOptions {
   // Standard input, output and error of the child go to /dev/null: the child runs hidden, as a
   // program without a window. Unset streams are inherited.
   bool nullStdin = false;
   bool nullStdout = false;
   bool nullStderr = false;
+  // Standard output goes into a pipe that ReadOutput reads. Standard error is then collected too
+  // (the first kErrorOutputLimit bytes are kept for errorOutput()), so that a child that writes
+  // much to it can never block on a full pipe.
+  bool captureOutput = false;
+  // When not negative, the child's standard input is a copy of this descriptor (nullStdin is
+  // then ignored).
+  int stdinFd = -1;
 };
 
 class ChildProcess {
@@ -57,6 +69,17 @@ class ChildProcess {
   // Sends SIGKILL and reaps the child; nothing when none runs.
   void Kill();
 
+  // With captureOutput: reads up to `capacity` bytes of the child's standard output, waiting
+  // for them. Returns the count, 0 when the child has closed its output, -1 on an error or when
+  // output is not captured. Read the output to its end before Wait: a child blocked on a full
+  // pipe never ends. Kill and the destructor close the pipes. With `timeoutMs` not negative,
+  // returns kTimedOut when no output came within that time.
+  ssize_t ReadOutput(char* buffer, size_t capacity, int timeoutMs = -1);
+  static constexpr ssize_t kTimedOut = -2;
+  // The start of what the child wrote on standard error while ReadOutput ran (captureOutput).
+  const std::string& errorOutput() const { return errors_; }
+  static constexpr size_t kErrorOutputLimit = 4096;
+
   // The exit status of the last child that was reaped (see Wait), -1 before.
   int exitStatus() const { return status_; }
   // Why the last Start failed ("No such file or directory"), empty after a successful one.
@@ -64,8 +87,13 @@ class ChildProcess {
 
  private:
   bool Reap(bool block);
+  void CloseOutput();
+  bool DrainErrors();
 
   pid_t pid_ = -1;
+  int out_ = -1;  // read ends of the captured standard output and error
+  int err_ = -1;
+  std::string errors_;
   int status_ = -1;
   std::string error_;
 };

@@ -1,5 +1,9 @@
 #include "navmisc/platform/process.h"
 
+#include <fcntl.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
 #include <errno.h>
 #include <signal.h>
 
@@ -11,6 +15,7 @@
 namespace {
 
 using navmisc::ChildProcess;
+using navmisc::FindProgram;
 using navmisc::SplitCommandLine;
 
 bool ProcessExists(pid_t pid) { return ::kill(pid, 0) == 0 || errno != ESRCH; }
@@ -97,6 +102,53 @@ TEST(ChildProcess, ChildGetsNullStreamsAndDefaultSignals) {
   ::sigaction(SIGTERM, &old, nullptr);
   ::kill(p.pid(), SIGTERM);
   EXPECT_EQ(p.Wait(), 128 + SIGTERM);
+}
+
+TEST(ChildProcess, CapturedOutputCollectedErrorsAndAGivenInput) {
+  char path[] = "/tmp/navmisc-process-XXXXXX";
+  const int fd = ::mkstemp(path);
+  ASSERT_GE(fd, 0);
+  ::unlink(path);
+  ASSERT_EQ(::write(fd, "given input\n", 12), 12);
+  ASSERT_EQ(::lseek(fd, 0, SEEK_SET), 0);
+
+  ChildProcess p;
+  navmisc::SpawnOptions options;
+  options.captureOutput = true;
+  options.stdinFd = fd;
+  // Far more error output than a pipe holds: the reader must keep draining it.
+  ASSERT_TRUE(p.Start({"/bin/sh", "-c", "head -c 300000 /dev/zero | tr '\\0' e >&2; cat; exit 3"}, options));
+  std::string out;
+  char buf[7];
+  for (ssize_t n; (n = p.ReadOutput(buf, sizeof buf)) > 0;) out.append(buf, static_cast<size_t>(n));
+  ::close(fd);
+  EXPECT_EQ(out, "given input\n");
+  EXPECT_EQ(p.errorOutput(), std::string(ChildProcess::kErrorOutputLimit, 'e'));
+  EXPECT_EQ(p.ReadOutput(buf, sizeof buf), 0) << "the end stays the end";
+  EXPECT_EQ(p.Wait(), 3);
+
+  ASSERT_TRUE(p.Start({"/bin/sh", "-c", "sleep 1; echo late"}, {.captureOutput = true}));
+  EXPECT_EQ(p.ReadOutput(buf, sizeof buf, 20), ChildProcess::kTimedOut);
+  p.Kill();
+  EXPECT_EQ(p.ReadOutput(buf, sizeof buf), -1) << "killed: the pipes are closed";
+
+  ChildProcess plain;
+  ASSERT_TRUE(plain.Start({"/bin/true"}));
+  EXPECT_EQ(plain.ReadOutput(buf, sizeof buf), -1) << "nothing captured";
+}
+
+TEST(FindProgram, SearchesPathForExecutableFilesOnly) {
+  EXPECT_EQ(FindProgram("/bin/sh"), "/bin/sh");
+  EXPECT_FALSE(FindProgram("sh").empty());
+  char path[] = "/tmp/navmisc-program-XXXXXX";
+  const int fd = ::mkstemp(path);
+  ASSERT_GE(fd, 0);
+  ::close(fd);
+  ::chmod(path, 0644);
+  EXPECT_EQ(FindProgram(path), "") << "not executable";
+  ::unlink(path);
+  EXPECT_EQ(FindProgram("no-such-program-of-navmisc"), "");
+  EXPECT_EQ(FindProgram(""), "");
 }
 
 }  // namespace

@@ -1,7 +1,6 @@
 #include "navmisc/platform/secret.h"
 
 #include <fcntl.h>
-#include <pwd.h>
 #include <sodium.h>
 #include <sys/stat.h>
 #include <unistd.h>
@@ -99,15 +98,6 @@ std::optional<Key> LoadKey(bool create) {
   return std::nullopt;
 }
 
-// The home folder of the user's account, for a process started without HOME.
-std::string AccountHome() {
-  std::string buf(16384, '\0');
-  passwd entry;
-  passwd* found = nullptr;
-  if (::getpwuid_r(::geteuid(), &entry, buf.data(), buf.size(), &found) != 0 || !found || !found->pw_dir) return {};
-  return found->pw_dir;
-}
-
 bool SodiumReady() {
   static const bool ready = sodium_init() >= 0;
   return ready;
@@ -117,18 +107,8 @@ bool SodiumReady() {
 
 CString SecretKeyPath() {
   if (const char* p = std::getenv("NAVMISC_KEY_FILE"); p && *p) return CString::FromUtf8(p);
-  std::string base;
-  if (const char* x = std::getenv("XDG_CONFIG_HOME"); x && *x) {
-    base = x;
-  } else {
-    // Without HOME the account's home folder, never a shared folder such as /tmp, where another
-    // user could prepare the path first.
-    const char* home = std::getenv("HOME");
-    const std::string folder = home && *home ? std::string(home) : AccountHome();
-    if (folder.empty() || folder[0] != '/') return {};
-    base = folder + "/.config";
-  }
-  return CString::FromUtf8(base + "/navmisc/secret.key");
+  const CString folder = UserConfigFolder();
+  return folder.IsEmpty() ? CString() : PathJoin(folder, L"navmisc/secret.key");
 }
 
 CString ProtectSecret(const CString& clear) {

@@ -14,6 +14,8 @@ Config ReadConfig(const wchar_t* root) {
   config.geolocateUrl = RD_STRING(ini, L"WEBSERVICE", L"GeolocateUrl", kDefaultGeolocateUrl);
   const int timeout = RD_INT(ini, L"WEBSERVICE", L"TimeoutSeconds", kDefaultTimeoutSeconds);
   if (timeout >= 1 && timeout <= 3600) config.timeoutSeconds = timeout;
+  config.gpsdHost = RD_STRING(ini, L"DONGLE", L"Host", config.gpsdHost);
+  config.gpsdPort = RD_STRING(ini, L"DONGLE", L"Port", config.gpsdPort);
   RD_END(ini);
   return config;
 }

@@ -19,6 +19,9 @@ struct Config {
   CString serviceUrl = kDefaultServiceUrl;      // [WEBSERVICE] Url: the web service's address
   CString geolocateUrl = kDefaultGeolocateUrl;  // [WEBSERVICE] GeolocateUrl
   int timeoutSeconds = kDefaultTimeoutSeconds;  // [WEBSERVICE] TimeoutSeconds: per exchange
+  // [DONGLE] Host and Port: the gpsd that serves the where-am-I receiver.
+  CString gpsdHost = L"localhost";
+  CString gpsdPort = L"2947";
 };
 
 // Reads the configuration of the data root `root`; a missing file or key leaves its default

@@ -1,56 +1,30 @@
-// Device commands (kind 1). The logger work plugs in here: give a command its function and
-// call it from RunDeviceCommand (or RunKV11Command for the KV-11 family's settings); the reply
-// is the request's block as the function leaves it, with the code it returns in nLastError.
-#include "handlers.h"
+// Device commands (kind 1): handed to the device service of the product the process serves
+// (tracer.cpp for the logger, dongle.cpp for the where-am-I receiver).
+#include "device_service.h"
+#include "logger_folder.h"
 #include "navmisc/datactrl/dc_errors.h"
-#include "navmisc/platform/files.h"
 
 namespace gpsdc {
 namespace {
 
-int32_t RunDeviceCommand(CDataControlCmdBlkKVDevice& block, RequestContext& /*ctx*/) {
-  switch (block.nDeviceCmd) {
-    case DC_DEVICE_READ_LOG:
-    case DC_DEVICE_CLEAR_LOG:
-    case DC_DEVICE_READ_SETTING:
-    case DC_DEVICE_WRITE_SETTING:
-    case DC_DEVICE_RESET:
-    case DC_DEVICE_CANCEL_READ:
-      return DC_ERR_NOT_AVAILABLE;
-    default:
-      return DC_ERR_UNKNOWN_COMMAND;
-  }
-}
-
-int32_t RunKV11Command(CDataControlCmdBlkKVDevice11& block, RequestContext& /*ctx*/) {
-  switch (block.nDeviceCmd) {
-    case DC_DEVICE_READ_SETTING:
-    case DC_DEVICE_WRITE_SETTING:
-    case DC_DEVICE_WRITE_NAVI:
-      return DC_ERR_NOT_AVAILABLE;
-    default:
-      return DC_ERR_UNKNOWN_COMMAND;
-  }
-}
+int32_t NotAvailable(CDataControlCmdBlkKVDevice&, RequestContext&) { return DC_ERR_NOT_AVAILABLE; }
 
 }  // namespace
 
 bool DeviceConnected(const Config& config) {
-  return !config.devicePath.IsEmpty() && FileExists(config.devicePath);
+  if (DeviceService* service = RunningDeviceService()) return service->Connected();
+  LoggerFolder logger;
+  return logger.Open(FindLogger(config));
 }
 
 void RegisterDeviceHandlers(HandlerTable& table) {
   table.Set(DC_CMD_DEVICE, [](RequestContext& ctx) {
-    // The KV-11 family's settings travel in their own form; both sides decide it the same way.
-    CDataControlCmdBlkKVDevice device{};
-    navmisc::datactrl::UnpackBlock(ctx.request, device);
-    if (navmisc::datactrl::UsesKV11Block(device.nDeviceCmd)) {
-      CDataControlCmdBlkKVDevice11 kv11;
-      InitKV11BlockDefaults(kv11);
-      AnswerInPlace(ctx, kv11, RunKV11Command);
-    } else {
-      AnswerInPlace(ctx, device, RunDeviceCommand);
+    if (DeviceService* service = RunningDeviceService()) {
+      service->Handle(ctx);
+      return;
     }
+    CDataControlCmdBlkKVDevice device{};
+    AnswerInPlace(ctx, device, NotAvailable);
   });
 }
 

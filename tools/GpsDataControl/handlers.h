@@ -51,6 +51,11 @@ struct RequestContext {
   ReplyChannel& replies;
   const Config& config;
   Product product;
+  // For long work (a log read, a file import), asked between two of its steps: true once a
+  // cancel request (a device block with DC_DEVICE_CANCEL_READ) or the exit block has come.
+  // Requests that arrive meanwhile wait and are served after the work, in order (the cancel
+  // request too, so that it gets its own reply).
+  std::function<bool()> stopRequested = [] { return false; };
 };
 
 using Handler = std::function<void(RequestContext&)>;
@@ -84,7 +89,19 @@ void RegisterDeviceHandlers(HandlerTable& table);  // kind 1
 void RegisterFileHandlers(HandlerTable& table);    // kind 3
 void RegisterNetHandlers(HandlerTable& table);     // kind 2
 
-// Whether the logger can be reached, from what is configured (device_handler.cpp).
+// Makes the device service of `product` the running one for its lifetime (device_service.cpp):
+// the server holds one while it serves, so that the device's own threads have stopped before
+// the reply queue goes.
+class DeviceServiceScope {
+ public:
+  DeviceServiceScope(ReplyChannel& replies, const Config& config, Product product);
+  ~DeviceServiceScope();
+  DeviceServiceScope(const DeviceServiceScope&) = delete;
+  DeviceServiceScope& operator=(const DeviceServiceScope&) = delete;
+};
+
+// Whether the logger (or the receiver) can be reached: asks the running device service, or,
+// without one, looks for the logger (device_handler.cpp).
 bool DeviceConnected(const Config& config);
 // Whether the web service can be reached, from what is configured (net_handler.cpp).
 bool WebServiceConnected(const Config& config);

@@ -40,9 +40,16 @@ DataControlServer::DataControlServer(CxSysMsgQueue& requests, CxSysMsgQueue& rep
       parent_(::getppid()) {}
 
 int DataControlServer::Run() {
+  DeviceServiceScope device(replies_, config_, product_);
   // Unasked, so that a command thread that has just (re)started this process learns the state.
   for (int32_t source : {DC_SOURCE_DEVICE, DC_SOURCE_NET}) replies_.Send(CurrentStatus(source, config_));
   for (;;) {
+    while (!waiting_.empty()) {
+      const std::vector<uint8_t> next = std::move(waiting_.front());
+      waiting_.pop_front();
+      if (!Serve(next.data(), static_cast<uint32_t>(next.size()))) return 0;
+    }
+    if (exit_) return 0;
     CxSysMsgInfo info;
     if (auto request = requests_.Receive(kIdleWaitMs, &info, 1)) {
       if (!Serve(request.get(), info.nSize)) return 0;
@@ -67,8 +74,34 @@ bool DataControlServer::Serve(const uint8_t* data, uint32_t size) {
     return true;
   }
   RequestContext ctx{package, header, replies_, config_, product_};
+  ctx.stopRequested = [this] { return StopRequested(); };
+  stop_ = false;
   (*handler)(ctx);
   return true;
+}
+
+bool DataControlServer::StopRequested() {
+  CxSysMsgInfo info;
+  while (auto request = requests_.Receive(0, &info, 1)) {
+    CUnpackageBlk package(request.get(), info.nSize);
+    if (package.IsValid()) {
+      CDataControlCmdBlk header{};
+      navmisc::datactrl::UnpackHeader(package, header);
+      if (header.nCmdType == DC_CMD_EXIT) {
+        stop_ = exit_ = true;
+        continue;  // nothing is served after the exit block
+      }
+      const uint8_t* value = nullptr;
+      uint32_t size = 0;
+      if (header.nCmdType == DC_CMD_DEVICE && package.GetData("nDeviceCmd", value, size) && size == 4 &&
+          value[0] == DC_DEVICE_CANCEL_READ && value[1] == 0 && value[2] == 0 && value[3] == 0)
+        stop_ = true;
+    }
+    if (!exit_) waiting_.emplace_back(request.get(), request.get() + info.nSize);
+  }
+  // Nobody is left to want the work's result.
+  if (::getppid() != parent_) stop_ = exit_ = true;
+  return stop_;
 }
 
 }  // namespace gpsdc

@@ -4,6 +4,9 @@
 
 #include <sys/types.h>
 
+#include <deque>
+#include <vector>
+
 #include "handlers.h"
 
 namespace gpsdc {
@@ -23,6 +26,8 @@ class DataControlServer {
  private:
   // Handles one package; false when it was the exit block.
   bool Serve(const uint8_t* data, uint32_t size);
+  // Looks at the requests that came while a handler works (RequestContext::stopRequested).
+  bool StopRequested();
 
   CxSysMsgQueue& requests_;
   ReplyChannel replies_;
@@ -31,6 +36,9 @@ class DataControlServer {
   HandlerTable handlers_;
   pid_t parent_;
   int dropped_ = 0;
+  std::deque<std::vector<uint8_t>> waiting_;  // requests that came while a handler worked
+  bool stop_ = false;                         // a cancel or the exit block came meanwhile
+  bool exit_ = false;                         // the exit block came meanwhile
 };
 
 }  // namespace gpsdc

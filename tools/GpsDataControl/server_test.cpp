@@ -12,6 +12,8 @@
 #include "navmisc/platform/data_root.h"
 #include "navmisc/platform/files.h"
 #include "progress.h"
+#include "channel_harness.h"
+#include "queues_fixture.h"
 #include "testutil.h"
 
 namespace {
@@ -19,43 +21,8 @@ namespace {
 using navmisc::testutil::TempDir;
 using navmisc::testutil::WriteFileBytes;
 
-// The two queues of a fresh data root, as the command thread makes them.
-class Queues : public ::testing::Test {
- protected:
-  void SetUp() override {
-    ASSERT_TRUE(navmisc::UseDataRoot(root_.path()));
-    requests_ = std::make_unique<CxSysMsgQueue>(navmisc::datactrl::kRequestQueueName, 64,
-                                                navmisc::kSysMsgOpenOrCreate);
-    replies_ = std::make_unique<CxSysMsgQueue>(navmisc::datactrl::kReplyQueueName, 64,
-                                               navmisc::kSysMsgOpenOrCreate);
-    ASSERT_TRUE(requests_->IsValid() && replies_->IsValid());
-  }
-  void TearDown() override { navmisc::RemovePerRootObjects(root_.path()); }
-
-  template <class Block>
-  void Request(const Block& block) {
-    CPackageBlk p;
-    navmisc::datactrl::PackBlock(block, p);
-    ASSERT_TRUE(requests_->Send(p.GetPackagePtr(), p.GetPackageSize()));
-  }
-  // The next reply, unpacked as `Block`.
-  template <class Block>
-  Block Reply(Block block = {}) {
-    CxSysMsgInfo info;
-    auto bytes = replies_->Receive(10000, &info);
-    EXPECT_TRUE(bytes);
-    if (!bytes) return block;
-    CUnpackageBlk u(bytes.get(), info.nSize);
-    navmisc::datactrl::UnpackBlock(u, block);
-    return block;
-  }
-
-  TempDir root_;
-  std::unique_ptr<CxSysMsgQueue> requests_, replies_;
-};
-
 TEST_F(Queues, ConfigurationDecidesTheConnectionState) {
-  ASSERT_TRUE(MakeDir(root_ / L"logger"));
+  navmisc::testutil::MakeLogger(root_ / L"logger", 1, 2);
   const struct {
     const char* file;
     bool device, net;

@@ -7,6 +7,7 @@
 
 #include "navmisc/platform/data_root.h"
 #include "navmisc/platform/files.h"
+#include "channel_harness.h"
 #include "testutil.h"
 
 namespace {
@@ -42,7 +43,7 @@ TEST(ChannelCommand, StatusStartsTheProcessAsksAndEndsTheChannel) {
   // The queues are gone with the channel; only the shared state blocks stay.
   EXPECT_EQ(ObjectsOf(root), 2);
 
-  ASSERT_TRUE(MakeDir(root / L"logger"));
+  navmisc::testutil::MakeLogger(root / L"logger", 1, 1);
   WriteFileBytes(root / L"GpsDataControl.ini",
                  "[DEVICE]\nPath=" + (root / L"logger").ToUtf8() + "\n[WEBSERVICE]\nUrl=https://example.org\n");
   r = Channel(root, "status --verbose");

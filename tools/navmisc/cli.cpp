@@ -1,5 +1,7 @@
 #include "cli.h"
 
+#include <algorithm>
+#include <atomic>
 #include <chrono>
 #include <condition_variable>
 #include <cmath>
@@ -235,6 +237,38 @@ void CheckOutputFolder(const std::string& path) {
   if (IsDirectory(target)) Fail(path + " is a folder");
 }
 
+ProgressBar::ProgressBar(std::string label)
+    : label_(std::move(label)),
+      started_(std::chrono::steady_clock::now()),
+      last_(started_ - std::chrono::seconds(1)),
+      draw_(StderrIsTerminal()) {}
+
+void ProgressBar::Show(long long done, long long total, const std::string& note) {
+  const auto now = std::chrono::steady_clock::now();
+  if (!draw_ || now - started_ < std::chrono::milliseconds(300) || now - last_ < std::chrono::milliseconds(100))
+    return;
+  last_ = now;
+  drawn_ = true;
+  const std::string tail = note.empty() ? "" : "  " + note;
+  if (total > 0) {
+    const double frac = std::min(1.0, static_cast<double>(done) / static_cast<double>(total));
+    const int width = 30;
+    const int filled = static_cast<int>(frac * width);
+    std::fprintf(stderr, "\r%s [%s%s] %3d%%%s\033[K", label_.c_str(), std::string(filled, '#').c_str(),
+                 std::string(width - filled, '.').c_str(), static_cast<int>(frac * 100), tail.c_str());
+  } else {
+    const double secs = std::chrono::duration<double>(now - started_).count();
+    std::fprintf(stderr, "\r%s %c %.1fs%s\033[K", label_.c_str(), "|/-\\"[static_cast<int>(secs * 10) % 4], secs,
+                 tail.c_str());
+  }
+  std::fflush(stderr);
+}
+
+void ProgressBar::Finish(const std::string& result) {
+  if (drawn_) std::fprintf(stderr, "\r%s: %s\033[K\n", label_.c_str(), result.c_str());
+  drawn_ = false;
+}
+
 bool RunWithProgress(const std::string& label, int total, int& counter, bool& keepGoing,
                      const std::function<void()>& work) {
   InterruptWatch watch;
@@ -247,13 +281,8 @@ bool RunWithProgress(const std::string& label, int total, int& counter, bool& ke
     done = true;
     finished.notify_one();
   });
-  // A bar when the work counts its items, a spinner with the elapsed time otherwise; either only
-  // once the work has taken more than a moment.
-  const bool draw = StderrIsTerminal();
-  const auto started = std::chrono::steady_clock::now();
-  bool drawn = false;
+  ProgressBar bar(label);
   bool interrupted = false;
-  auto last = std::chrono::steady_clock::now() - std::chrono::seconds(1);
   for (;;) {
     {
       // The end of the work wakes the wait at once; Ctrl-C and the bar are looked at in between.
@@ -264,25 +293,10 @@ bool RunWithProgress(const std::string& label, int total, int& counter, bool& ke
       interrupted = true;
       keepGoing = false;  // the work looks at the flag between items and stops there
     }
-    const auto now = std::chrono::steady_clock::now();
-    if (draw && now - started >= std::chrono::milliseconds(300) && now - last >= std::chrono::milliseconds(100)) {
-      last = now;
-      drawn = true;
-      if (total > 0) {
-        const double frac = std::min(1.0, static_cast<double>(counter) / total);
-        const int width = 30;
-        const int filled = static_cast<int>(frac * width);
-        std::fprintf(stderr, "\r%s [%s%s] %3d%%", label.c_str(), std::string(filled, '#').c_str(),
-                     std::string(width - filled, '.').c_str(), static_cast<int>(frac * 100));
-      } else {
-        const double secs = std::chrono::duration<double>(now - started).count();
-        std::fprintf(stderr, "\r%s %c %.1fs", label.c_str(), "|/-\\"[static_cast<int>(secs * 10) % 4], secs);
-      }
-      std::fflush(stderr);
-    }
+    bar.Show(counter, total);
   }
   worker.join();
-  if (drawn) std::fprintf(stderr, "\r%s: %s\033[K\n", label.c_str(), interrupted ? "stopped" : "done");
+  bar.Finish(interrupted ? "stopped" : "done");
   return !interrupted;
 }
 

@@ -1,6 +1,7 @@
 // Shared pieces of the navmisc command-line tool.
 #pragma once
 
+#include <chrono>
 #include <functional>
 #include <memory>
 #include <optional>
@@ -8,6 +9,7 @@
 #include <vector>
 
 #include "navmisc/platform/cstring.h"
+#include "navmisc/platform/datetime.h"
 #include "navmisc/platform/types.h"
 
 class BLOG_ITEM_INFO;
@@ -57,6 +59,25 @@ std::unique_ptr<BLOG_ITEM_INFO> OpenTrip(const std::string& name);
 // The track of `trip` that `name` names, the same way (its id, the start of one id, one name).
 TRACK_ITEM_INFO& FindTrack(BLOG_ITEM_INFO& trip, const std::string& name);
 
+// A progress line on stderr: drawn only when stderr is a terminal, and only once the work has
+// taken more than a moment.
+class ProgressBar {
+ public:
+  explicit ProgressBar(std::string label);
+  // `done` of `total` as a bar and a percentage, or with `total` 0 a spinner and the time
+  // taken; `note` follows ("1200 points"). Redrawn at most ten times a second.
+  void Show(long long done, long long total, const std::string& note = "");
+  // Ends the line with "LABEL: RESULT" when anything was drawn.
+  void Finish(const std::string& result);
+
+ private:
+  std::string label_;
+  std::chrono::steady_clock::time_point started_;
+  std::chrono::steady_clock::time_point last_;
+  bool draw_;
+  bool drawn_ = false;
+};
+
 // Runs `work` on a worker thread while a progress bar follows `counter` up to `total` on stderr
 // (only when stderr is a terminal). Ctrl-C clears `keepGoing`, so the work can stop cleanly;
 // returns false when it was interrupted that way.
@@ -100,9 +121,29 @@ void AddWhereCommand(CLI::App& app);
 void AddChannelCommand(CLI::App& app);
 // `navmisc net ...` (cmd_net.cpp): the web service through the data-control process.
 void AddNetCommand(CLI::App& app);
+// `navmisc device ...`: the logger through the data-control process.
+void AddDeviceCommand(CLI::App& app);
 // `navmisc photos add|list` and `navmisc geotag` (cmd_photos.cpp).
 void AddPhotosCommand(CLI::App& app);
 void AddGeotagCommand(CLI::App& app);
+// `navmisc import FILE...`: track files in as trips, through the data-control process.
+void AddImportCommand(CLI::App& app);
+// What `navmisc import` asks of the process for every file.
+struct ImportRequest {
+  GPS_APP_PROG_TYPE app = GPS_APP_TRIP;
+  std::string format;    // empty: recognised
+  std::string name;      // empty: from the file
+  COleDateTime from, to;  // zero: open
+  int32_t timeZone = 0;  // seconds east of UTC of the files' times
+  bool verbose = false;  // print every progress block
+};
+// Imports each file as a trip through the data-control process, started for the time of the
+// call: a line per trip on stdout, a line per failure on stderr, a progress bar meanwhile.
+// Ctrl-C cancels the running import and skips the rest (*cancelled is set). Returns the number
+// of files that failed.
+int ImportFiles(const std::vector<std::string>& files, const ImportRequest& request, bool* cancelled);
+// The demo's import step: the exports of trip `tripId` come back in as trips.
+void DemoImport(const std::string& root, const std::string& tripId);
 // `navmisc help [COMMAND]`: the program's or a command's help.
 void AddHelpCommand(CLI::App& app);
 
@@ -113,5 +154,8 @@ void DemoGeometry(const std::vector<std::string>& trips);
 // the tracker trip `trackerId` as a tracker activity, sets a where-am-I position, and shows the
 // run's summary with calories.
 void DemoActivities(const CString& runId, const CString& trackerId);
+// The demo's logger step (demo_device.cpp): a logger folder with two days of NMEA logs under
+// `root`, read into trips through the data-control process.
+void DemoDevice(const std::string& root);
 
 }  // namespace navmisc::cli

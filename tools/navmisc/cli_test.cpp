@@ -44,7 +44,8 @@ TEST(CommandLine, GlobalOptionsGoAnywhereAndEveryCommandExplainsItself) {
   }
   // Every command answers -h and --help with its own usage and nothing else.
   for (const char* command : {"demo", "trips", "optimize", "plot", "place", "export", "profile", "templates",
-                              "timezone", "summary", "sport", "sport add", "tracker remove", "where set", "help"}) {
+                              "timezone", "summary", "sport", "sport add", "tracker remove", "where set",
+                              "where follow", "channel", "device", "import", "net", "help"}) {
     for (const char* flag : {"-h", "--help"}) {
       const CommandResult r = RunTool(std::string(command) + " " + flag);
       EXPECT_EQ(r.status, 0) << command << " " << flag << "\n" << r.out;

@@ -7,15 +7,13 @@
 
 #include <CLI/CLI.hpp>
 
+#include "channel_session.h"
 #include "cli.h"
 #include "navmisc/datactrl/device_commands.h"
 #include "navmisc/datactrl/net_commands.h"
 #include "navmisc/datactrl/reply_dialog.h"
 #include "navmisc/datactrl/request_queue.h"
-#include "navmisc/platform/files.h"
-#include "navmisc/platform/shared_globals.h"
 #include "navmisc/records/user_profile.h"
-#include "channel_run.h"
 #include "terminal_view.h"
 
 namespace navmisc::cli {
@@ -103,7 +101,7 @@ class StatusWindow : public CDataCtrlReplyDlg {
 void ChannelStatus(bool verbose) {
   TerminalDialogView view;
   StatusWindow window(view, GetUserMapInfo(GPS_APP_TRIP)->localize, verbose);
-  const ChannelRun channel(window);
+  ChannelSession channel(window);
   // The process announces both states when it starts; the replies to these questions follow.
   DC_KVDEVICE_QueryDeviceStatus();
   DC_NET_QueryNetStatus();

@@ -173,6 +173,8 @@ void RunDemo(std::string root, bool force) {
   DemoGeometry(demoTrips);
   DemoPhotos(journey->tripId.ToUtf8());
   DemoExports(root, demoTrips);
+  DemoImport(root, demoTrips.front());
+  DemoDevice(root);
   DemoActivities(run->tripId, tracker.tripId);
   std::printf("\nTry: navmisc --data-root %s trips\n", root.c_str());
 }
@@ -186,7 +188,8 @@ void AddDemoCommand(CLI::App& app) {
       app, "demo", "build a sample data root and show what the library does with it",
       "Builds a sample data root in DIR (a fresh temporary folder without it): the four user\n"
       "profiles and a tree of synthetic trips with photos and markers, then reads them back,\n"
-      "lists, optimises, draws, places and exports them (DIR/exports).\n"
+      "lists, optimises, draws, places and exports them (DIR/exports), imports two of the\n"
+      "exports back and reads a sample logger folder through the data-control process.\n"
       "\n"
       "DIR must be new or empty. With --force the demo adds its trips to the data root in DIR:\n"
       "profiles already there are kept, the demo's trips join the trip tree, and no trip is\n"

@@ -13,7 +13,7 @@
 #include <memory>
 #include <optional>
 
-#include "channel_run.h"
+#include "channel_session.h"
 #include "cli.h"
 #include "navmisc/datactrl/dc_errors.h"
 #include "navmisc/datactrl/login_dialog.h"
@@ -118,7 +118,7 @@ class NetSession {
         [&] {
           for (size_t i = before; i < window_.replies.size() && !reply; ++i)
             if (window_.replies[i].nNetCmd == netCmd) reply = window_.replies[i];
-          return reply.has_value() || channel_.finished();
+          return reply.has_value() || channel_.ended();
         },
         kReplyWait);
     if (!reply) Fail("the data-control process did not answer");
@@ -158,7 +158,7 @@ class NetSession {
  private:
   TerminalLoginView view_;
   NetWindow window_;
-  ChannelRun channel_{window_};
+  ChannelSession channel_{window_};
 };
 
 // The token: from a file (its first line), else from the terminal without echo, else the first

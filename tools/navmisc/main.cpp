@@ -19,10 +19,15 @@ constexpr const char* kFooter =
     "YYYY-MM-DDThh:mm:ss (UTC). `navmisc help COMMAND` or `navmisc COMMAND --help` explains a\n"
     "command.";
 
-// The command that was given, for the prefix of error messages ("navmisc export: ...").
+// The command that was given, for the prefix of error messages ("navmisc export: ...",
+// "navmisc device read: ...").
 std::string Prefix(const CLI::App& app) {
-  const auto chosen = app.get_subcommands();
-  return chosen.empty() ? "navmisc" : "navmisc " + chosen.front()->get_name();
+  std::string prefix = "navmisc";
+  for (const CLI::App* at = &app; !at->get_subcommands().empty();) {
+    at = at->get_subcommands().front();
+    prefix += " " + at->get_name();
+  }
+  return prefix;
 }
 
 // The first argument that is neither an option nor an option's value: what the user meant as
@@ -64,6 +69,8 @@ int main(int argc, char** argv) {
   navmisc::cli::AddWhereCommand(app);
   navmisc::cli::AddChannelCommand(app);
   navmisc::cli::AddNetCommand(app);
+  navmisc::cli::AddDeviceCommand(app);
+  navmisc::cli::AddImportCommand(app);
   navmisc::cli::AddHelpCommand(app);
 
   try {

@@ -174,4 +174,15 @@ void AddStopSpikeGap(BLOG_ITEM_INFO& trip, uint32_t seed, int32_t start) {
   Travel(*t, w, time, 900, 5, 1.3, alt, rng, 2.0);
 }
 
+void AddHike(TRACK_ITEM_INFO& track, uint32_t seed, int32_t start) {
+  std::mt19937 rng(seed);
+  Walker w{46.5580, 7.8350, 60};  // up from the valley
+  double alt = 800;
+  int32_t time = start;
+  Travel(track, w, time, 7200, 5, 1.1, alt, rng, 3.0);
+  Travel(track, w, time, 2700, 5, 0.0, alt, rng, 2.0);
+  w.heading += 150;
+  Travel(track, w, time, 5400, 5, 1.2, alt, rng, 3.0);
+}
+
 }  // namespace navmisc::synthetic

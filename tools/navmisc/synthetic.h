@@ -18,5 +18,8 @@ void AddTrackerDay(BLOG_ITEM_INFO& trip, uint32_t seed, int32_t start);
 void AddJourney(BLOG_ITEM_INFO& trip, uint32_t seed, int32_t start);
 // One walk with a long stop, a single wild fix (a spike) and a two-hour gap.
 void AddStopSpikeGap(BLOG_ITEM_INFO& trip, uint32_t seed, int32_t start);
+// A hike as a logger records it, a point every five seconds with a lunch break, into `track`
+// (which needs no trip).
+void AddHike(TRACK_ITEM_INFO& track, uint32_t seed, int32_t start);
 
 }  // namespace navmisc::synthetic
