@@ -11,7 +11,8 @@ packages=(
   libexiv2-dev                         # the tagging tool
   libgtest-dev libgmock-dev libbenchmark-dev
   libcli11-dev                         # the command line's options
-  libexpat1-dev                        # reading GPX, TCX and KML files
+  libxml2-dev                          # reading GPX and TCX files
+  libexpat1-dev                        # reading the web service's XML replies
   libcurl4-openssl-dev                 # the web service
   nlohmann-json3-dev                   # the geolocation answers of the web service
   libcpp-httplib-dev                   # the tests' loopback web server

@@ -18,16 +18,13 @@ enum class El : uint8_t {
   kEle, kTime, kSpeed, kCourse, kSym, kExtensions, kHeartRate, kCadence,
 };
 
-El Classify(std::string_view name) {
-  static constexpr std::pair<std::string_view, El> kNames[] = {
-      {"trkpt", El::kTrkpt}, {"ele", El::kEle}, {"time", El::kTime}, {"extensions", El::kExtensions},
-      {"hr", El::kHeartRate}, {"cad", El::kCadence}, {"speed", El::kSpeed}, {"course", El::kCourse},
-      {"rtept", El::kRtept}, {"wpt", El::kWpt}, {"name", El::kName}, {"desc", El::kDesc},
-      {"cmt", El::kCmt}, {"sym", El::kSym}, {"trkseg", El::kTrkseg}, {"trk", El::kTrk},
-      {"rte", El::kRte}, {"metadata", El::kMetadata}, {"gpx", El::kGpx},
-      {"heartrate", El::kHeartRate}, {"cadence", El::kCadence}};
-  return detail::ElementOf(name, kNames, El::kOther);
-}
+constexpr std::pair<std::string_view, El> kGpxNames[] = {
+    {"trkpt", El::kTrkpt}, {"ele", El::kEle}, {"time", El::kTime}, {"extensions", El::kExtensions},
+    {"hr", El::kHeartRate}, {"cad", El::kCadence}, {"speed", El::kSpeed}, {"course", El::kCourse},
+    {"rtept", El::kRtept}, {"wpt", El::kWpt}, {"name", El::kName}, {"desc", El::kDesc},
+    {"cmt", El::kCmt}, {"sym", El::kSym}, {"trkseg", El::kTrkseg}, {"trk", El::kTrk},
+    {"rte", El::kRte}, {"metadata", El::kMetadata}, {"gpx", El::kGpx},
+    {"heartrate", El::kHeartRate}, {"cadence", El::kCadence}};
 
 // What the captured text of an element becomes.
 enum class Field : uint8_t {
@@ -40,17 +37,18 @@ class GpxReader final : public XmlTrackReader {
   using XmlTrackReader::XmlTrackReader;
 
  private:
-  void StartElement(std::string_view name, const char** attributes) override;
-  void EndElement(std::string_view name) override;
+  void StartElement(detail::XmlName name, const detail::XmlAttributes& attributes) override;
+  void EndElement() override;
   void AtEnd() override { SendDocument(); }
 
   Field FieldOf(El el, El parent) const;
-  void BeginPoint(El kind, const char** attributes);
+  void BeginPoint(El kind, const detail::XmlAttributes& attributes);
   void EndPoint();
   void StoreField(int field, std::string_view text) override;
   bool OpenPendingTrack();
   void SendDocument();
 
+  detail::ElementNames<El, std::size(kGpxNames)> classify_{kGpxNames, El::kOther};
   std::vector<El> stack_;
   // The open point element (trkpt, rtept or wpt) and its place in the stack.
   El point_kind_ = El::kOther;
@@ -92,15 +90,15 @@ Field GpxReader::FieldOf(El el, El parent) const {
   }
 }
 
-void GpxReader::StartElement(std::string_view name, const char** attributes) {
-  const El el = Classify(name);
+void GpxReader::StartElement(detail::XmlName name, const detail::XmlAttributes& attributes) {
+  const El el = classify_(name);
   const El parent = stack_.empty() ? El::kOther : stack_.back();
   const bool root = stack_.empty();
   stack_.push_back(el);
   if (root) {
     if (el != El::kGpx) {
       StopAt(DC_ERR_IMPORT_FORMAT, "not a GPX document: the root element is <" +
-                                       std::string(name.substr(0, 64)) + ">");
+                                       std::string(name.view().substr(0, 64)) + ">");
     }
     return;
   }
@@ -145,7 +143,7 @@ void GpxReader::StartElement(std::string_view name, const char** attributes) {
   }
 }
 
-void GpxReader::EndElement(std::string_view) {
+void GpxReader::EndElement() {
   if (stack_.empty()) return;
   const El el = stack_.back();
   const size_t depth = stack_.size();
@@ -165,9 +163,9 @@ void GpxReader::EndElement(std::string_view) {
   stack_.pop_back();
 }
 
-void GpxReader::BeginPoint(El kind, const char** attributes) {
+void GpxReader::BeginPoint(El kind, const detail::XmlAttributes& attributes) {
   point_ = ImportPoint{};
-  marker_ = ImportMarker{};
+  if (kind == El::kWpt) marker_ = ImportMarker{};  // its texts cost; only waypoints use it
   const char* element = kind == El::kWpt ? "wpt" : kind == El::kRtept ? "rtept" : "trkpt";
   if (!ReadCoordinate(attributes, "lat", element, detail::LatitudeInRange, point_.latitude) ||
       !ReadCoordinate(attributes, "lon", element, detail::LongitudeInRange, point_.longitude))

@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <cctype>
+#include <cstring>
 #include <memory>
 #include <vector>
 
@@ -264,16 +265,27 @@ ReadFileResult ReadTrackFile(const wchar_t* path, ImportSink& sink, const ReadFi
       case Format::kTcx: reader = MakeTcxReader(counted); break;
       default: reader = MakeNmeaReader(counted, options.nmea); break;
     }
-    while (n > 0) {
-      progress.bytesRead += static_cast<uint64_t>(n);
-      if (!reader->Feed(buffer.data(), static_cast<size_t>(n))) break;
-      n = file.Read(buffer.data(), buffer.size());
-    }
-    if (n < 0) {
+    // The bytes read for the format come first, then the rest of the file, in the pieces the
+    // reader asks for.
+    size_t served = 0;
+    bool readFailed = false;
+    reader->ReadFrom([&](char* out, size_t size) -> long {
+      if (served == static_cast<size_t>(n)) {
+        n = file.Read(buffer.data(), buffer.size());
+        served = 0;
+        if (n < 0) readFailed = true;
+        if (n <= 0) return n < 0 ? -1 : 0;
+      }
+      const size_t take = std::min(size, static_cast<size_t>(n) - served);
+      std::memcpy(out, buffer.data() + served, take);
+      served += take;
+      progress.bytesRead += take;
+      return static_cast<long>(take);
+    });
+    if (readFailed) {
       result.status = {DC_ERR_IMPORT_READ, "cannot read the file: " + file.error()};
       return result;
     }
-    if (reader->status().ok()) reader->Finish();
     result.status = reader->status();
     result.counts = reader->counts();
   }

@@ -19,18 +19,15 @@ enum class El : uint8_t {
   kSpeed, kRunCadence, kName, kNotes, kPointType,
 };
 
-El Classify(std::string_view name) {
-  static constexpr std::pair<std::string_view, El> kNames[] = {
-      {"Trackpoint", El::kTrackpoint}, {"Time", El::kTime}, {"Position", El::kPosition},
-      {"LatitudeDegrees", El::kLatitude}, {"LongitudeDegrees", El::kLongitude},
-      {"AltitudeMeters", El::kAltitude}, {"HeartRateBpm", El::kHeartRateBpm}, {"Value", El::kValue},
-      {"Cadence", El::kCadence}, {"Extensions", El::kExtensions}, {"Speed", El::kSpeed},
-      {"RunCadence", El::kRunCadence}, {"Track", El::kTrack}, {"Lap", El::kLap},
-      {"Activity", El::kActivity}, {"Course", El::kCourse}, {"CoursePoint", El::kCoursePoint},
-      {"Name", El::kName}, {"Notes", El::kNotes}, {"PointType", El::kPointType},
-      {"TrainingCenterDatabase", El::kRoot}};
-  return detail::ElementOf(name, kNames, El::kOther);
-}
+constexpr std::pair<std::string_view, El> kTcxNames[] = {
+    {"Trackpoint", El::kTrackpoint}, {"Time", El::kTime}, {"Position", El::kPosition},
+    {"LatitudeDegrees", El::kLatitude}, {"LongitudeDegrees", El::kLongitude},
+    {"AltitudeMeters", El::kAltitude}, {"HeartRateBpm", El::kHeartRateBpm}, {"Value", El::kValue},
+    {"Cadence", El::kCadence}, {"Extensions", El::kExtensions}, {"Speed", El::kSpeed},
+    {"RunCadence", El::kRunCadence}, {"Track", El::kTrack}, {"Lap", El::kLap},
+    {"Activity", El::kActivity}, {"Course", El::kCourse}, {"CoursePoint", El::kCoursePoint},
+    {"Name", El::kName}, {"Notes", El::kNotes}, {"PointType", El::kPointType},
+    {"TrainingCenterDatabase", El::kRoot}};
 
 enum class Field : uint8_t {
   kNone, kTime, kLatitude, kLongitude, kAltitude, kHeartRate, kCadence, kSpeed, kRunCadence,
@@ -42,8 +39,8 @@ class TcxReader final : public XmlTrackReader {
   using XmlTrackReader::XmlTrackReader;
 
  private:
-  void StartElement(std::string_view name, const char** attributes) override;
-  void EndElement(std::string_view name) override;
+  void StartElement(detail::XmlName name, const detail::XmlAttributes& attributes) override;
+  void EndElement() override;
 
   El At(size_t fromTop) const {
     return stack_.size() > fromTop ? stack_[stack_.size() - 1 - fromTop] : El::kOther;
@@ -52,6 +49,7 @@ class TcxReader final : public XmlTrackReader {
   void StoreField(int field, std::string_view text) override;
   void EndPoint();
 
+  detail::ElementNames<El, std::size(kTcxNames)> classify_{kTcxNames, El::kOther};
   std::vector<El> stack_;
   // The open trackpoint or course point and its place in the stack (0 = none).
   size_t point_depth_ = 0;
@@ -99,14 +97,14 @@ Field TcxReader::FieldOf(El el) const {
   }
 }
 
-void TcxReader::StartElement(std::string_view name, const char** /*attributes*/) {
-  const El el = Classify(name);
+void TcxReader::StartElement(detail::XmlName name, const detail::XmlAttributes& /*attributes*/) {
+  const El el = classify_(name);
   const bool root = stack_.empty();
   stack_.push_back(el);
   if (root) {
     if (el != El::kRoot) {
       StopAt(DC_ERR_IMPORT_FORMAT, "not a TCX document: the root element is <" +
-                                       std::string(name.substr(0, 64)) + ">");
+                                       std::string(name.view().substr(0, 64)) + ">");
     }
     return;
   }
@@ -156,7 +154,7 @@ void TcxReader::StartElement(std::string_view name, const char** /*attributes*/)
   }
 }
 
-void TcxReader::EndElement(std::string_view) {
+void TcxReader::EndElement() {
   if (stack_.empty()) return;
   const size_t depth = stack_.size();
   if (EndOfField(depth)) {

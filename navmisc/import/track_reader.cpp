@@ -1,8 +1,21 @@
 #include "navmisc/import/track_reader.h"
 
+#include <vector>
+
 #include "navmisc/import/import_errors.h"
 
 namespace navmisc::import {
+
+bool TrackReader::ReadFrom(const Source& source) {
+  std::vector<char> buffer(256u << 10);
+  for (;;) {
+    const long n = source(buffer.data(), buffer.size());
+    if (n < 0) return Fail(DC_ERR_IMPORT_READ, "the file could not be read");
+    if (n == 0) break;
+    if (!Feed(buffer.data(), static_cast<size_t>(n))) return false;
+  }
+  return Finish();
+}
 
 bool TrackReader::Fail(int32_t code, std::string message) {
   if (status_.ok()) status_ = {code, std::move(message)};

@@ -13,6 +13,7 @@
 
 #include <cstddef>
 #include <cstdint>
+#include <functional>
 #include <memory>
 #include <string>
 
@@ -108,6 +109,13 @@ class TrackReader {
   virtual bool Feed(const char* data, size_t size) = 0;
   // The document is complete: checks its end. False when it failed (now or before).
   virtual bool Finish() = 0;
+  // Fills `buffer` with at most `size` bytes of the document: the count, 0 at its end, -1 when
+  // the bytes cannot be read.
+  using Source = std::function<long(char* buffer, size_t size)>;
+  // Reads the whole document from `source` and finishes it, as Feed for every piece and then
+  // Finish would; a reader may take the bytes at its own pace. Use one way or the other for a
+  // document, never both.
+  virtual bool ReadFrom(const Source& source);
   const ReadStatus& status() const { return status_; }
   const ReadCounts& counts() const { return counts_; }
 

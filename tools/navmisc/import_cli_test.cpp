@@ -99,7 +99,7 @@ TEST(ImportCommand, BadFilesAreRefusedOneByOneAndLeaveNoTrip) {
     std::string content;
     const char* message;
   } cases[] = {
-      {L"broken.gpx", "<gpx><trk><trkseg></trk></gpx>", "line 1: not well-formed XML (mismatched tag)"},
+      {L"broken.gpx", "<gpx><trk><trkseg></trk></gpx>", "line 1: not well-formed XML (Opening and ending tag mismatch: trkseg line 1 and trk)"},
       {L"bomb.gpx",
        "<?xml version=\"1.0\"?><!DOCTYPE gpx [<!ENTITY a \"aaaa\"><!ENTITY b \"&a;&a;&a;&a;\">]>"
        "<gpx><wpt lat=\"1\" lon=\"2\"><name>&b;</name></wpt></gpx>",

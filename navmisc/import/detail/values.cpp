@@ -1,21 +1,51 @@
 #include "navmisc/import/detail/values.h"
 
 #include <charconv>
+#include <cstdint>
 #include <cmath>
 
 namespace navmisc::import::detail {
 
-std::string_view TrimSpace(std::string_view text) {
-  auto space = [](char c) { return c == ' ' || c == '\t' || c == '\r' || c == '\n'; };
-  while (!text.empty() && space(text.front())) text.remove_prefix(1);
-  while (!text.empty() && space(text.back())) text.remove_suffix(1);
-  return text;
+namespace {
+
+// Plain decimals of at most 15 digits ("47.3712345", "-8", "410.5"), the form nearly every
+// track file writes. Both the digits, as an integer below 2^53, and the power of ten up to 10^22
+// are exact doubles, so one division gives the correctly rounded value, as from_chars would.
+// Anything else (exponents, more digits, junk) is left to the caller.
+bool ParsePlainDecimal(std::string_view text, double& value) {
+  static constexpr double kPowers[] = {1e0,  1e1,  1e2,  1e3,  1e4,  1e5,  1e6,  1e7,
+                                       1e8,  1e9,  1e10, 1e11, 1e12, 1e13, 1e14, 1e15};
+  size_t i = 0;
+  const bool negative = !text.empty() && text[0] == '-';
+  i += negative;
+  uint64_t digits = 0;
+  int count = 0, decimals = 0;
+  bool point = false;
+  for (; i < text.size(); ++i) {
+    const char c = text[i];
+    if (c >= '0' && c <= '9') {
+      if (++count > 15) return false;
+      digits = digits * 10 + static_cast<unsigned>(c - '0');
+      decimals += point;
+    } else if (c == '.' && !point) {
+      point = true;
+    } else {
+      return false;
+    }
+  }
+  if (count == 0) return false;
+  const double v = static_cast<double>(digits) / kPowers[decimals];
+  value = negative ? -v : v;
+  return true;
 }
+
+}  // namespace
 
 bool ParseNumber(std::string_view text, double& value) {
   text = TrimSpace(text);
   if (!text.empty() && text.front() == '+') text.remove_prefix(1);
   if (text.empty()) return false;
+  if (ParsePlainDecimal(text, value)) return true;
   // from_chars reads "inf" and "nan" too; a number starts with a digit, a sign or a point.
   const char c = text.front();
   if (!(c == '-' || c == '.' || (c >= '0' && c <= '9'))) return false;
@@ -72,7 +102,7 @@ bool Expect(std::string_view s, size_t& pos, char c) {
 bool ParseIsoTime(std::string_view text, int64_t& seconds) {
   const std::string_view s = TrimSpace(text);
   size_t pos = 0;
-  int year, month, day, hour, minute, second;
+  int year = 0, month = 0, day = 0, hour = 0, minute = 0, second = 0;
   if (!Digits(s, pos, 4, year) || !Expect(s, pos, '-') || !Digits(s, pos, 2, month) ||
       !Expect(s, pos, '-') || !Digits(s, pos, 2, day))
     return false;

@@ -9,7 +9,13 @@
 namespace navmisc::import::detail {
 
 // `text` without the XML white space (blank, tab, CR, LF) around it.
-std::string_view TrimSpace(std::string_view text);
+inline std::string_view TrimSpace(std::string_view text) {
+  auto space = [](char c) { return c == ' ' || c == '\t' || c == '\r' || c == '\n'; };
+  while (!text.empty() && space(text.front())) text.remove_prefix(1);
+  while (!text.empty() && space(text.back())) text.remove_suffix(1);
+  return text;
+}
+
 // A decimal number ("-12.5", "+3", "1e3"); surrounding white space allowed. False for anything
 // else, for NaN and for infinities.
 bool ParseNumber(std::string_view text, double& value);

@@ -1,173 +1,181 @@
 #include "navmisc/import/detail/xml_stream.h"
 
-#include <expat.h>
+#include <libxml/SAX2.h>
+#include <libxml/parser.h>
+#include <libxml/xmlerror.h>
 
 #include <algorithm>
 #include <cstring>
+#include <mutex>
 
 #include "navmisc/import/import_errors.h"
 
 namespace navmisc::import::detail {
 namespace {
 
-// Separates a namespace from the local name in the names expat reports.
-constexpr char kNsSeparator = '\x01';
-// The most bytes handed to expat in one call.
-constexpr size_t kPiece = 1u << 20;
+// The most bytes handed to the parser in one call; also the grain of the pending-bytes bound.
+constexpr size_t kPiece = 256u << 10;
 
-std::string_view LocalName(const char* name) {
-  const char* sep = std::strrchr(name, kNsSeparator);
-  return sep ? std::string_view(sep + 1) : std::string_view(name);
+// The parser's own message, one line, without its trailing line break.
+std::string OneLine(const char* message) {
+  std::string out = message ? message : "";
+  while (!out.empty() && (out.back() == '\n' || out.back() == ' ')) out.pop_back();
+  std::replace(out.begin(), out.end(), '\n', ' ');
+  return out;
 }
 
-// Single-byte encodings that Windows programs declare and expat does not know itself; -1 marks
-// a byte the encoding leaves undefined.
-constexpr int kCp1252High[32] = {
-    0x20AC, -1,     0x201A, 0x0192, 0x201E, 0x2026, 0x2020, 0x2021, 0x02C6, 0x2030, 0x0160,
-    0x2039, 0x0152, -1,     0x017D, -1,     -1,     0x2018, 0x2019, 0x201C, 0x201D, 0x2022,
-    0x2013, 0x2014, 0x02DC, 0x2122, 0x0161, 0x203A, 0x0153, -1,     0x017E, 0x0178};
+void Quiet(void*, const char*, ...) {}
 
-bool SameName(const char* a, const char* b) {
-  for (; *a && *b; ++a, ++b) {
-    char x = *a, y = *b;
-    if (x >= 'A' && x <= 'Z') x = static_cast<char>(x - 'A' + 'a');
-    if (y >= 'A' && y <= 'Z') y = static_cast<char>(y - 'A' + 'a');
-    if (x != y) return false;
-  }
-  return *a == *b;
-}
+constexpr int kOptions = XML_PARSE_NONET;  // no network, no entities substituted, no DTD loaded
 
 }  // namespace
 
-const char* FindAttribute(const char** attributes, std::string_view name) {
-  for (const char** a = attributes; a && a[0]; a += 2) {
-    if (LocalName(a[0]) == name) return a[1];
+std::optional<std::string_view> XmlAttributes::Find(std::string_view name) const {
+  for (int i = 0; i < count_; ++i) {
+    const unsigned char** a = list_ + 5 * i;
+    const char* local = reinterpret_cast<const char*>(a[0]);
+    if (std::strncmp(local, name.data(), name.size()) == 0 && local[name.size()] == '\0') {
+      return std::string_view(reinterpret_cast<const char*>(a[3]), static_cast<size_t>(a[4] - a[3]));
+    }
   }
-  return nullptr;
+  return std::nullopt;
 }
 
-XmlStream::XmlStream(XmlHandler& handler)
-    : parser_(XML_ParserCreateNS(nullptr, kNsSeparator)), handler_(handler) {
+XmlStream::XmlStream(XmlHandler& handler) : handler_(handler) {
+  static std::once_flag init;
+  std::call_once(init, [] { xmlInitParser(); });
+}
+
+// The parser is made by the first Feed or by ReadAll, which need different kinds.
+bool XmlStream::MakeParser(bool pull) {
+  // Some faults (a byte the declared encoding lacks) are also told on the thread's generic error
+  // channel, which writes to stderr; every fault already reaches OnError.
+  xmlSetGenericErrorFunc(nullptr, Quiet);
+  xmlSAXHandler sax;
+  std::memset(&sax, 0, sizeof sax);
+  sax.initialized = XML_SAX2_MAGIC;
+  sax.startElementNs = OnStart;
+  sax.endElementNs = OnEnd;
+  // CDATA sections arrive as plain text when there is no handler of their own.
+  sax.characters = OnText;
+  sax.ignorableWhitespace = OnText;
+  sax.comment = [](void* ctx, const unsigned char*) { Self(ctx).touched_ = true; };
+  sax.processingInstruction = OnOther;
+  // Track files never need a document type; refusing it shuts out every entity trick at once.
+  sax.internalSubset = OnDoctype;
+  sax.serror = OnError;
+  parser_ = pull ? xmlCreateIOParserCtxt(&sax, this, OnRead, nullptr, this, XML_CHAR_ENCODING_NONE)
+                 : xmlCreatePushParserCtxt(&sax, this, nullptr, 0, nullptr);
   if (!parser_) {
     status_ = {DC_ERR_IMPORT_READ, "out of memory for the XML parser"};
-    return;
+    return false;
   }
-  XML_SetUserData(parser_, this);
-  XML_SetElementHandler(parser_, OnStart, OnEnd);
-  XML_SetCharacterDataHandler(parser_, OnText);
-  XML_SetCommentHandler(parser_, OnOther);
-  XML_SetProcessingInstructionHandler(
-      parser_, [](void* self, const char*, const char*) { static_cast<XmlStream*>(self)->Touched(); });
-  XML_SetXmlDeclHandler(parser_, [](void* self, const char*, const char*, int) {
-    static_cast<XmlStream*>(self)->Touched();
-  });
-  XML_SetCdataSectionHandler(
-      parser_, [](void* self) { static_cast<XmlStream*>(self)->Touched(); },
-      [](void* self) { static_cast<XmlStream*>(self)->Touched(); });
-  // Track files never need a document type; refusing it shuts out every entity trick at once.
-  XML_SetStartDoctypeDeclHandler(parser_, OnDoctype);
-  XML_SetParamEntityParsing(parser_, XML_PARAM_ENTITY_PARSING_NEVER);
-  XML_SetExternalEntityRefHandler(parser_, [](XML_Parser, const char*, const char*, const char*,
-                                              const char*) { return int{XML_STATUS_ERROR}; });
-  XML_SetUnknownEncodingHandler(parser_, OnUnknownEncoding, nullptr);
+  xmlCtxtUseOptions(parser_, kOptions);
+  return true;
 }
 
 XmlStream::~XmlStream() {
-  if (parser_) XML_ParserFree(parser_);
+  if (parser_) xmlFreeParserCtxt(parser_);
 }
 
-void XmlStream::Touched() { lastEvent_ = static_cast<uint64_t>(XML_GetCurrentByteIndex(parser_)); }
+XmlStream& XmlStream::Self(void* ctx) { return *static_cast<XmlStream*>(ctx); }
 
 std::string XmlStream::Where() const {
-  return "line " + std::to_string(parser_ ? XML_GetCurrentLineNumber(parser_) : 0) + ": ";
+  return "line " + std::to_string(parser_ ? xmlSAX2GetLineNumber(parser_) : 0) + ": ";
 }
 
 void XmlStream::Stop(int32_t code, std::string message) {
   if (status_.ok()) status_ = {code, std::move(message)};
-  XML_StopParser(parser_, XML_FALSE);
+  if (parser_) xmlStopParser(parser_);
 }
 
-void XmlStream::OnStart(void* p, const char* name, const char** attributes) {
-  auto* self = static_cast<XmlStream*>(p);
-  self->Touched();
-  if (++self->depth_ > kMaxDepth) {
-    self->Stop(DC_ERR_IMPORT_MALFORMED,
-               self->Where() + "elements nested more than " + std::to_string(kMaxDepth) + " deep");
+void XmlStream::OnStart(void* ctx, const unsigned char* localName, const unsigned char*,
+                        const unsigned char*, int, const unsigned char**, int attributeCount, int,
+                        const unsigned char** attributes) {
+  XmlStream& self = Self(ctx);
+  if (!self.status_.ok()) return;
+  self.touched_ = self.started_ = true;
+  if (++self.depth_ > kMaxDepth) {
+    self.Stop(DC_ERR_IMPORT_MALFORMED,
+              self.Where() + "elements nested more than " + std::to_string(kMaxDepth) + " deep");
     return;
   }
-  self->handler_.StartElement(LocalName(name), attributes);
+  self.handler_.StartElement(XmlName(localName), XmlAttributes(attributes, attributeCount));
 }
 
-void XmlStream::OnEnd(void* p, const char* name) {
-  auto* self = static_cast<XmlStream*>(p);
-  self->Touched();
-  --self->depth_;
-  self->handler_.EndElement(LocalName(name));
+void XmlStream::OnEnd(void* ctx, const unsigned char*, const unsigned char*,
+                      const unsigned char*) {
+  XmlStream& self = Self(ctx);
+  if (!self.status_.ok()) return;
+  self.touched_ = true;
+  --self.depth_;
+  self.handler_.EndElement();
 }
 
-void XmlStream::OnText(void* p, const char* text, int length) {
-  auto* self = static_cast<XmlStream*>(p);
-  self->Touched();
-  self->handler_.Text(std::string_view(text, static_cast<size_t>(length)));
+void XmlStream::OnText(void* ctx, const unsigned char* text, int length) {
+  XmlStream& self = Self(ctx);
+  if (!self.status_.ok()) return;
+  self.touched_ = true;
+  self.handler_.Text(std::string_view(reinterpret_cast<const char*>(text), static_cast<size_t>(length)));
 }
 
-void XmlStream::OnOther(void* p, const char*) { static_cast<XmlStream*>(p)->Touched(); }
+void XmlStream::OnOther(void* ctx, const unsigned char*, const unsigned char*) { Self(ctx).touched_ = true; }
 
-void XmlStream::OnDoctype(void* p, const char*, const char*, const char*, int) {
-  auto* self = static_cast<XmlStream*>(p);
-  self->Stop(DC_ERR_IMPORT_DTD, self->Where() +
-                                    "the document declares a document type; track files have "
-                                    "none, and its entities are refused");
+void XmlStream::OnDoctype(void* ctx, const unsigned char*, const unsigned char*, const unsigned char*) {
+  XmlStream& self = Self(ctx);
+  self.Stop(DC_ERR_IMPORT_DTD, self.Where() +
+                                   "the document declares a document type; track files have "
+                                   "none, and its entities are refused");
 }
 
-int XmlStream::OnUnknownEncoding(void*, const char* name, XML_Encoding* info) {
-  const bool cp1252 = SameName(name, "windows-1252") || SameName(name, "cp1252");
-  const bool latin9 = SameName(name, "iso-8859-15") || SameName(name, "latin-9");
-  if (!cp1252 && !latin9) return XML_STATUS_ERROR;
-  for (int i = 0; i < 256; ++i) info->map[i] = i;
-  if (cp1252) {
-    for (int i = 0; i < 32; ++i) info->map[0x80 + i] = kCp1252High[i];
-  } else {
-    const struct { int byte, code; } diffs[] = {{0xA4, 0x20AC}, {0xA6, 0x0160}, {0xA8, 0x0161},
-                                                {0xB4, 0x017D}, {0xB8, 0x017E}, {0xBC, 0x0152},
-                                                {0xBD, 0x0153}, {0xBE, 0x0178}};
-    for (const auto& d : diffs) info->map[d.byte] = d.code;
+void XmlStream::OnError(void* ctx, _xmlError* error) {
+  XmlStream& self = Self(ctx);
+  // Warnings and recoverable errors (an undeclared namespace prefix, say) leave the document
+  // readable; only a fatal error ends it.
+  if (!error || error->level < XML_ERR_FATAL || !self.status_.ok()) return;
+  if (self.fed_ == 0) {
+    self.status_ = {DC_ERR_IMPORT_EMPTY, "the file is empty"};
+    return;
   }
-  info->data = nullptr;
-  info->convert = nullptr;
-  info->release = nullptr;
-  return XML_STATUS_OK;
+  std::string what = OneLine(error->message);
+  // An early end reads as "extra content" to the push parser; say what is really wrong.
+  const bool end = error->code == XML_ERR_DOCUMENT_END || error->code == XML_ERR_TAG_NOT_FINISHED ||
+                   error->code == XML_ERR_DOCUMENT_EMPTY;
+  if (end && self.depth_ > 0) {
+    what = "the document ends before " + std::to_string(self.depth_) + " elements are closed";
+  } else if (end && !self.started_) {
+    what = "no root element";
+  }
+  self.status_ = {DC_ERR_IMPORT_MALFORMED,
+                  "line " + std::to_string(error->line) + ": not well-formed XML (" + what + ")"};
+}
+
+bool XmlStream::Bound(size_t size) {
+  // An event in the latest piece may have come at its start: the bound is loose by one piece.
+  pending_ = touched_ ? size : pending_ + size;
+  touched_ = false;
+  if (pending_ <= kMaxPending) return true;
+  status_ = {DC_ERR_IMPORT_TOO_LONG, Where() + "a single tag, comment or name runs over more than " +
+                                         std::to_string(kMaxPending >> 20) + " MiB"};
+  return false;
 }
 
 bool XmlStream::Parse(const char* data, size_t size, bool final) {
   if (!status_.ok() || finished_) return status_.ok();
-  if (XML_Parse(parser_, data, static_cast<int>(size), final ? XML_TRUE : XML_FALSE) ==
-      XML_STATUS_ERROR) {
-    if (status_.ok()) {
-      const XML_Error err = XML_GetErrorCode(parser_);
-      if (err == XML_ERROR_NO_ELEMENTS && fed_ == 0) {
-        status_ = {DC_ERR_IMPORT_EMPTY, "the file is empty"};
-      } else {
-        status_ = {DC_ERR_IMPORT_MALFORMED,
-                   Where() + "not well-formed XML (" + XML_ErrorString(err) + ")"};
-      }
-    }
-    return false;
-  }
+  if (!parser_ && !MakeParser(false)) return false;
+  fed_ += size;
+  const int rc = xmlParseChunk(parser_, data, static_cast<int>(size), final ? 1 : 0);
   if (!status_.ok()) return false;
-  if (fed_ - std::min(fed_, lastEvent_) > kMaxPending) {
-    status_ = {DC_ERR_IMPORT_TOO_LONG,
-               Where() + "a single tag, comment or name runs over more than " +
-                   std::to_string(kMaxPending >> 20) + " MiB"};
+  if (rc != 0) {
+    status_ = {DC_ERR_IMPORT_MALFORMED, Where() + "not well-formed XML (error " + std::to_string(rc) + ")"};
     return false;
   }
-  return true;
+  return final || Bound(size);
 }
 
 bool XmlStream::Feed(const char* data, size_t size) {
   while (size > 0) {
     const size_t n = std::min(size, kPiece);
-    fed_ += n;
     if (!Parse(data, n, false)) return false;
     data += n;
     size -= n;
@@ -176,9 +184,58 @@ bool XmlStream::Feed(const char* data, size_t size) {
 }
 
 bool XmlStream::Finish() {
+  if (fed_ == 0 && status_.ok()) status_ = {DC_ERR_IMPORT_EMPTY, "the file is empty"};
   const bool ok = Parse(nullptr, 0, true);
   finished_ = true;
   return ok;
+}
+
+int XmlStream::OnRead(void* ctx, char* buffer, int size) {
+  XmlStream& self = Self(ctx);
+  if (!self.status_.ok()) return -1;
+  // The parser takes a short read for the end of the input (at the start it needs its whole
+  // declaration at once), so the buffer is filled as far as the source goes.
+  size_t n = 0;
+  while (n < static_cast<size_t>(size)) {
+    const long got = (*self.source_)(buffer + n, static_cast<size_t>(size) - n);
+    if (got < 0) {
+      self.status_ = {DC_ERR_IMPORT_READ, "the file could not be read"};
+      return -1;
+    }
+    if (got == 0) break;
+    n += static_cast<size_t>(got);
+  }
+  // A refusal here ends the input; the callbacks stay silent from now on.
+  self.fed_ += n;
+  return self.Bound(n) ? static_cast<int>(n) : -1;
+}
+
+bool XmlStream::ReadAll(const TrackReader::Source& source) {
+  if (parser_ || finished_) {
+    status_ = {DC_ERR_IMPORT_READ, "the document is already being read"};
+    return false;
+  }
+  finished_ = true;
+  if (!MakeParser(true)) return false;
+  source_ = &source;
+  const int rc = xmlParseDocument(parser_);
+  // Pulling, the parser takes a NUL byte for the end of the input: whatever follows the document
+  // must still be nothing.
+  if (rc == 0 && status_.ok() && parser_->wellFormed) {
+    char more = 0;
+    const xmlParserInputPtr input = parser_->input;
+    if ((input && input->cur && input->cur < input->end) || OnRead(this, &more, 1) > 0) {
+      status_ = {DC_ERR_IMPORT_MALFORMED, Where() + "not well-formed XML (content after the end of the document)"};
+    }
+  }
+  source_ = nullptr;
+  if (!status_.ok()) return false;
+  if (fed_ == 0) {
+    status_ = {DC_ERR_IMPORT_EMPTY, "the file is empty"};
+  } else if (rc != 0 || !parser_->wellFormed) {
+    status_ = {DC_ERR_IMPORT_MALFORMED, Where() + "not well-formed XML"};
+  }
+  return status_.ok();
 }
 
 }  // namespace navmisc::import::detail

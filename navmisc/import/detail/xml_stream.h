@@ -1,34 +1,59 @@
-// The XML layer of the GPX and TCX readers: expat, fed in pieces, with everything that could
-// make a document cost more than its size refused. No document type declarations (so no
-// entities, internal or external, and no entity expansion), a bounded nesting depth, and a
-// bound on how much expat may buffer for one unfinished token (a 1 GB attribute or tag).
+// The XML layer of the GPX and TCX readers: libxml2's push parser with SAX callbacks, fed in
+// pieces, with everything that could make a document cost more than its size refused. No
+// document type declarations (so no entities, internal or external, and no entity expansion), no
+// network, a bounded nesting depth, and a bound on how much the parser may buffer for one
+// unfinished token (a 1 GB attribute or tag).
 #pragma once
-
-#include <expat.h>
 
 #include <cstddef>
 #include <cstdint>
+#include <optional>
 #include <string>
 #include <string_view>
 
 #include "navmisc/import/track_reader.h"
 
+struct _xmlParserCtxt;
+struct _xmlError;
+
 namespace navmisc::import::detail {
 
-// Element names arrive as their local part (the namespace dropped: GPX 1.0 and 1.1, and the
-// extension schemas of many vendors, use the same local names).
+// A start tag's attributes as the parser reports them: five pointers for each (local name,
+// prefix, namespace, start of the value, end of the value).
+class XmlAttributes {
+ public:
+  XmlAttributes() = default;
+  XmlAttributes(const unsigned char** list, int count) : list_(list), count_(count) {}
+  // The value of the attribute with local name `name`, if the tag has one.
+  std::optional<std::string_view> Find(std::string_view name) const;
+
+ private:
+  const unsigned char** list_ = nullptr;
+  int count_ = 0;
+};
+
+// An element's local name (the namespace dropped: GPX 1.0 and 1.1, and the extension schemas of
+// many vendors, use the same local names). It points into the parser's dictionary: the same name
+// comes at the same address for the whole document, and no other name ever takes that address,
+// so the address identifies the name.
+class XmlName {
+ public:
+  explicit XmlName(const unsigned char* text) : text_(reinterpret_cast<const char*>(text)) {}
+  const char* key() const { return text_; }
+  std::string_view view() const { return text_; }
+
+ private:
+  const char* text_;
+};
+
 class XmlHandler {
  public:
   virtual ~XmlHandler() = default;
-  // `attributes` is expat's list: name, value, name, value, ..., null; names are local.
-  virtual void StartElement(std::string_view name, const char** attributes) = 0;
-  virtual void EndElement(std::string_view name) = 0;
+  virtual void StartElement(XmlName name, const XmlAttributes& attributes) = 0;
+  virtual void EndElement() = 0;
   // Character data, in pieces of any size.
   virtual void Text(std::string_view text) = 0;
 };
-
-// The value of attribute `name` (local name) in an expat attribute list, or null.
-const char* FindAttribute(const char** attributes, std::string_view name);
 
 class XmlStream {
  public:
@@ -45,6 +70,9 @@ class XmlStream {
   // False once the document has failed (status()).
   bool Feed(const char* data, size_t size);
   bool Finish();
+  // The whole document from `source`, pulled by the parser (which is quicker than pushing the
+  // same bytes); instead of Feed and Finish.
+  bool ReadAll(const TrackReader::Source& source);
   // Called by the handler: stops the parsing with this outcome.
   void Stop(int32_t code, std::string message);
   // "line N: " for messages about the current place.
@@ -53,22 +81,32 @@ class XmlStream {
   uint64_t bytesFed() const { return fed_; }
 
  private:
-  static void OnStart(void* self, const char* name, const char** attributes);
-  static void OnEnd(void* self, const char* name);
-  static void OnText(void* self, const char* text, int length);
-  static void OnOther(void* self, const char* data);
-  static void OnDoctype(void* self, const char* name, const char* sysid, const char* pubid,
-                        int hasInternalSubset);
-  static int OnUnknownEncoding(void* data, const char* name, XML_Encoding* info);
+  static void OnStart(void* ctx, const unsigned char* localName, const unsigned char* prefix,
+                      const unsigned char* uri, int namespaceCount, const unsigned char** namespaces,
+                      int attributeCount, int defaultedCount, const unsigned char** attributes);
+  static void OnEnd(void* ctx, const unsigned char* localName, const unsigned char* prefix,
+                    const unsigned char* uri);
+  static void OnText(void* ctx, const unsigned char* text, int length);
+  static void OnOther(void* ctx, const unsigned char* a, const unsigned char* b);
+  static void OnDoctype(void* ctx, const unsigned char* name, const unsigned char* externalId,
+                        const unsigned char* systemId);
+  static void OnError(void* ctx, _xmlError* error);
+  static int OnRead(void* ctx, char* buffer, int size);
+  static XmlStream& Self(void* ctx);
+  bool MakeParser(bool pull);
   bool Parse(const char* data, size_t size, bool final);
-  void Touched();
+  // After `size` more bytes went to the parser: false when too many came without an event.
+  bool Bound(size_t size);
 
-  XML_Parser parser_;
+  _xmlParserCtxt* parser_ = nullptr;
   XmlHandler& handler_;
+  const TrackReader::Source* source_ = nullptr;  // while ReadAll runs
   ReadStatus status_;
   int depth_ = 0;
   uint64_t fed_ = 0;
-  uint64_t lastEvent_ = 0;  // byte offset of the latest event
+  uint64_t pending_ = 0;   // bytes fed since the latest event
+  bool touched_ = false;   // an event since the latest piece was fed
+  bool started_ = false;   // the root element has begun
   bool finished_ = false;
 };
 

@@ -30,7 +30,16 @@ bool XmlTrackReader::Feed(const char* data, size_t size) {
 
 bool XmlTrackReader::Finish() {
   if (failed()) return false;
-  if (!xml_.Finish()) return Fail(xml_.status().code, xml_.status().message);
+  return Settle(xml_.Finish());
+}
+
+bool XmlTrackReader::ReadFrom(const Source& source) {
+  if (failed()) return false;
+  return Settle(xml_.ReadAll(source));
+}
+
+bool XmlTrackReader::Settle(bool ok) {
+  if (!ok) return Fail(xml_.status().code, xml_.status().message);
   AtEnd();
   if (!xml_.status().ok()) return Fail(xml_.status().code, xml_.status().message);
   return true;
@@ -84,14 +93,14 @@ bool XmlTrackReader::ReadTime(std::string_view text, const char* what, int64_t& 
   return true;
 }
 
-bool XmlTrackReader::ReadCoordinate(const char** attributes, const char* name, const char* element,
-                                    bool (*inRange)(double), double& out) {
-  const char* value = FindAttribute(attributes, name);
+bool XmlTrackReader::ReadCoordinate(const XmlAttributes& attributes, const char* name,
+                                    const char* element, bool (*inRange)(double), double& out) {
+  const std::optional<std::string_view> value = attributes.Find(name);
   if (!value) {
     StopAt(DC_ERR_IMPORT_MALFORMED, std::string("<") + element + "> without " + name);
     return false;
   }
-  return ReadNumber(value, name, inRange, out);
+  return ReadNumber(*value, name, inRange, out);
 }
 
 bool XmlTrackReader::Emit(bool accepted) {

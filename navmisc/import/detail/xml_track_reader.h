@@ -2,6 +2,7 @@
 // an element's text, and the checked reading of numbers and times.
 #pragma once
 
+#include <cstdint>
 #include <string>
 #include <utility>
 #include <string_view>
@@ -11,21 +12,48 @@
 
 namespace navmisc::import::detail {
 
-// The element kind of local name `name` in a reader's table (most frequent names first), or
-// `other`.
+// Element kinds by local name, from a reader's table (most frequent names first), `other` for the
+// rest. Names come from the parser's dictionary (see XmlHandler), so a name is looked up in the
+// table once and then known by its address: a document uses a dozen names a million times.
 template <class E, size_t N>
-E ElementOf(std::string_view name, const std::pair<std::string_view, E> (&table)[N], E other) {
-  for (const auto& [n, e] : table) {
-    if (n == name) return e;
+class ElementNames {
+ public:
+  constexpr ElementNames(const std::pair<std::string_view, E> (&table)[N], E other)
+      : table_(table), other_(other) {}
+
+  E operator()(XmlName name) {
+    // One slot per address, by a hash of it; two names that share a slot take turns.
+    const uint64_t hash = static_cast<uint64_t>(reinterpret_cast<uintptr_t>(name.key())) * 0x9E3779B97F4A7C15ull;
+    Seen& seen = seen_[hash >> 58];
+    if (seen.name == name.key()) return seen.kind;
+    E kind = other_;
+    for (const auto& [n, e] : table_) {
+      if (n == name.view()) {
+        kind = e;
+        break;
+      }
+    }
+    seen = {name.key(), kind};
+    return kind;
   }
-  return other;
-}
+
+ private:
+  static constexpr size_t kSeen = 64;  // the hash keeps 6 bits
+  struct Seen {
+    const char* name = nullptr;
+    E kind{};
+  };
+  const std::pair<std::string_view, E> (&table_)[N];
+  E other_;
+  Seen seen_[kSeen];
+};
 
 class XmlTrackReader : public TrackReader, protected XmlHandler {
  public:
   explicit XmlTrackReader(ImportSink& sink) : sink_(sink), xml_(*this) {}
   bool Feed(const char* data, size_t size) override;
   bool Finish() override;
+  bool ReadFrom(const Source& source) override;
 
  protected:
   // Called by Finish after a well-formed end, before the status is settled.
@@ -51,7 +79,7 @@ class XmlTrackReader : public TrackReader, protected XmlHandler {
   bool ReadNumber(std::string_view text, const char* what, bool (*inRange)(double), double& out);
   bool ReadTime(std::string_view text, const char* what, int64_t& out);
   // A required coordinate attribute of a point element.
-  bool ReadCoordinate(const char** attributes, const char* name, const char* element,
+  bool ReadCoordinate(const XmlAttributes& attributes, const char* name, const char* element,
                       bool (*inRange)(double), double& out);
 
   // Sink calls that count and stop the document when the sink says stop.
@@ -70,6 +98,8 @@ class XmlTrackReader : public TrackReader, protected XmlHandler {
   ImportSink& sink_;
 
  private:
+  // The end of the document, reached by Finish or ReadFrom: `ok` is the stream's verdict.
+  bool Settle(bool ok);
   static constexpr int kNoField = -1;
   XmlStream xml_;
   std::string text_;
