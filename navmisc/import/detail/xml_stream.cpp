@@ -185,9 +185,22 @@ bool XmlStream::Feed(const char* data, size_t size) {
 
 bool XmlStream::Finish() {
   if (fed_ == 0 && status_.ok()) status_ = {DC_ERR_IMPORT_EMPTY, "the file is empty"};
-  const bool ok = Parse(nullptr, 0, true);
+  Parse(nullptr, 0, true);
   finished_ = true;
-  return ok;
+  return Closed();
+}
+
+bool XmlStream::Closed() {
+  // The parser lets a few faults pass unsaid (bytes its converter gives up on, in some cuts of
+  // the input): a document is only whole when its root element has ended.
+  if (status_.ok() && (!started_ || depth_ != 0)) {
+    status_ = {DC_ERR_IMPORT_MALFORMED,
+               Where() + "not well-formed XML (" +
+                   (started_ ? "the document ends before " + std::to_string(depth_) + " elements are closed"
+                             : std::string("no root element")) +
+                   ")"};
+  }
+  return status_.ok();
 }
 
 int XmlStream::OnRead(void* ctx, char* buffer, int size) {
@@ -235,7 +248,7 @@ bool XmlStream::ReadAll(const TrackReader::Source& source) {
   } else if (rc != 0 || !parser_->wellFormed) {
     status_ = {DC_ERR_IMPORT_MALFORMED, Where() + "not well-formed XML"};
   }
-  return status_.ok();
+  return Closed();
 }
 
 }  // namespace navmisc::import::detail

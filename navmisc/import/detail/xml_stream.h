@@ -94,6 +94,8 @@ class XmlStream {
   static int OnRead(void* ctx, char* buffer, int size);
   static XmlStream& Self(void* ctx);
   bool MakeParser(bool pull);
+  // After the end of the input: false unless the root element has ended (and nothing failed).
+  bool Closed();
   bool Parse(const char* data, size_t size, bool final);
   // After `size` more bytes went to the parser: false when too many came without an event.
   bool Bound(size_t size);
