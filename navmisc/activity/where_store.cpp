@@ -16,6 +16,16 @@ std::string TrackDataScript(long time, double latitude, double longitude, double
                  speed * 0.001);
 }
 
+WhereStoreOpen OpenWhereStore(WHEREIAM_DATA_NODE& store, std::optional<WHERE_ITEM_TYPE> type) {
+  if (store.ReadInfo(0, nullptr) == 1 && !store.readGuard.IsComplete()) return WhereStoreOpen::kUnreadable;
+  if (store.item) return WhereStoreOpen::kReady;
+  auto* trip = new BLOG_ITEM_INFO(GPS_APP_WHEREAMI, nullptr, 0);
+  trip->name = L"Where am I";
+  trip->fileName = trip->name;
+  store.AddWhereItem(type.value_or(store.itemType), trip);
+  return store.WriteInfo(true, 0, nullptr) ? WhereStoreOpen::kReady : WhereStoreOpen::kUnwritable;
+}
+
 }  // namespace navmisc::activity
 
 WHEREIAM_DATA_NODE::~WHEREIAM_DATA_NODE() { delete item; }

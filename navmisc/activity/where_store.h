@@ -4,6 +4,7 @@
 #pragma once
 
 #include <cstdint>
+#include <optional>
 #include <string>
 
 #include "navmisc/platform/cstring.h"
@@ -69,4 +70,11 @@ class WHEREIAM_DATA_NODE {
 namespace navmisc::activity {
 // The text of "track_data.js" for a position (speed in metres per hour).
 std::string TrackDataScript(long time, double latitude, double longitude, double altitude, double speed);
+
+enum class WhereStoreOpen { kReady, kUnreadable, kUnwritable };
+// Reads the where-am-I store into `store` and, when it holds no trip, gives it a fresh one
+// ("Where am I", of item kind `type`, or of the kind the store's file gives) and saves it. kUnreadable when the trip the store names does
+// not read: replacing it would leave that trip's folder to the next clean-up, so the store is
+// left for the user to repair. kUnwritable when the new trip could not be saved.
+WhereStoreOpen OpenWhereStore(WHEREIAM_DATA_NODE& store, std::optional<WHERE_ITEM_TYPE> type = std::nullopt);
 }  // namespace navmisc::activity

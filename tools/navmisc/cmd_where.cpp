@@ -70,14 +70,11 @@ void Follow(int count, double seconds) {
 std::string SetWherePosition(const WherePosition& p) {
   WHEREIAM_DATA_NODE store;
   const CString path = WHEREIAM_DATA_NODE::GetStorePathName();
-  if (store.ReadInfo(0, nullptr) == 1 && !store.readGuard.IsComplete()) {
-    Fail("the trip named by " + path.ToUtf8() + " cannot be read; it stays as it is");
-  }
-  if (!store.item) {
-    auto* trip = new BLOG_ITEM_INFO(GPS_APP_WHEREAMI, nullptr, 0);
-    trip->name = L"Where am I";
-    trip->fileName = trip->name;
-    store.AddWhereItem(WHERE_ITEM_TYPE(p.type), trip);
+  switch (navmisc::activity::OpenWhereStore(store, WHERE_ITEM_TYPE(p.type))) {
+    case navmisc::activity::WhereStoreOpen::kReady: break;
+    case navmisc::activity::WhereStoreOpen::kUnreadable:
+      Fail("the trip named by " + path.ToUtf8() + " cannot be read; it stays as it is");
+    case navmisc::activity::WhereStoreOpen::kUnwritable: Fail("cannot write " + path.ToUtf8());
   }
   const long time = p.time == -1 ? GetCurDateTime() : p.time;
   if (!store.AddWhereItem(WHERE_ITEM_TYPE(p.type), time, p.lon, p.lat, p.alt, p.speedKmh * 1000.0)) {
