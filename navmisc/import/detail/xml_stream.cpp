@@ -237,7 +237,8 @@ bool XmlStream::ReadAll(const TrackReader::Source& source) {
   if (rc == 0 && status_.ok() && parser_->wellFormed) {
     char more = 0;
     const xmlParserInputPtr input = parser_->input;
-    if ((input && input->cur && input->cur < input->end) || OnRead(this, &more, 1) > 0) {
+    const bool unconverted = input && input->buf && input->buf->raw && xmlBufUse(input->buf->raw) > 0;
+    if ((input && input->cur && input->cur < input->end) || unconverted || OnRead(this, &more, 1) > 0) {
       status_ = {DC_ERR_IMPORT_MALFORMED, Where() + "not well-formed XML (content after the end of the document)"};
     }
   }
