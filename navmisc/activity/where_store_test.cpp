@@ -94,8 +94,25 @@ TEST_F(WhereStore, HoldsOneTripPersistsItAndCleansAroundIt) {
   EXPECT_TRUE(FileExists(PathJoin(where, L"MAP_HTML")));
   EXPECT_TRUE(FileExists(PathJoin(where, L"stale")));
 
+  // Opening for a position keeps such a store as it is rather than give it a new trip.
+  const std::string named = ReadFileBytes(WHEREIAM_DATA_NODE::GetStorePathName());
+  WHEREIAM_DATA_NODE opened;
+  EXPECT_EQ(navmisc::activity::OpenWhereStore(opened), navmisc::activity::WhereStoreOpen::kUnreadable);
+  EXPECT_EQ(ReadFileBytes(WHEREIAM_DATA_NODE::GetStorePathName()), named);
+
   DeleteFile(WHEREIAM_DATA_NODE::GetStorePathName());
   EXPECT_EQ(lost.ReadInfo(0, nullptr), 0);
+
+  // With no store yet, opening makes and saves the trip, of the kind asked for; a second opening
+  // finds that same trip.
+  WHEREIAM_DATA_NODE first;
+  ASSERT_EQ(navmisc::activity::OpenWhereStore(first, WHERE_ITEM_TYPE(4)), navmisc::activity::WhereStoreOpen::kReady);
+  ASSERT_NE(first.item, nullptr);
+  EXPECT_EQ(std::tuple(first.itemType, first.item->name), std::tuple(4, CString(L"Where am I")));
+  WHEREIAM_DATA_NODE again;
+  ASSERT_EQ(navmisc::activity::OpenWhereStore(again), navmisc::activity::WhereStoreOpen::kReady);
+  ASSERT_NE(again.item, nullptr);
+  EXPECT_EQ(std::tuple(again.itemType, again.item->tripId), std::tuple(4, first.item->tripId));
 }
 
 }  // namespace
