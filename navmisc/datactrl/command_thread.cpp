@@ -18,6 +18,9 @@ using Clock = std::chrono::steady_clock;
 
 constexpr uint32_t kReceiveWaitMs = 500;  // the longest wait for a reply in one pass
 constexpr unsigned kIdleMs = 200;         // the idle wait after a pass without a reply
+// Both waits are taken in slices of this length, so that g_bExit ends them soon: a program
+// that is done with the channel should not wait out a pass before the process is told to end.
+constexpr uint32_t kSliceMs = 50;
 // A process that dies is started again after these delays, one per consecutive death; after
 // the last one the channel gives up. A process that has run this long resets the count.
 constexpr int kRestartDelaysMs[] = {250, 500, 1000, 2000, 4000};
@@ -175,10 +178,14 @@ uint32_t ProcessCommand(void* owner) {
     Supervisor supervisor(c, hwnd, *replies);
     while (!g_bExit) {
       CxSysMsgInfo info;
-      if (auto reply = replies->Receive(kReceiveWaitMs, &info, 1)) {
+      std::unique_ptr<uint8_t[]> reply;
+      for (uint32_t waited = 0; !reply && waited < kReceiveWaitMs && !g_bExit; waited += kSliceMs) {
+        reply = replies->Receive(kSliceMs, &info, 1);
+      }
+      if (reply) {
         DeliverReply(hwnd, reply.get(), info.nSize);
       } else {
-        ReleaseCPUTime(kIdleMs);
+        for (unsigned idle = 0; idle < kIdleMs && !g_bExit; idle += kSliceMs) ReleaseCPUTime(kSliceMs);
       }
       if (!supervisor.Check()) break;
     }
