@@ -1,6 +1,7 @@
 // What the track-reader fuzz targets share: the document is read three times (pushed whole,
-// pushed in pieces cut where its first bytes say, and pulled by the reader in such pieces), and
-// the readings must agree (see Fuzz). The sink checks on the way that every call comes where it
+// pushed in pieces cut where its first bytes say, and pulled by the reader in such pieces), an
+// XML document a fourth time in two parts at once where it can be cut, and the readings must
+// agree (see Fuzz). The sink checks on the way that every call comes where it
 // may and every value lies in its range.
 #pragma once
 
@@ -12,6 +13,7 @@
 #include <memory>
 #include <string>
 
+#include "navmisc/import/detail/split_read.h"
 #include "navmisc/import/track_reader.h"
 
 namespace navmisc::import::fuzzing {
@@ -115,7 +117,27 @@ inline bool Converted(const uint8_t* data, size_t size) {
          head.substr(0, line).find("encoding") != std::string::npos;
 }
 
-inline int Fuzz(const MakeReader& make, const uint8_t* data, size_t size) {
+// Read in two parts, cut near where its second byte says; "" when the reading found no place to
+// cut there.
+inline std::string ReadSplit(const detail::ReaderFactory& make, const uint8_t* data, size_t size) {
+  if (size < 2) return {};
+  CheckingSink sink;
+  detail::SplitInput input;
+  input.size = size;
+  input.head = std::string_view(reinterpret_cast<const char*>(data), size);
+  input.readAt = [data, size](uint64_t offset, char* out, size_t room, std::string&) -> long {
+    if (offset >= size) return 0;
+    const size_t n = std::min<size_t>(room, size - offset);
+    std::memcpy(out, data + offset, n);
+    return static_cast<long>(n);
+  };
+  detail::SplitOutcome outcome;
+  if (!detail::ReadInTwoParts(input, size * (1 + data[1] % 7) / 8, make, sink, {}, outcome)) return {};
+  return sink.log + "|" + std::to_string(outcome.status.code);
+}
+
+inline int Fuzz(const MakeReader& make, const uint8_t* data, size_t size,
+                const detail::ReaderFactory& makeXml = {}) {
   const size_t piece = size > 0 ? 1 + data[0] % 17 : 1;
   const std::string whole = ReadAll(make, data, size, size ? size : 1);
   const std::string pieces = ReadAll(make, data, size, piece);
@@ -125,6 +147,10 @@ inline int Fuzz(const MakeReader& make, const uint8_t* data, size_t size) {
   // depends on the cut, so only the ways that both stream must agree for those.
   if (!Converted(data, size) && whole != pieces) std::abort();
   if (!Agree(pieces, pulled)) std::abort();
+  if (makeXml) {
+    const std::string split = ReadSplit(makeXml, data, size);
+    if (!split.empty() && !Agree(pieces, split)) std::abort();
+  }
   return 0;
 }
 

@@ -35,8 +35,10 @@ enum class Field : uint8_t {
 class GpxReader final : public XmlTrackReader {
  public:
   using XmlTrackReader::XmlTrackReader;
+  std::string_view PointElement() const override { return "trkpt"; }
 
  private:
+  std::string StateBetweenPoints() const override;
   void StartElement(detail::XmlName name, const detail::XmlAttributes& attributes) override;
   void EndElement() override;
   void AtEnd() override { SendDocument(); }
@@ -88,6 +90,17 @@ Field GpxReader::FieldOf(El el, El parent) const {
     case El::kCadence: return inExtensions ? Field::kCadence : Field::kNone;
     default: return Field::kNone;
   }
+}
+
+std::string GpxReader::StateBetweenPoints() const {
+  // Inside an open segment of a track whose start the sink has had; the track's name, the point
+  // and the marker are all reset before they are used again.
+  if (point_kind_ != El::kOther || extensions_depth_ != 0 || !track_open_ || track_pending_ || !segment_open_)
+    return {};
+  std::string out(stack_.size() + 1, '\0');
+  for (size_t i = 0; i < stack_.size(); ++i) out[i] = static_cast<char>('A' + static_cast<int>(stack_[i]));
+  out.back() = doc_sent_ ? 'd' : '-';
+  return out;
 }
 
 void GpxReader::StartElement(detail::XmlName name, const detail::XmlAttributes& attributes) {
@@ -240,8 +253,10 @@ void GpxReader::SendDocument() {
 
 }  // namespace
 
-std::unique_ptr<TrackReader> MakeGpxReader(ImportSink& sink) {
-  return std::make_unique<GpxReader>(sink);
-}
+namespace detail {
+std::unique_ptr<XmlTrackReader> NewGpxReader(ImportSink& sink) { return std::make_unique<GpxReader>(sink); }
+}  // namespace detail
+
+std::unique_ptr<TrackReader> MakeGpxReader(ImportSink& sink) { return detail::NewGpxReader(sink); }
 
 }  // namespace navmisc::import

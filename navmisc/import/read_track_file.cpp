@@ -4,8 +4,10 @@
 #include <cctype>
 #include <cstring>
 #include <memory>
+#include <thread>
 #include <vector>
 
+#include "navmisc/import/detail/split_read.h"
 #include "navmisc/import/import_errors.h"
 #include "navmisc/platform/files.h"
 #include "navmisc/platform/input_file.h"
@@ -181,6 +183,17 @@ ReadStatus Convert(InputFile& file, const FileFormat& format, ProgressSink& sink
   return reader->status();
 }
 
+// The verdicts every reading ends with.
+ReadFileResult Conclude(ReadFileResult result, ProgressSink& counted, const ReadProgress& progress) {
+  if (result.status.ok() && result.counts.points == 0 && result.counts.markers == 0)
+    result.status = {DC_ERR_IMPORT_NO_POINTS, "the file holds no track point and no waypoint"};
+  if (result.status.ok() && !counted.Report()) result.status = {DC_ERR_IMPORT_CANCELLED, ""};
+  if (result.status.code == DC_ERR_IMPORT_CANCELLED) {
+    result.status.message = "stopped on request after " + std::to_string(progress.points) + " points";
+  }
+  return result;
+}
+
 }  // namespace
 
 bool ParseFormatName(std::string_view name, FileFormat& out) {
@@ -259,6 +272,26 @@ ReadFileResult ReadTrackFile(const wchar_t* path, ImportSink& sink, const ReadFi
   if (result.format.format == Format::kConverter) {
     result.status = Convert(file, result.format, counted, options, progress, result.counts);
   } else {
+    const bool xml = result.format.format == Format::kGpx || result.format.format == Format::kTcx;
+    if (xml && file.size() >= options.splitFrom && std::thread::hardware_concurrency() >= 2) {
+      detail::SplitInput input;
+      input.size = file.size();
+      input.head = std::string_view(buffer.data(), static_cast<size_t>(n));
+      input.readAt = [&file](uint64_t offset, char* out, size_t size, std::string& error) -> long {
+        return file.ReadAt(offset, out, size, error);
+      };
+      const detail::ReaderFactory make = result.format.format == Format::kGpx ? detail::NewGpxReader
+                                                                              : detail::NewTcxReader;
+      // The first part's thread also hands every point to the sink: it takes the smaller part.
+      detail::SplitOutcome split;
+      if (detail::ReadInTwoParts(input, file.size() / 16 * 7, make, counted,
+                                 [&progress](uint64_t at) { progress.bytesRead = at; }, split)) {
+        result.status = split.status;
+        result.counts = split.counts;
+        result.parts = split.cut ? 2 : 1;
+        return Conclude(result, counted, progress);
+      }
+    }
     std::unique_ptr<TrackReader> reader;
     switch (result.format.format) {
       case Format::kGpx: reader = MakeGpxReader(counted); break;
@@ -289,13 +322,7 @@ ReadFileResult ReadTrackFile(const wchar_t* path, ImportSink& sink, const ReadFi
     result.status = reader->status();
     result.counts = reader->counts();
   }
-  if (result.status.ok() && result.counts.points == 0 && result.counts.markers == 0)
-    result.status = {DC_ERR_IMPORT_NO_POINTS, "the file holds no track point and no waypoint"};
-  if (result.status.ok() && !counted.Report()) result.status = {DC_ERR_IMPORT_CANCELLED, ""};
-  if (result.status.code == DC_ERR_IMPORT_CANCELLED) {
-    result.status.message = "stopped on request after " + std::to_string(progress.points) + " points";
-  }
-  return result;
+  return Conclude(result, counted, progress);
 }
 
 }  // namespace navmisc::import

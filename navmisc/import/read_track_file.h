@@ -53,6 +53,9 @@ struct ReadFileOptions {
   const bool* keepGoing = nullptr;
   // The gpsbabel program; empty: "gpsbabel" on PATH.
   std::string converter;
+  // GPX and TCX files of at least this many bytes are read in two parts at once, on two cores,
+  // when the machine has them and the file has a place to cut (between two track points).
+  uint64_t splitFrom = 8u << 20;
 };
 
 inline constexpr uint64_t kProgressPoints = 1000;
@@ -61,6 +64,7 @@ struct ReadFileResult {
   ReadStatus status;
   ReadCounts counts;
   FileFormat format;  // the format the file was read as
+  int parts = 1;      // 2 when the file was read in two parts at once
 };
 
 // Reads `path` into `sink`. A file without any point or marker fails with

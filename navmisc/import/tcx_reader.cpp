@@ -37,8 +37,10 @@ enum class Field : uint8_t {
 class TcxReader final : public XmlTrackReader {
  public:
   using XmlTrackReader::XmlTrackReader;
+  std::string_view PointElement() const override { return "Trackpoint"; }
 
  private:
+  std::string StateBetweenPoints() const override;
   void StartElement(detail::XmlName name, const detail::XmlAttributes& attributes) override;
   void EndElement() override;
 
@@ -95,6 +97,17 @@ Field TcxReader::FieldOf(El el) const {
     case El::kPointType: return inPoint && point_is_marker_ ? Field::kMarkerType : Field::kNone;
     default: return Field::kNone;
   }
+}
+
+std::string TcxReader::StateBetweenPoints() const {
+  // Inside the open segment of a lap the sink has had. The lap's number stays in the state: the
+  // next lap's name follows from it.
+  if (point_depth_ != 0 || extensions_depth_ != 0 || segment_depth_ == 0 || !track_sent_) return {};
+  std::string out;
+  for (const El el : stack_) out += static_cast<char>('A' + static_cast<int>(el));
+  out += ' ' + std::to_string(track_depth_) + ' ' + std::to_string(segment_depth_) + ' ' +
+         std::to_string(lap_number_);
+  return out;
 }
 
 void TcxReader::StartElement(detail::XmlName name, const detail::XmlAttributes& /*attributes*/) {
@@ -228,8 +241,10 @@ void TcxReader::StoreField(int field, std::string_view text) {
 
 }  // namespace
 
-std::unique_ptr<TrackReader> MakeTcxReader(ImportSink& sink) {
-  return std::make_unique<TcxReader>(sink);
-}
+namespace detail {
+std::unique_ptr<XmlTrackReader> NewTcxReader(ImportSink& sink) { return std::make_unique<TcxReader>(sink); }
+}  // namespace detail
+
+std::unique_ptr<TrackReader> MakeTcxReader(ImportSink& sink) { return detail::NewTcxReader(sink); }
 
 }  // namespace navmisc::import

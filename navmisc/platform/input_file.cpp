@@ -65,6 +65,17 @@ ssize_t InputFile::Read(char* buffer, size_t capacity) {
   }
 }
 
+ssize_t InputFile::ReadAt(uint64_t offset, char* buffer, size_t capacity, std::string& error) const {
+  if (fd_ < 0) return -1;
+  for (;;) {
+    const ssize_t n = ::pread(fd_, buffer, capacity, static_cast<off_t>(offset));
+    if (n >= 0) return n;
+    if (errno == EINTR) continue;
+    error = ::strerror(errno);
+    return -1;
+  }
+}
+
 bool InputFile::Rewind() { return fd_ >= 0 && ::lseek(fd_, 0, SEEK_SET) == 0; }
 
 }  // namespace navmisc

@@ -32,6 +32,9 @@ class InputFile {
   uint64_t size() const { return size_; }
   // Reads up to `capacity` bytes: the count read, 0 at the end, -1 on a read error (error()).
   ssize_t Read(char* buffer, size_t capacity);
+  // Reads up to `capacity` bytes at `offset`, leaving the position of Read alone; safe from
+  // several threads at once. The count, 0 at the end, -1 on a read error, its reason in `error`.
+  ssize_t ReadAt(uint64_t offset, char* buffer, size_t capacity, std::string& error) const;
   // Back to the first byte.
   bool Rewind();
   // The open descriptor, to hand the same file to a child process (SpawnOptions::stdinFd).

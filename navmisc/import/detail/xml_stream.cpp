@@ -64,6 +64,7 @@ bool XmlStream::MakeParser(bool pull) {
   // Track files never need a document type; refusing it shuts out every entity trick at once.
   sax.internalSubset = OnDoctype;
   sax.serror = OnError;
+  pull_ = pull;
   parser_ = pull ? xmlCreateIOParserCtxt(&sax, this, OnRead, nullptr, this, XML_CHAR_ENCODING_NONE)
                  : xmlCreatePushParserCtxt(&sax, this, nullptr, 0, nullptr);
   if (!parser_) {
@@ -89,7 +90,7 @@ void XmlStream::Stop(int32_t code, std::string message) {
   if (parser_) xmlStopParser(parser_);
 }
 
-void XmlStream::OnStart(void* ctx, const unsigned char* localName, const unsigned char*,
+void XmlStream::OnStart(void* ctx, const unsigned char* localName, const unsigned char* prefix,
                         const unsigned char*, int, const unsigned char**, int attributeCount, int,
                         const unsigned char** attributes) {
   XmlStream& self = Self(ctx);
@@ -100,6 +101,7 @@ void XmlStream::OnStart(void* ctx, const unsigned char* localName, const unsigne
               self.Where() + "elements nested more than " + std::to_string(kMaxDepth) + " deep");
     return;
   }
+  self.prefixes_[self.depth_] = prefix;
   self.handler_.StartElement(XmlName(localName), XmlAttributes(attributes, attributeCount));
 }
 
@@ -188,6 +190,30 @@ bool XmlStream::Finish() {
   Parse(nullptr, 0, true);
   finished_ = true;
   return Closed();
+}
+
+std::string XmlStream::ContentContext() const {
+  if (!parser_ || pull_ || finished_ || !status_.ok() || !started_ || depth_ == 0 ||
+      parser_->instate != XML_PARSER_CONTENT || parser_->nameNr != depth_)
+    return {};
+  const xmlParserInputPtr input = parser_->input;
+  if (!input || !input->buf || input->buf->encoder || !input->cur || !input->end) return {};
+  for (const unsigned char* p = input->cur; p < input->end; ++p) {
+    if (*p != ' ' && *p != '\t' && *p != '\r' && *p != '\n') return {};
+  }
+  // Strings of the parser never hold a NUL: it separates them here.
+  std::string out;
+  auto add = [&out](const unsigned char* text) {
+    if (text) out += reinterpret_cast<const char*>(text);
+    out += '\0';
+  };
+  for (int i = 0; i < depth_; ++i) {
+    add(prefixes_[i + 1]);
+    add(parser_->nameTab[i]);
+  }
+  out += '\n';
+  for (int i = 0; i < parser_->nsNr; ++i) add(parser_->nsTab[i]);
+  return out;
 }
 
 bool XmlStream::Closed() {

@@ -79,6 +79,11 @@ class XmlStream {
   std::string Where() const;
   const ReadStatus& status() const { return status_; }
   uint64_t bytesFed() const { return fed_; }
+  // Where a document fed in pieces stands after the latest Feed, for cutting it in two: when the
+  // parser has taken in every byte so far but white space, stands in element content and
+  // converts no encoding, the open elements and the namespaces in scope, written out; "" when
+  // not. Bytes that follow read the same after any prefix that leaves the same context.
+  std::string ContentContext() const;
 
  private:
   static void OnStart(void* ctx, const unsigned char* localName, const unsigned char* prefix,
@@ -101,6 +106,7 @@ class XmlStream {
   bool Bound(size_t size);
 
   _xmlParserCtxt* parser_ = nullptr;
+  bool pull_ = false;
   XmlHandler& handler_;
   const TrackReader::Source* source_ = nullptr;  // while ReadAll runs
   ReadStatus status_;
@@ -110,6 +116,8 @@ class XmlStream {
   bool touched_ = false;   // an event since the latest piece was fed
   bool started_ = false;   // the root element has begun
   bool finished_ = false;
+  // The namespace prefix of each open element (the parser's own table keeps only local names).
+  const unsigned char* prefixes_[kMaxDepth + 1] = {};
 };
 
 }  // namespace navmisc::import::detail

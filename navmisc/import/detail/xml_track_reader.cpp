@@ -45,6 +45,15 @@ bool XmlTrackReader::Settle(bool ok) {
   return true;
 }
 
+std::string XmlTrackReader::SplitState() const {
+  if (failed() || Capturing()) return {};
+  std::string reader = StateBetweenPoints();
+  if (reader.empty()) return {};
+  std::string parser = xml_.ContentContext();
+  if (parser.empty()) return {};
+  return reader + '\n' + parser;
+}
+
 void XmlTrackReader::Text(std::string_view text) {
   if (Capturing()) AppendCapped(text_, text, kMaxText);
 }

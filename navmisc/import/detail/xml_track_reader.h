@@ -3,6 +3,7 @@
 #pragma once
 
 #include <cstdint>
+#include <memory>
 #include <string>
 #include <utility>
 #include <string_view>
@@ -55,7 +56,17 @@ class XmlTrackReader : public TrackReader, protected XmlHandler {
   bool Finish() override;
   bool ReadFrom(const Source& source) override;
 
+  // For reading a document in two parts (split_read.h). The local name of the elements that
+  // hold a track's points, as the document's raw bytes open them ("<trkpt").
+  virtual std::string_view PointElement() const = 0;
+  // After Feed: when the reader stands between two points of a track, with nothing of a point
+  // or a text pending, its whole state and the parser's context written out, so that two
+  // readers that agree on it read whatever follows alike; "" anywhere else.
+  std::string SplitState() const;
+
  protected:
+  // The reader's own part of SplitState: "" when it is not between two points.
+  virtual std::string StateBetweenPoints() const = 0;
   // Called by Finish after a well-formed end, before the status is settled.
   virtual void AtEnd() {}
 
@@ -106,5 +117,8 @@ class XmlTrackReader : public TrackReader, protected XmlHandler {
   int field_ = kNoField;
   size_t fieldDepth_ = 0;
 };
+
+std::unique_ptr<XmlTrackReader> NewGpxReader(ImportSink& sink);
+std::unique_ptr<XmlTrackReader> NewTcxReader(ImportSink& sink);
 
 }  // namespace navmisc::import::detail
