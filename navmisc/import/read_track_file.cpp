@@ -183,6 +183,32 @@ ReadStatus Convert(InputFile& file, const FileFormat& format, ProgressSink& sink
   return reader->status();
 }
 
+// A long GPX or TCX file on two cores (detail/split_read.h). False when it is to be read in one
+// piece; nothing has been read then but `head`, its first bytes.
+bool ReadInParts(const InputFile& file, std::string_view head, const ReadFileOptions& options,
+                 ProgressSink& counted, ReadProgress& progress, ReadFileResult& result) {
+  const Format format = result.format.format;
+  if ((format != Format::kGpx && format != Format::kTcx) || file.size() < options.splitFrom ||
+      std::thread::hardware_concurrency() < 2)
+    return false;
+  detail::SplitInput input;
+  input.size = file.size();
+  input.head = head;
+  input.readAt = [&file](uint64_t offset, char* out, size_t size, std::string& error) -> long {
+    return file.ReadAt(offset, out, size, error);
+  };
+  // The first part's thread also hands every point to the sink: it takes the smaller part.
+  detail::SplitOutcome split;
+  if (!detail::ReadInTwoParts(input, file.size() / 16 * 7,
+                              format == Format::kGpx ? detail::NewGpxReader : detail::NewTcxReader, counted,
+                              [&progress](uint64_t at) { progress.bytesRead = at; }, split))
+    return false;
+  result.status = split.status;
+  result.counts = split.counts;
+  result.parts = split.cut ? 2 : 1;
+  return true;
+}
+
 // The verdicts every reading ends with.
 ReadFileResult Conclude(ReadFileResult result, ProgressSink& counted, const ReadProgress& progress) {
   if (result.status.ok() && result.counts.points == 0 && result.counts.markers == 0)
@@ -272,26 +298,9 @@ ReadFileResult ReadTrackFile(const wchar_t* path, ImportSink& sink, const ReadFi
   if (result.format.format == Format::kConverter) {
     result.status = Convert(file, result.format, counted, options, progress, result.counts);
   } else {
-    const bool xml = result.format.format == Format::kGpx || result.format.format == Format::kTcx;
-    if (xml && file.size() >= options.splitFrom && std::thread::hardware_concurrency() >= 2) {
-      detail::SplitInput input;
-      input.size = file.size();
-      input.head = std::string_view(buffer.data(), static_cast<size_t>(n));
-      input.readAt = [&file](uint64_t offset, char* out, size_t size, std::string& error) -> long {
-        return file.ReadAt(offset, out, size, error);
-      };
-      const detail::ReaderFactory make = result.format.format == Format::kGpx ? detail::NewGpxReader
-                                                                              : detail::NewTcxReader;
-      // The first part's thread also hands every point to the sink: it takes the smaller part.
-      detail::SplitOutcome split;
-      if (detail::ReadInTwoParts(input, file.size() / 16 * 7, make, counted,
-                                 [&progress](uint64_t at) { progress.bytesRead = at; }, split)) {
-        result.status = split.status;
-        result.counts = split.counts;
-        result.parts = split.cut ? 2 : 1;
-        return Conclude(result, counted, progress);
-      }
-    }
+    if (ReadInParts(file, std::string_view(buffer.data(), static_cast<size_t>(n)), options, counted, progress,
+                    result))
+      return Conclude(result, counted, progress);
     std::unique_ptr<TrackReader> reader;
     switch (result.format.format) {
       case Format::kGpx: reader = MakeGpxReader(counted); break;
