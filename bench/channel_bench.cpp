@@ -3,7 +3,8 @@
 //   the kernel's own message channel), for 100-byte and 30 KB messages: messages per second;
 // - a request and its reply through the command thread and the real GpsDataControl.exe: median
 //   and 99th percentile of the round trip, replies per second one at a time and pipelined;
-// - the CPU time that the channel (command thread and process) takes in 10 s of idling.
+// - the CPU time that the channel (command thread and process) takes in 10 s of idling;
+// - how long the channel takes to close once the exit flag is set.
 //
 //   cmake --preset release && cmake --build --preset release && build/release/bench/channel_bench
 #include <benchmark/benchmark.h>
@@ -196,9 +197,14 @@ void RoundTrips() {
                 "%.3f%% of one core (target < 1%%)%s\n",
                 seconds, own, child, percent, percent < 1.0 ? "" : "  ABOVE TARGET");
   }
+  // Every command of the command-line tool ends so: how long until the channel has closed.
+  const auto exitStart = Clock::now();
   g_bExit = true;
   until([&] { return finished.load(); }, 30000);
   command.join();
+  std::printf("channel closed %.1f ms after the exit flag was set (the process ended, the command "
+              "thread returned)\n",
+              std::chrono::duration<double, std::milli>(Clock::now() - exitStart).count());
 }
 
 }  // namespace

@@ -197,11 +197,13 @@ bool ReadInParts(const InputFile& file, std::string_view head, const ReadFileOpt
   input.readAt = [&file](uint64_t offset, char* out, size_t size, std::string& error) -> long {
     return file.ReadAt(offset, out, size, error);
   };
+  // After a second part that failed, the first reads its bytes again: the count never goes back.
+  auto fed = [&progress](uint64_t at) { progress.bytesRead = std::max(progress.bytesRead, at); };
   // The first part's thread also hands every point to the sink: it takes the smaller part.
   detail::SplitOutcome split;
   if (!detail::ReadInTwoParts(input, file.size() / 16 * 7,
                               format == Format::kGpx ? detail::NewGpxReader : detail::NewTcxReader, counted,
-                              [&progress](uint64_t at) { progress.bytesRead = at; }, split))
+                              fed, split))
     return false;
   result.status = split.status;
   result.counts = split.counts;
