@@ -199,7 +199,8 @@ bool ReadInParts(const InputFile& file, std::string_view head, const ReadFileOpt
   };
   // After a second part that failed, the first reads its bytes again: the count never goes back.
   auto fed = [&progress](uint64_t at) { progress.bytesRead = std::max(progress.bytesRead, at); };
-  // The first part's thread also hands every point to the sink: it takes the smaller part.
+  // The first part's thread also hands every point to the sink: it takes the smaller part (for
+  // an import into a trip, 7/16 came out quickest of the cuts tried between 1/3 and 1/2).
   detail::SplitOutcome split;
   if (!detail::ReadInTwoParts(input, file.size() / 16 * 7,
                               format == Format::kGpx ? detail::NewGpxReader : detail::NewTcxReader, counted,
