@@ -8,8 +8,9 @@
 // between two points, in the very state and XML context (open elements, namespaces) that the
 // second reader had after the head, the bytes after the cut read the same for both. Otherwise,
 // and whenever the second part fails, the first reader goes on through the rest of the document
-// on its own (skipping what the queue has already delivered): every outcome, message and count
-// is the one reading the document in one piece gives.
+// on its own (skipping what the queue has already delivered). So a document that reads well gives
+// the sink the same calls as a reading in one piece, and one that fails fails at the same place,
+// found by the same reader that reads in one piece.
 #pragma once
 
 #include <cstdint>
