@@ -3,6 +3,8 @@
 #include <atomic>
 #include <cwchar>
 
+#include "navmisc/datactrl/device_state.h"
+
 namespace gpsdc {
 namespace {
 
@@ -27,6 +29,18 @@ DeviceServiceScope::DeviceServiceScope(ReplyChannel& replies, const Config& conf
 DeviceServiceScope::~DeviceServiceScope() {
   g_running = nullptr;
   Owned().reset();
+}
+
+void PublishDeviceConnection(bool connected, const std::function<void()>& describe) {
+  if (!connected) {
+    g_bDeviceConnected = false;
+    std::atomic_thread_fence(std::memory_order_release);
+  }
+  describe();
+  if (connected) {
+    std::atomic_thread_fence(std::memory_order_release);
+    g_bDeviceConnected = true;
+  }
 }
 
 CDataControlConnectionStatus DeviceStatusBlock(bool connected, const wchar_t* deviceId) {

@@ -4,6 +4,7 @@
 // changes of the connection on its own.
 #pragma once
 
+#include <functional>
 #include <memory>
 
 #include "handlers.h"
@@ -25,6 +26,12 @@ std::unique_ptr<DeviceService> MakeDongleService(ReplyChannel& replies, const Co
 
 // The service of the running server; null while none runs.
 DeviceService* RunningDeviceService();
+
+// Sets g_bDeviceConnected with the globals that describe the device (written by `describe`) in
+// the order another process may read them without a lock: a connected device is described
+// before it shows as connected, a lost one stops showing as connected before its description
+// is cleared.
+void PublishDeviceConnection(bool connected, const std::function<void()>& describe);
 
 // A connection-status reply for the device source.
 CDataControlConnectionStatus DeviceStatusBlock(bool connected, const wchar_t* deviceId);

@@ -96,10 +96,11 @@ class DongleService : public DeviceService {
   }
 
   void SetConnected(bool connected, const std::string& device) {
-    g_bDeviceConnected = connected;
-    const size_t n = std::min(device.size(), sizeof g_szDeviceId - 1);
-    std::memcpy(g_szDeviceId, device.data(), n);
-    g_szDeviceId[n] = '\0';
+    PublishDeviceConnection(connected, [&] {
+      const size_t n = std::min(device.size(), sizeof g_szDeviceId - 1);
+      std::memcpy(g_szDeviceId, device.data(), n);
+      g_szDeviceId[n] = '\0';
+    });
     if (connected == connected_.exchange(connected)) return;
     replies_.Send(DeviceStatusBlock(connected, CString::FromUtf8(device)));
   }

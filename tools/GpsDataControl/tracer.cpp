@@ -200,17 +200,18 @@ class TracerService : public DeviceService {
     LoggerFolder logger;
     const bool found = logger.Open(FindLogger(config_));
     std::lock_guard lock(mutex_);
-    g_bDeviceConnected = found;
-    const LoggerIdentity& id = logger.identity();
-    g_wDeviceModelID = found ? id.model : 0;
-    g_dDeviceVersion = found ? id.firmware : 0;
-    g_wDeviceSerialID = found ? id.serial : 0;
-    g_nDeviceTimeZone = found ? id.timeZone : 0;
-    g_lTotolMemory = found ? id.totalMemoryKiB : 0;
-    g_lUsedMemory = found ? logger.UsedMemoryKiB() : 0;
-    g_bRTCWorking = found;
-    SetByteText(g_szDeviceId, found ? id.identity.ToUtf8() : std::string());
-    SetByteText(g_szGSMVersion, found ? id.gsmVersion : std::string());
+    PublishDeviceConnection(found, [&] {
+      const LoggerIdentity& id = logger.identity();
+      g_wDeviceModelID = found ? id.model : 0;
+      g_dDeviceVersion = found ? id.firmware : 0;
+      g_wDeviceSerialID = found ? id.serial : 0;
+      g_nDeviceTimeZone = found ? id.timeZone : 0;
+      g_lTotolMemory = found ? id.totalMemoryKiB : 0;
+      g_lUsedMemory = found ? logger.UsedMemoryKiB() : 0;
+      g_bRTCWorking = found;
+      SetByteText(g_szDeviceId, found ? id.identity.ToUtf8() : std::string());
+      SetByteText(g_szGSMVersion, found ? id.gsmVersion : std::string());
+    });
     if (!found) return std::nullopt;
     return logger;
   }
