@@ -86,6 +86,11 @@ bool HaveProgram(const char* name) {
   return RunCommand(std::string("command -v ") + name + " >/dev/null 2>&1").status == 0;
 }
 
+std::string SchemaDir() {
+  const std::string dir = NAVMISC_SCHEMA_DIR;
+  return IsDirectory(CString::FromUtf8(dir)) ? dir : std::string();
+}
+
 std::string PythonWithModule(const char* module) {
   // Debian's python first: a python of one's own (pyenv, a venv) earlier on PATH may lack the
   // Debian packages.

@@ -89,6 +89,9 @@ struct CommandResult {
 CommandResult RunCommand(const std::string& command);
 // True when `name` is a program on PATH.
 bool HaveProgram(const char* name);
+// The folder of the published XML schemas (NAVMISC_SCHEMA_DIR, beside the checkout by default),
+// or empty when it is absent: validation against them is then left out, with a note.
+std::string SchemaDir();
 // A python 3 that can import `module` (Debian's first), or "" when there is none.
 std::string PythonWithModule(const char* module);
 // `s` as one single-quoted shell word.

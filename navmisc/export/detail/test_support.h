@@ -57,18 +57,10 @@ inline std::string MaskKmlDate(const std::string& doc, std::string* name = nullp
   return doc.substr(0, from) + "@DATE@" + doc.substr(end);
 }
 
-// The folder of the published schemas, or empty when it is absent.
-inline std::string SchemaDir() {
-#ifdef NAVMISC_SCHEMA_DIR
-  std::string dir = NAVMISC_SCHEMA_DIR;
-  if (IsDirectory(CString::FromUtf8(dir))) return dir;
-#endif
-  return {};
-}
-
 using navmisc::testutil::CommandResult;
 using navmisc::testutil::HaveProgram;
 using navmisc::testutil::RunCommand;
+using navmisc::testutil::SchemaDir;
 using navmisc::testutil::ShellQuote;
 
 }  // namespace navmisc::exporttest
