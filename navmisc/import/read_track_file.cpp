@@ -16,7 +16,6 @@
 namespace navmisc::import {
 namespace {
 
-constexpr size_t kChunk = 256 * 1024;
 // How often a converter that has not written anything yet is asked whether to go on.
 constexpr int kConverterPollMs = 250;
 
@@ -153,7 +152,7 @@ ReadStatus Convert(InputFile& file, const FileFormat& format, ProgressSink& sink
     return {DC_ERR_IMPORT_NO_CONVERTER, "cannot start gpsbabel: " + child.error()};
   }
   auto reader = MakeGpxReader(sink);
-  std::vector<char> buffer(kChunk);
+  std::vector<char> buffer(kReadPiece);
   uint64_t produced = 0;
   for (;;) {
     const ssize_t n = child.ReadOutput(buffer.data(), buffer.size(), kConverterPollMs);
@@ -276,7 +275,7 @@ ReadFileResult ReadTrackFile(const wchar_t* path, ImportSink& sink, const ReadFi
   }
   ReadProgress progress;
   progress.bytesTotal = file.size();
-  std::vector<char> buffer(kChunk);
+  std::vector<char> buffer(kReadPiece);
   ssize_t n = file.Read(buffer.data(), buffer.size());
   if (n < 0) {
     result.status = {DC_ERR_IMPORT_READ, "cannot read the file: " + file.error()};

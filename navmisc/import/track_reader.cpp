@@ -7,7 +7,7 @@
 namespace navmisc::import {
 
 bool TrackReader::ReadFrom(const Source& source) {
-  std::vector<char> buffer(256u << 10);
+  std::vector<char> buffer(kReadPiece);
   for (;;) {
     const long n = source(buffer.data(), buffer.size());
     if (n < 0) return Fail(DC_ERR_IMPORT_READ, "the file could not be read");

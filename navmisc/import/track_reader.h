@@ -61,6 +61,9 @@ struct ImportTrack {
   std::string description;
 };
 
+// The piece in which documents are read from a file and handed to a parser.
+inline constexpr size_t kReadPiece = 256u << 10;
+
 // Texts longer than this many bytes are cut (at a whole character).
 inline constexpr size_t kMaxText = 4096;
 

@@ -16,7 +16,6 @@
 namespace navmisc::import::detail {
 namespace {
 
-constexpr size_t kPiece = 256u << 10;
 // How far past the intended cut a point's opening is looked for.
 constexpr size_t kWindow = 64u << 10;
 constexpr size_t kBatchEvents = 4096;
@@ -230,7 +229,7 @@ void ReadSecondPart(const SplitInput& input, std::string_view head, uint64_t cut
     if (usable) {
       const ReadCounts before = reader->counts();
       sink.Arm();
-      std::vector<char> buffer(kPiece);
+      std::vector<char> buffer(kReadPiece);
       std::string error;
       const bool read = FeedRange(*reader, input, cut, UINT64_MAX, buffer, error,
                                   [&](uint64_t at) {
@@ -317,7 +316,7 @@ bool ReadInTwoParts(const SplitInput& input, uint64_t cutNear, const ReaderFacto
     return true;
   };
   // The rest of the document by the first reader alone.
-  std::vector<char> buffer(kPiece);
+  std::vector<char> buffer(kReadPiece);
   auto readOn = [&] {
     if (!FeedRange(*first, input, cut, UINT64_MAX, buffer, error, progress))
       return settle({DC_ERR_IMPORT_READ, "cannot read the file: " + error});

@@ -13,9 +13,6 @@
 namespace navmisc::import::detail {
 namespace {
 
-// The most bytes handed to the parser in one call; also the grain of the pending-bytes bound.
-constexpr size_t kPiece = 256u << 10;
-
 // The parser's own message, one line, without its trailing line break.
 std::string OneLine(const char* message) {
   std::string out = message ? message : "";
@@ -143,11 +140,7 @@ void XmlStream::OnError(void* ctx, _xmlError* error) {
   // An early end reads as "extra content" to the push parser; say what is really wrong.
   const bool end = error->code == XML_ERR_DOCUMENT_END || error->code == XML_ERR_TAG_NOT_FINISHED ||
                    error->code == XML_ERR_DOCUMENT_EMPTY;
-  if (end && self.depth_ > 0) {
-    what = "the document ends before " + std::to_string(self.depth_) + " elements are closed";
-  } else if (end && !self.started_) {
-    what = "no root element";
-  }
+  if (end && (self.depth_ > 0 || !self.started_)) what = self.EarlyEnd();
   self.status_ = {DC_ERR_IMPORT_MALFORMED,
                   "line " + std::to_string(error->line) + ": not well-formed XML (" + what + ")"};
 }
@@ -177,7 +170,8 @@ bool XmlStream::Parse(const char* data, size_t size, bool final) {
 
 bool XmlStream::Feed(const char* data, size_t size) {
   while (size > 0) {
-    const size_t n = std::min(size, kPiece);
+    // The most bytes handed to the parser in one call; also the grain of the pending-bytes bound.
+    const size_t n = std::min(size, kReadPiece);
     if (!Parse(data, n, false)) return false;
     data += n;
     size -= n;
@@ -220,13 +214,14 @@ bool XmlStream::Closed() {
   // The parser lets a few faults pass unsaid (bytes its converter gives up on, in some cuts of
   // the input): a document is only whole when its root element has ended.
   if (status_.ok() && (!started_ || depth_ != 0)) {
-    status_ = {DC_ERR_IMPORT_MALFORMED,
-               Where() + "not well-formed XML (" +
-                   (started_ ? "the document ends before " + std::to_string(depth_) + " elements are closed"
-                             : std::string("no root element")) +
-                   ")"};
+    status_ = {DC_ERR_IMPORT_MALFORMED, Where() + "not well-formed XML (" + EarlyEnd() + ")"};
   }
   return status_.ok();
+}
+
+std::string XmlStream::EarlyEnd() const {
+  return started_ ? "the document ends before " + std::to_string(depth_) + " elements are closed"
+                  : "no root element";
 }
 
 int XmlStream::OnRead(void* ctx, char* buffer, int size) {

@@ -1,5 +1,6 @@
-// The XML layer of the GPX and TCX readers: libxml2's push parser with SAX callbacks, fed in
-// pieces, with everything that could make a document cost more than its size refused. No
+// The XML layer of the GPX and TCX readers: libxml2's SAX parser, pushed in pieces or pulling
+// the document itself, with everything that could make a document cost more than its size
+// refused. No
 // document type declarations (so no entities, internal or external, and no entity expansion), no
 // network, a bounded nesting depth, and a bound on how much the parser may buffer for one
 // unfinished token (a 1 GB attribute or tag).
@@ -101,6 +102,8 @@ class XmlStream {
   bool MakeParser(bool pull);
   // After the end of the input: false unless the root element has ended (and nothing failed).
   bool Closed();
+  // What a document that ends too early lacks, in words.
+  std::string EarlyEnd() const;
   bool Parse(const char* data, size_t size, bool final);
   // After `size` more bytes went to the parser: false when too many came without an event.
   bool Bound(size_t size);
